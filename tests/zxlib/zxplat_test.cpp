@@ -1,0 +1,1364 @@
+// zxplat_test.cpp - tests of zxlib/zxplat.h, that is of zxplat_posix*.cpp or
+// zxplat_win32*.cpp.
+
+#include "zxplat.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <string>
+#include <string_view>
+#include <system_error>
+#include <utility>
+#include <vector>
+
+#include "kit/process.h"
+#include "kit/target.h"
+#include "kit/tempdir.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using kit::TempDir;
+using namespace std::string_view_literals;
+using zxplat::Fd;
+using zxplat::files;
+using zxplat::k_no_fd;
+using zxplat::last_error;
+using zxplat::NameKind;
+using zxplat::OpenMode;
+using zxplat::RenameResult;
+using zxplat::set_last_error;
+using zxplat::Whence;
+
+// No call under test makes this one up.
+constexpr int k_untouched = 1234;
+
+constexpr OpenMode k_all_modes[] = {
+    OpenMode::read,           OpenMode::create,     OpenMode::create_new,
+    OpenMode::create_private, OpenMode::read_write, OpenMode::append,
+};
+
+constexpr OpenMode k_existing_modes[] = {OpenMode::read, OpenMode::read_write};
+
+constexpr OpenMode k_new_modes[] = {OpenMode::create_new,
+                                    OpenMode::create_private};
+
+// The modes that write into a file that is there already.
+constexpr OpenMode k_overwriting_modes[] = {
+    OpenMode::create, OpenMode::read_write, OpenMode::append};
+
+std::string describe(std::string_view name, OpenMode mode) {
+  return std::string(name) + ", mode " + std::to_string(static_cast<int>(mode));
+}
+
+// An open file, closed at the end of the block.
+class Open {
+ public:
+  Open(std::string_view name, OpenMode mode) : fd(files.open(name, mode)) {
+    EXPECT_NE(fd, k_no_fd) << describe(name, mode) << ": " << last_error();
+  }
+  Open(const Open&) = delete;
+  Open& operator=(const Open&) = delete;
+  ~Open() {
+    if (fd != k_no_fd) files.close(fd);
+  }
+
+  std::int64_t write(std::string_view bytes) const {
+    return files.write(fd, bytes.data(), bytes.size());
+  }
+
+  std::string read(std::size_t size = 100) const {
+    std::string bytes(size, '?');
+    const std::int64_t count = files.read(fd, bytes.data(), size);
+    EXPECT_GE(count, 0) << last_error();
+    bytes.resize(static_cast<std::size_t>(std::max<std::int64_t>(count, 0)));
+    return bytes;
+  }
+
+  Fd fd;
+};
+
+// Another working directory until the end of the block.
+class WorkingIn {
+ public:
+  explicit WorkingIn(const std::string& folder) : before(fs::current_path()) {
+    fs::current_path(folder);
+  }
+  WorkingIn(const WorkingIn&) = delete;
+  WorkingIn& operator=(const WorkingIn&) = delete;
+  ~WorkingIn() { fs::current_path(before); }
+
+ private:
+  fs::path before;
+};
+
+void write_through(std::string_view name, OpenMode mode,
+                   std::string_view bytes) {
+  const Open file(name, mode);
+  EXPECT_EQ(file.write(bytes), static_cast<std::int64_t>(bytes.size()));
+}
+
+std::string read_through(std::string_view name) {
+  return Open(name, OpenMode::read).read();
+}
+
+void expect_open_fails(std::string_view name, OpenMode mode, int number) {
+  set_last_error(k_untouched);
+  EXPECT_EQ(files.open(name, mode), k_no_fd) << describe(name, mode);
+  EXPECT_EQ(last_error(), number) << describe(name, mode);
+}
+
+void expect_missing(std::string_view name, int number) {
+  set_last_error(k_untouched);
+  EXPECT_EQ(zxplat::kind_of(name), NameKind::missing) << name;
+  EXPECT_EQ(last_error(), number) << name;
+}
+
+void expect_remove_fails(std::string_view name, int number) {
+  set_last_error(k_untouched);
+  EXPECT_FALSE(files.remove(name)) << name;
+  EXPECT_EQ(last_error(), number) << name;
+}
+
+void expect_rename_fails(std::string_view from, std::string_view to,
+                         int number) {
+  set_last_error(k_untouched);
+  EXPECT_EQ(files.rename(from, to), RenameResult::failed) << from << ' ' << to;
+  EXPECT_EQ(last_error(), number) << from << ' ' << to;
+}
+
+void expect_free(std::string_view name) {
+  set_last_error(k_untouched);
+  EXPECT_FALSE(zxplat::name_taken(name)) << name;
+  EXPECT_EQ(last_error(), zxplat::k_err_not_found) << name;
+}
+
+// The names in a folder as the system spells them, sorted.
+std::vector<std::string> spellings_in(const std::string& folder) {
+  std::vector<std::string> names;
+  for (const auto& entry : fs::directory_iterator(folder)) {
+    names.push_back(entry.path().filename().string());
+  }
+  std::sort(names.begin(), names.end());
+  return names;
+}
+
+using Names = std::vector<std::string>;
+
+void make_read_only(const std::string& path) {
+  constexpr fs::perms k_write =
+      fs::perms::owner_write | fs::perms::group_write | fs::perms::others_write;
+  fs::permissions(path, k_write, fs::perm_options::remove);
+}
+
+std::string with_slashes(std::string name, char slash) {
+  for (char& c : name) {
+    if (c == '/' || c == '\\') c = slash;
+  }
+  return name;
+}
+
+// ------------------------------------------------------------ last error --
+
+TEST(zxplat, the_last_error_is_what_was_stored) {
+  for (const int number : {0, 2, 33, 1234}) {
+    set_last_error(number);
+    EXPECT_EQ(last_error(), number);
+  }
+}
+
+TEST(zxplat, calls_that_succeed_leave_the_last_error_alone) {
+  const TempDir dir;
+  const std::string name = dir.file("a");
+  const std::string other = dir.file("b");
+  char byte = 'x';
+  char text[1000];
+  set_last_error(k_untouched);
+
+  const Fd fd = files.open(name, OpenMode::create);
+  EXPECT_EQ(last_error(), k_untouched) << "create";
+  files.write(fd, &byte, 1);
+  files.seek(fd, 0, Whence::start);
+  files.flush(fd);
+  files.size(fd);
+  files.close(fd);
+  EXPECT_EQ(last_error(), k_untouched) << "descriptor";
+  files.close(files.open(name, OpenMode::create));
+  files.close(files.open(name, OpenMode::append));
+  files.close(files.open("nul", OpenMode::create));
+  EXPECT_EQ(last_error(), k_untouched) << "create again";
+  files.close(files.open(other, OpenMode::create_new));
+  zxplat::copy_attributes(name, other);
+  EXPECT_EQ(last_error(), k_untouched) << "attributes";
+  files.remove(other);
+  files.rename(name, other);
+  EXPECT_EQ(last_error(), k_untouched) << "rename";
+  zxplat::kind_of(other);
+  zxplat::name_taken(other);
+  zxplat::same_file(other, other);
+  zxplat::on_one_device(other, name);
+  EXPECT_EQ(last_error(), k_untouched) << "questions";
+  zxplat::current_directory(text);
+  zxplat::temp_directory(text);
+  zxplat::is_terminal(zxplat::k_stdin_fd);
+  zxplat::heap_realloc(zxplat::heap_realloc(nullptr, 10), 0);
+  zxplat::process.sleep(1);
+  zxplat::process.clock();
+  zxplat::process.ticks();
+  EXPECT_EQ(last_error(), k_untouched) << "process";
+}
+
+// --------------------------------------------------------------- opening --
+
+TEST(zxplat, a_created_file_holds_the_bytes_written) {
+  const TempDir dir;
+  const std::string bytes("a\n\r\n\x1a\0\xff", 7);
+  write_through(dir.file("a"), OpenMode::create, bytes);
+  EXPECT_EQ(kit::read_file(dir.file("a")), bytes);
+  EXPECT_EQ(read_through(dir.file("a")), bytes);
+}
+
+TEST(zxplat, create_cuts_an_existing_file_to_nothing) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "long before");
+  write_through(dir.file("a"), OpenMode::create, "new");
+  EXPECT_EQ(kit::read_file(dir.file("a")), "new");
+}
+
+TEST(zxplat, read_only_descriptors_take_no_bytes) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "abc");
+  const Open file(dir.file("a"), OpenMode::read);
+  EXPECT_EQ(file.write("x"), -1);
+  EXPECT_EQ(last_error(), zxplat::k_err_bad_handle);
+}
+
+TEST(zxplat, write_only_descriptors_give_no_bytes) {
+  const TempDir dir;
+  for (const OpenMode mode :
+       {OpenMode::create, OpenMode::append, OpenMode::create}) {
+    const Open file(dir.file("a"), mode);
+    char byte;
+    EXPECT_EQ(files.read(file.fd, &byte, 1), -1);
+    EXPECT_EQ(last_error(), zxplat::k_err_bad_handle);
+  }
+}
+
+TEST(zxplat, read_write_keeps_the_bytes_and_does_both) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "abcdef");
+  {
+    const Open file(dir.file("a"), OpenMode::read_write);
+    EXPECT_EQ(file.read(2), "ab");
+    EXPECT_EQ(files.seek(file.fd, 2, Whence::start), 2);
+    EXPECT_EQ(file.write("XY"), 2);
+    EXPECT_EQ(files.seek(file.fd, 0, Whence::current), 4);
+    EXPECT_EQ(file.read(), "ef");
+  }
+  EXPECT_EQ(kit::read_file(dir.file("a")), "abXYef");
+}
+
+TEST(zxplat, append_makes_a_file_that_is_missing) {
+  const TempDir dir;
+  write_through(dir.file("a"), OpenMode::append, "one");
+  EXPECT_EQ(kit::read_file(dir.file("a")), "one");
+}
+
+TEST(zxplat, append_writes_at_the_end_wherever_the_position_is) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "one");
+  {
+    const Open file(dir.file("a"), OpenMode::append);
+    EXPECT_EQ(files.seek(file.fd, 0, Whence::current), 3);
+    EXPECT_EQ(files.seek(file.fd, 1, Whence::start), 1);
+    EXPECT_EQ(file.write("two"), 3);
+  }
+  EXPECT_EQ(kit::read_file(dir.file("a")), "onetwo");
+}
+
+TEST(zxplat, create_new_makes_a_file) {
+  const TempDir dir;
+  for (const OpenMode mode : k_new_modes) {
+    const std::string name =
+        dir.file("new" + std::to_string(static_cast<int>(mode)));
+    write_through(name, mode, "bytes");
+    EXPECT_EQ(kit::read_file(name), "bytes");
+  }
+}
+
+TEST(zxplat, create_new_refuses_a_name_that_is_taken) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "kept");
+  fs::create_directory(dir.file("folder"));
+  for (const OpenMode mode : k_new_modes) {
+    expect_open_fails(dir.file("a"), mode, zxplat::k_err_exists_on_create);
+    expect_open_fails(dir.file("A"), mode, zxplat::k_err_exists_on_create);
+    expect_open_fails(dir.file("folder"), mode, zxplat::k_err_exists_on_create);
+  }
+  EXPECT_EQ(kit::read_file(dir.file("a")), "kept");
+}
+
+TEST(zxplat, create_new_refuses_a_link_that_leads_nowhere) {
+  const TempDir dir;
+  if (!kit::make_link(dir.file("nowhere"), dir.file("link"))) {
+    GTEST_SKIP() << "no links here";
+  }
+  for (const OpenMode mode : k_new_modes) {
+    expect_open_fails(dir.file("link"), mode, zxplat::k_err_exists_on_create);
+  }
+  EXPECT_EQ(spellings_in(dir.path()), Names{"link"});
+}
+
+TEST(zxplat, create_makes_the_file_that_a_link_leads_to) {
+  const TempDir dir;
+  if (!kit::make_link(dir.file("target"), dir.file("link"))) {
+    GTEST_SKIP() << "no links here";
+  }
+  write_through(dir.file("link"), OpenMode::create, "one");
+  EXPECT_EQ(kit::read_file(dir.file("target")), "one");
+  write_through(dir.file("link"), OpenMode::append, "two");
+  EXPECT_EQ(kit::read_file(dir.file("target")), "onetwo");
+}
+
+TEST(zxplat, a_private_file_is_for_its_owner_alone) {
+  const TempDir dir;
+  write_through(dir.file("a"), OpenMode::create_private, "x");
+  if (kit::on_windows()) return;  // the folder's rights decide there
+  EXPECT_EQ(fs::status(dir.file("a")).permissions(),
+            fs::perms::owner_read | fs::perms::owner_write);
+}
+
+TEST(zxplat, a_missing_file_is_not_found) {
+  const TempDir dir;
+  for (const OpenMode mode : k_existing_modes) {
+    expect_open_fails(dir.file("a"), mode, zxplat::k_err_not_found);
+  }
+  EXPECT_TRUE(fs::is_empty(dir.path()));
+}
+
+TEST(zxplat, a_file_in_a_missing_folder_is_a_missing_path) {
+  const TempDir dir;
+  for (const OpenMode mode : k_all_modes) {
+    expect_open_fails(dir.file("no/a"), mode, zxplat::k_err_path_not_found);
+  }
+  expect_missing(dir.file("no/a"), zxplat::k_err_path_not_found);
+  expect_remove_fails(dir.file("no/a"), zxplat::k_err_path_not_found);
+}
+
+TEST(zxplat, a_file_is_no_folder_to_look_in) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  for (const OpenMode mode : k_all_modes) {
+    expect_open_fails(dir.file("a/b"), mode, zxplat::k_err_path_not_found);
+  }
+  expect_missing(dir.file("a/b"), zxplat::k_err_path_not_found);
+  expect_remove_fails(dir.file("A/b"), zxplat::k_err_path_not_found);
+}
+
+TEST(zxplat, a_folder_does_not_open) {
+  const TempDir dir;
+  for (const OpenMode mode : {OpenMode::read, OpenMode::create,
+                              OpenMode::read_write, OpenMode::append}) {
+    expect_open_fails(dir.path(), mode, zxplat::k_err_denied);
+  }
+}
+
+TEST(zxplat, a_file_without_write_permission_opens_for_reading_alone) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "kept");
+  make_read_only(dir.file("a"));
+  for (const OpenMode mode : k_overwriting_modes) {
+    expect_open_fails(dir.file("a"), mode, zxplat::k_err_denied);
+    expect_open_fails(dir.file("A"), mode, zxplat::k_err_denied);
+  }
+  EXPECT_EQ(read_through(dir.file("a")), "kept");
+}
+
+TEST(zxplat, links_in_a_circle_are_a_missing_path) {
+  const TempDir dir;
+  if (!kit::make_link(dir.file("b"), dir.file("a")) ||
+      !kit::make_link(dir.file("a"), dir.file("b"))) {
+    GTEST_SKIP() << "no links here";
+  }
+  expect_open_fails(dir.file("a"), OpenMode::read,
+                    zxplat::k_err_path_not_found);
+  expect_open_fails(dir.file("a"), OpenMode::create,
+                    zxplat::k_err_path_not_found);
+  expect_missing(dir.file("a/x"), zxplat::k_err_path_not_found);
+}
+
+TEST(zxplat, running_out_of_descriptors_is_a_failure_of_its_own) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  const kit::FewFiles few(64);
+  std::vector<Fd> open;
+  set_last_error(k_untouched);
+  for (;;) {
+    const Fd fd = files.open(dir.file("a"), OpenMode::read);
+    if (fd == k_no_fd || open.size() > 100'000) break;
+    open.push_back(fd);
+  }
+  const int number = last_error();
+  const NameKind kind = zxplat::kind_of(dir.file("A"));
+  const int kind_number = last_error();
+  for (const Fd fd : open) EXPECT_TRUE(files.close(fd));
+  EXPECT_EQ(number, zxplat::k_err_too_many_open);
+  // Without a descriptor there may be no telling, which is not "missing".
+  EXPECT_TRUE(kind == NameKind::file ||
+              kind_number == zxplat::k_err_too_many_open)
+      << kind_number;
+}
+
+// ---------------------------------------------------- reading and writing --
+
+TEST(zxplat, reading_ends_with_a_count_of_zero) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "abc");
+  const Open file(dir.file("a"), OpenMode::read);
+  EXPECT_EQ(file.read(2), "ab");
+  EXPECT_EQ(file.read(2), "c");
+  EXPECT_EQ(file.read(2), "");
+}
+
+TEST(zxplat, transfers_of_no_bytes_succeed) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "abc");
+  const Open file(dir.file("a"), OpenMode::read_write);
+  EXPECT_EQ(files.read(file.fd, nullptr, 0), 0);
+  EXPECT_EQ(files.write(file.fd, nullptr, 0), 0);
+}
+
+TEST(zxplat, seeking_counts_from_start_position_and_end) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "0123456789");
+  const Open file(dir.file("a"), OpenMode::read);
+  EXPECT_EQ(files.seek(file.fd, 4, Whence::start), 4);
+  EXPECT_EQ(file.read(1), "4");
+  EXPECT_EQ(files.seek(file.fd, -2, Whence::current), 3);
+  EXPECT_EQ(file.read(1), "3");
+  EXPECT_EQ(files.seek(file.fd, -1, Whence::end), 9);
+  EXPECT_EQ(file.read(1), "9");
+}
+
+TEST(zxplat, positions_go_beyond_32_bits) {
+  const TempDir dir;
+  const Open file(dir.file("a"), OpenMode::create);
+  constexpr std::int64_t k_far = 0x1'2345'6789;
+  EXPECT_EQ(files.seek(file.fd, k_far, Whence::start), k_far);
+  EXPECT_EQ(files.seek(file.fd, 1, Whence::current), k_far + 1);
+}
+
+TEST(zxplat, a_position_ahead_of_the_start_is_refused) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "abc");
+  const Open file(dir.file("a"), OpenMode::read);
+  files.seek(file.fd, 2, Whence::start);
+  EXPECT_EQ(files.seek(file.fd, -1, Whence::start), -1);
+  EXPECT_EQ(last_error(), zxplat::k_err_bad_parameter);
+  EXPECT_EQ(files.seek(file.fd, 0, Whence::current), 2);
+}
+
+TEST(zxplat, a_gap_behind_the_end_is_filled_with_zeros) {
+  const TempDir dir;
+  {
+    const Open file(dir.file("a"), OpenMode::create);
+    files.seek(file.fd, 3, Whence::start);
+    EXPECT_EQ(file.write("x"), 1);
+  }
+  EXPECT_EQ(kit::read_file(dir.file("a")), "\0\0\0x"sv);
+}
+
+TEST(zxplat, the_size_counts_what_was_written_and_moves_nothing) {
+  const TempDir dir;
+  const Open file(dir.file("a"), OpenMode::create);
+  EXPECT_EQ(files.size(file.fd), 0);
+  EXPECT_EQ(file.write("abcdef"), 6);
+  EXPECT_EQ(files.seek(file.fd, 2, Whence::start), 2);
+  EXPECT_EQ(files.size(file.fd), 6);
+  EXPECT_EQ(files.seek(file.fd, 0, Whence::current), 2);
+}
+
+TEST(zxplat, flushing_leaves_the_bytes_in_the_file) {
+  const TempDir dir;
+  const Open file(dir.file("a"), OpenMode::create);
+  EXPECT_EQ(file.write("abc"), 3);
+  EXPECT_TRUE(files.flush(file.fd)) << last_error();
+  EXPECT_EQ(kit::read_file(dir.file("a")), "abc");
+}
+
+TEST(zxplat, a_closed_descriptor_is_a_bad_handle_to_every_call) {
+  const TempDir dir;
+  const Fd fd = files.open(dir.file("a"), OpenMode::create);
+  ASSERT_TRUE(files.close(fd));
+  char byte = 'x';
+  const auto expect_bad_handle = [](bool is_refused, const char* call) {
+    EXPECT_TRUE(is_refused) << call;
+    EXPECT_EQ(last_error(), zxplat::k_err_bad_handle) << call;
+    set_last_error(k_untouched);
+  };
+  expect_bad_handle(files.read(fd, &byte, 1) == -1, "read");
+  expect_bad_handle(files.write(fd, &byte, 1) == -1, "write");
+  expect_bad_handle(files.seek(fd, 0, Whence::start) == -1, "seek");
+  expect_bad_handle(!files.flush(fd), "flush");
+  expect_bad_handle(files.size(fd) == -1, "size");
+  expect_bad_handle(!files.close(fd), "close");
+  expect_bad_handle(!zxplat::set_binary(fd), "set_binary");
+}
+
+TEST(zxplat, no_descriptor_at_all_is_a_bad_handle_as_well) {
+  char byte;
+  EXPECT_EQ(files.read(k_no_fd, &byte, 1), -1);
+  EXPECT_EQ(last_error(), zxplat::k_err_bad_handle);
+  EXPECT_FALSE(files.close(k_no_fd));
+  EXPECT_EQ(last_error(), zxplat::k_err_bad_handle);
+}
+
+TEST(zxplat, a_full_device_fails_the_write) {
+  const std::string device = kit::full_device();
+  if (device.empty()) GTEST_SKIP() << "no device that is full";
+  for (const OpenMode mode : k_overwriting_modes) {
+    const Open file(device, mode);
+    set_last_error(k_untouched);
+    EXPECT_EQ(file.write("x"), -1);
+    EXPECT_EQ(last_error(), zxplat::k_err_disk_full);
+  }
+  EXPECT_EQ(zxplat::kind_of(device), NameKind::device);
+}
+
+TEST(zxplat, a_pipe_has_an_end_and_no_size) {
+  const kit::Pipe pipe = kit::make_pipe();
+  ASSERT_NE(pipe.reader, k_no_fd);
+  char bytes[10];
+  EXPECT_EQ(files.write(pipe.writer, "abc", 3), 3);
+  EXPECT_TRUE(files.flush(pipe.writer)) << last_error();
+  EXPECT_LE(files.size(pipe.writer), 0);
+  EXPECT_EQ(files.read(pipe.reader, bytes, 10), 3);
+  EXPECT_TRUE(files.close(pipe.writer));
+  EXPECT_EQ(files.read(pipe.reader, bytes, 10), 0);
+  EXPECT_TRUE(files.close(pipe.reader));
+}
+
+TEST(zxplat, a_write_that_nobody_will_read_is_an_error_and_no_signal) {
+  zxplat::prepare_process();
+  const kit::Pipe pipe = kit::make_pipe();
+  ASSERT_NE(pipe.writer, k_no_fd);
+  EXPECT_TRUE(files.close(pipe.reader));
+  EXPECT_EQ(files.write(pipe.writer, "x", 1), -1);
+  EXPECT_EQ(last_error(), zxplat::k_err_broken_pipe);
+  EXPECT_TRUE(files.close(pipe.writer));
+}
+
+// ----------------------------------------------------------------- names --
+
+TEST(zxplat, both_slashes_separate) {
+  const TempDir dir;
+  fs::create_directory(dir.file("folder"));
+  kit::write_file(dir.file("folder/a"), "bytes");
+  for (const char slash : {'/', '\\'}) {
+    const std::string name = with_slashes(dir.file("folder/a"), slash);
+    EXPECT_EQ(read_through(name), "bytes") << name;
+    EXPECT_EQ(zxplat::kind_of(name), NameKind::file) << name;
+  }
+}
+
+TEST(zxplat, relative_names_start_from_the_working_directory) {
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  fs::create_directory("folder");
+  write_through("folder\\a", OpenMode::create, "bytes");
+  for (const char* name : {"folder\\a", "folder/a", ".\\folder\\a",
+                           "folder\\..\\FOLDER\\A", "folder\\\\a"}) {
+    EXPECT_EQ(read_through(name), "bytes") << name;
+  }
+  EXPECT_EQ(zxplat::kind_of("."), NameKind::directory);
+}
+
+TEST(zxplat, a_name_without_bytes_is_a_missing_path) {
+  for (const OpenMode mode : k_all_modes) {
+    expect_open_fails("", mode, zxplat::k_err_path_not_found);
+  }
+  expect_missing("", zxplat::k_err_path_not_found);
+  expect_remove_fails("", zxplat::k_err_path_not_found);
+}
+
+// Every call that takes a name refuses this one.
+void expect_refused_everywhere(std::string_view name, int number) {
+  const TempDir dir;
+  const std::string good = dir.file("a");
+  kit::write_file(good, "");
+  for (const OpenMode mode : k_all_modes) expect_open_fails(name, mode, number);
+  expect_missing(name, number);
+  expect_remove_fails(name, number);
+  expect_rename_fails(name, good, number);
+  expect_rename_fails(good, name, number);
+  const auto expect_false = [&](bool result, const char* call) {
+    EXPECT_FALSE(result) << call;
+    EXPECT_EQ(last_error(), number) << call;
+    set_last_error(k_untouched);
+  };
+  expect_false(zxplat::name_taken(name), "name_taken");
+  expect_false(zxplat::same_file(good, name), "same_file");
+  expect_false(zxplat::same_file(name, good), "same_file");
+  expect_false(zxplat::copy_attributes(good, name), "copy_attributes");
+  expect_false(zxplat::copy_attributes(name, good), "copy_attributes");
+  EXPECT_TRUE(zxplat::on_one_device(name, good));
+  EXPECT_TRUE(zxplat::on_one_device(good, name));
+  EXPECT_EQ(last_error(), k_untouched);
+}
+
+TEST(zxplat, a_name_with_a_nul_byte_is_refused) {
+  expect_refused_everywhere("a\0b"sv, zxplat::k_err_bad_name);
+  expect_refused_everywhere("nul\0"sv, zxplat::k_err_bad_name);
+  expect_refused_everywhere("\0"sv, zxplat::k_err_bad_name);
+}
+
+TEST(zxplat, a_name_beyond_the_longest_is_refused) {
+  expect_refused_everywhere(std::string(zxplat::k_max_name + 1, 'a'),
+                            zxplat::k_err_bad_name);
+}
+
+TEST(zxplat, the_longest_name_is_taken_natively) {
+  if (kit::on_windows()) GTEST_SKIP() << "the system's own limit is lower";
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  kit::write_file("a", "bytes");
+  std::string name = "a";
+  while (name.size() + 2 <= zxplat::k_max_name) name.insert(0, ".\\");
+  ASSERT_EQ(name.size(), zxplat::k_max_name);
+  EXPECT_EQ(read_through(name), "bytes");
+  name.back() = 'A';
+  EXPECT_EQ(read_through(name), "bytes");
+}
+
+TEST(zxplat, a_component_beyond_the_systems_longest_does_not_open) {
+  const TempDir dir;
+  const std::string name = dir.file(std::string(300, 'a'));
+  for (const OpenMode mode : k_all_modes) {
+    EXPECT_EQ(files.open(name, mode), k_no_fd);
+  }
+  EXPECT_TRUE(fs::is_empty(dir.path()));
+}
+
+TEST(zxplat, the_native_names_have_one_drive) {
+  if (kit::on_windows()) GTEST_SKIP() << "drives are the system's own";
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  kit::write_file("x", "bytes");
+  const std::string full = with_slashes(dir.file("x"), '\\');
+  for (const std::string drive : {"C:", "c:"}) {
+    EXPECT_EQ(read_through(drive + full), "bytes");
+    EXPECT_EQ(read_through(drive + "x"), "bytes");
+    EXPECT_EQ(read_through(drive + ".\\X"), "bytes");
+    EXPECT_EQ(zxplat::kind_of(drive), NameKind::directory);
+    EXPECT_EQ(zxplat::kind_of(drive + "\\"), NameKind::directory);
+    EXPECT_TRUE(zxplat::same_file(drive, dir.path()));
+  }
+  for (const std::string drive : {"A:", "b:", "D:", "z:"}) {
+    expect_missing(drive + full, zxplat::k_err_path_not_found);
+    expect_missing(drive + "x", zxplat::k_err_path_not_found);
+    expect_missing(drive, zxplat::k_err_path_not_found);
+    expect_open_fails(drive + "x", OpenMode::create,
+                      zxplat::k_err_path_not_found);
+  }
+  EXPECT_EQ(spellings_in(dir.path()), Names{"x"});
+}
+
+TEST(zxplat, the_native_names_have_no_servers) {
+  if (kit::on_windows()) GTEST_SKIP() << "servers are the system's own";
+  const TempDir dir;
+  kit::write_file(dir.file("x"), "bytes");
+  const std::string full = dir.file("x");
+  for (const std::string slash : {"\\", "/"}) {
+    expect_missing(slash + full, zxplat::k_err_path_not_found);
+    expect_missing("\\" + slash, zxplat::k_err_path_not_found);
+    expect_missing("/" + slash + "host\\share", zxplat::k_err_path_not_found);
+    expect_open_fails(slash + full, OpenMode::read,
+                      zxplat::k_err_path_not_found);
+  }
+}
+
+TEST(zxplat, a_colon_elsewhere_is_a_byte_like_any_other_natively) {
+  if (kit::on_windows()) GTEST_SKIP() << "the system has its own use for it";
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  for (const std::string name : {"1:x", "ab:c", ":"}) {
+    write_through(name, OpenMode::create, name);
+    EXPECT_EQ(kit::read_file(name), name);
+  }
+}
+
+// ----------------------------------------------------- letters of a name --
+
+TEST(zxplat, a_file_is_found_in_letters_of_another_case) {
+  const TempDir dir;
+  fs::create_directories(dir.file("Folder/Inner"));
+  kit::write_file(dir.file("Folder/Inner/File.Txt"), "bytes");
+  for (const char* name :
+       {"folder\\inner\\file.txt", "FOLDER/INNER/FILE.TXT",
+        "Folder\\inner\\File.Txt", "folder/../folder/INNER/./file.TXT"}) {
+    EXPECT_EQ(read_through(dir.file(name)), "bytes") << name;
+    EXPECT_EQ(zxplat::kind_of(dir.file(name)), NameKind::file) << name;
+    EXPECT_TRUE(zxplat::name_taken(dir.file(name))) << name;
+  }
+  EXPECT_EQ(zxplat::kind_of(dir.file("FOLDER\\")), NameKind::directory);
+  expect_missing(dir.file("FOLDER\\INNER\\other"), zxplat::k_err_not_found);
+  expect_missing(dir.file("FOLDER\\other\\file"), zxplat::k_err_path_not_found);
+}
+
+TEST(zxplat, a_name_is_found_in_a_folder_of_many) {
+  const TempDir dir;
+  for (int i = 0; i < 500; ++i) {
+    kit::write_file(dir.file("Some-Longer-Name-" + std::to_string(i)), "");
+  }
+  kit::write_file(dir.file("Wanted"), "bytes");
+  EXPECT_EQ(read_through(dir.file("wANTED")), "bytes");
+  expect_missing(dir.file("wANTE"), zxplat::k_err_not_found);
+  expect_missing(dir.file("wANTEDd"), zxplat::k_err_not_found);
+}
+
+// On a system that keeps such names apart, all of these are files; on one
+// that does not, the last writing made the one there is.
+TEST(zxplat, of_several_candidates_the_first_in_byte_order_is_taken) {
+  const TempDir dir;
+  kit::write_file(dir.file("aaB"), "aaB");
+  kit::write_file(dir.file("aBa"), "aBa");
+  kit::write_file(dir.file("Baa"), "Baa");
+  kit::write_file(dir.file("aAB"), "Aab");
+  kit::write_file(dir.file("AAB"), "AAB");
+  EXPECT_EQ(read_through(dir.file("aab")), "AAB");
+  EXPECT_EQ(read_through(dir.file("Aab")), "AAB");
+}
+
+TEST(zxplat, the_exact_spelling_wins) {
+  const TempDir dir;
+  kit::write_file(dir.file("AB"), "x");
+  kit::write_file(dir.file("Ab"), "x");
+  kit::write_file(dir.file("ab"), "right");
+  EXPECT_EQ(read_through(dir.file("ab")), "right");
+  write_through(dir.file("ab"), OpenMode::create, "new");
+  EXPECT_EQ(kit::read_file(dir.file("ab")), "new");
+  EXPECT_TRUE(files.remove(dir.file("ab")));
+  EXPECT_FALSE(fs::exists(dir.file("ab")));
+}
+
+TEST(zxplat, letters_beyond_ascii_are_not_folded_natively) {
+  if (kit::on_windows()) GTEST_SKIP() << "the system folds as it likes";
+  const TempDir dir;
+  kit::write_file(dir.file("\xc4"), "");
+  expect_missing(dir.file("\xe4"), zxplat::k_err_not_found);
+  kit::write_file(dir.file("["), "");
+  expect_missing(dir.file("{"), zxplat::k_err_not_found);
+}
+
+TEST(zxplat, create_opens_the_file_that_is_there_in_another_case) {
+  const TempDir dir;
+  kit::write_file(dir.file("Out.csv"), "before");
+  write_through(dir.file("out.CSV"), OpenMode::create, "new");
+  EXPECT_EQ(spellings_in(dir.path()), Names{"Out.csv"});
+  write_through(dir.file("OUT.csv"), OpenMode::append, "er");
+  EXPECT_EQ(spellings_in(dir.path()), Names{"Out.csv"});
+  EXPECT_EQ(kit::read_file(dir.file("Out.csv")), "newer");
+}
+
+TEST(zxplat, a_new_file_is_spelled_as_asked_for) {
+  const TempDir dir;
+  fs::create_directory(dir.file("Folder"));
+  write_through(dir.file("FOLDER\\Aa"), OpenMode::create, "");
+  write_through(dir.file("FOLDER\\Bb"), OpenMode::create_new, "");
+  write_through(dir.file("folder\\Cc"), OpenMode::create_private, "");
+  write_through(dir.file("folder\\Dd"), OpenMode::append, "");
+  EXPECT_EQ(spellings_in(dir.path()), Names{"Folder"});
+  EXPECT_EQ(spellings_in(dir.file("Folder")), (Names{"Aa", "Bb", "Cc", "Dd"}));
+}
+
+// ------------------------------------------------------- the null device --
+
+TEST(zxplat, nul_is_the_null_device_in_any_case_and_mode) {
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  for (const char* name : {"nul", "NUL", "Nul"}) {
+    for (const OpenMode mode : k_all_modes) {
+      EXPECT_TRUE(files.close(Open(name, mode).fd)) << describe(name, mode);
+    }
+    const Open device(name, OpenMode::read_write);
+    EXPECT_EQ(device.write("swallowed"), 9);
+    EXPECT_EQ(device.read(), "");
+    EXPECT_FALSE(zxplat::is_terminal(device.fd));
+  }
+  EXPECT_TRUE(fs::is_empty(dir.path()));
+}
+
+TEST(zxplat, nul_is_no_file) {
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  kit::write_file("a", "kept");
+  expect_missing("nul", zxplat::k_err_not_found);
+  expect_missing("NUL", zxplat::k_err_not_found);
+  expect_remove_fails("nul", zxplat::k_err_not_found);
+  expect_rename_fails("Nul", "b", zxplat::k_err_not_found);
+  expect_rename_fails("a", "nuL", zxplat::k_err_exists);
+  EXPECT_TRUE(zxplat::name_taken("nul"));
+  EXPECT_FALSE(zxplat::same_file("nul", "nul"));
+  EXPECT_EQ(spellings_in(dir.path()), Names{"a"});
+}
+
+// -------------------------------------------------------------- renaming --
+
+TEST(zxplat, a_rename_moves_the_bytes_to_the_new_name) {
+  const TempDir dir;
+  fs::create_directory(dir.file("folder"));
+  kit::write_file(dir.file("a"), "bytes");
+  EXPECT_EQ(files.rename(dir.file("a"), dir.file("folder\\b")),
+            RenameResult::done);
+  EXPECT_FALSE(fs::exists(dir.file("a")));
+  EXPECT_EQ(kit::read_file(dir.file("folder/b")), "bytes");
+}
+
+TEST(zxplat, a_rename_finds_names_and_folders_in_another_case) {
+  const TempDir dir;
+  fs::create_directory(dir.file("Folder"));
+  kit::write_file(dir.file("Aa"), "bytes");
+  EXPECT_EQ(files.rename(dir.file("aA"), dir.file("FOLDER\\Bb")),
+            RenameResult::done);
+  EXPECT_EQ(spellings_in(dir.path()), Names{"Folder"});
+  EXPECT_EQ(spellings_in(dir.file("Folder")), Names{"Bb"});
+}
+
+TEST(zxplat, a_rename_never_replaces) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "source");
+  kit::write_file(dir.file("Target"), "kept");
+  fs::create_directory(dir.file("folder"));
+  for (const char* to : {"Target", "tARGET", "folder", "FOLDER"}) {
+    expect_rename_fails(dir.file("a"), dir.file(to), zxplat::k_err_exists);
+  }
+  EXPECT_EQ(kit::read_file(dir.file("a")), "source");
+  EXPECT_EQ(kit::read_file(dir.file("Target")), "kept");
+}
+
+TEST(zxplat, a_rename_may_change_the_case_alone) {
+  const TempDir dir;
+  kit::write_file(dir.file("name"), "bytes");
+  EXPECT_EQ(files.rename(dir.file("name"), dir.file("Name")),
+            RenameResult::done);
+  EXPECT_EQ(kit::read_file(dir.file("Name")), "bytes");
+  EXPECT_EQ(files.rename(dir.file("NAME"), dir.file("NaMe")),
+            RenameResult::done);
+  EXPECT_EQ(kit::read_file(dir.file("NaMe")), "bytes");
+  // The emulator says that it is done, and leaves the letters as they were.
+  if (kit::on_windows()) return;
+  EXPECT_EQ(spellings_in(dir.path()), Names{"NaMe"});
+}
+
+TEST(zxplat, a_rename_to_the_same_name_changes_nothing) {
+  const TempDir dir;
+  kit::write_file(dir.file("name"), "bytes");
+  EXPECT_EQ(files.rename(dir.file("name"), dir.file("name")),
+            RenameResult::done);
+  EXPECT_EQ(spellings_in(dir.path()), Names{"name"});
+  EXPECT_EQ(kit::read_file(dir.file("name")), "bytes");
+}
+
+TEST(zxplat, a_rename_to_another_name_of_the_same_file_is_refused) {
+  if (kit::on_windows()) GTEST_SKIP() << "the emulator does nothing, gladly";
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "bytes");
+  fs::create_hard_link(dir.file("a"), dir.file("b"));
+  expect_rename_fails(dir.file("a"), dir.file("b"), zxplat::k_err_exists);
+  EXPECT_EQ(spellings_in(dir.path()), (Names{"a", "b"}));
+}
+
+TEST(zxplat, a_rename_of_what_is_not_there_fails) {
+  const TempDir dir;
+  kit::write_file(dir.file("taken"), "kept");
+  expect_rename_fails(dir.file("a"), dir.file("b"), zxplat::k_err_not_found);
+  expect_rename_fails(dir.file("a"), dir.file("taken"),
+                      zxplat::k_err_not_found);
+  expect_rename_fails(dir.file("no\\a"), dir.file("b"),
+                      zxplat::k_err_path_not_found);
+}
+
+TEST(zxplat, a_rename_into_a_missing_folder_fails) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "kept");
+  expect_rename_fails(dir.file("a"), dir.file("no\\b"),
+                      zxplat::k_err_path_not_found);
+  EXPECT_EQ(kit::read_file(dir.file("a")), "kept");
+}
+
+TEST(zxplat, a_rename_moves_a_link_and_not_its_target) {
+  const TempDir dir;
+  if (!kit::make_link(dir.file("nowhere"), dir.file("link"))) {
+    GTEST_SKIP() << "no links here";
+  }
+  kit::write_file(dir.file("a"), "");
+  expect_rename_fails(dir.file("a"), dir.file("link"), zxplat::k_err_exists);
+  EXPECT_EQ(files.rename(dir.file("link"), dir.file("moved")),
+            RenameResult::done);
+  EXPECT_EQ(spellings_in(dir.path()), (Names{"a", "moved"}));
+}
+
+TEST(zxplat, a_rename_across_devices_says_so) {
+  const std::string other = kit::other_device_folder();
+  if (other.empty()) GTEST_SKIP() << "no second device";
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "kept");
+  const std::string target = other + "/zxplat-no-such-file";
+  set_last_error(k_untouched);
+  EXPECT_EQ(files.rename(dir.file("a"), target), RenameResult::other_device);
+  EXPECT_EQ(last_error(), zxplat::k_err_other_device);
+  EXPECT_EQ(kit::read_file(dir.file("a")), "kept");
+  EXPECT_FALSE(fs::exists(target));
+}
+
+// -------------------------------------------------------------- deleting --
+
+TEST(zxplat, remove_deletes_a_file_in_any_spelling) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  kit::write_file(dir.file("Bb"), "");
+  EXPECT_TRUE(files.remove(dir.file("a")));
+  EXPECT_TRUE(files.remove(dir.file("bB")));
+  EXPECT_TRUE(fs::is_empty(dir.path()));
+}
+
+TEST(zxplat, remove_leaves_folders_alone) {
+  const TempDir dir;
+  fs::create_directory(dir.file("folder"));
+  expect_remove_fails(dir.file("folder"), zxplat::k_err_denied);
+  expect_remove_fails(dir.file("FOLDER"), zxplat::k_err_denied);
+  EXPECT_TRUE(fs::exists(dir.file("folder")));
+}
+
+TEST(zxplat, remove_leaves_a_file_without_write_permission_alone) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  make_read_only(dir.file("a"));
+  expect_remove_fails(dir.file("a"), zxplat::k_err_denied);
+  EXPECT_TRUE(fs::exists(dir.file("a")));
+}
+
+TEST(zxplat, remove_of_a_missing_file_fails) {
+  const TempDir dir;
+  expect_remove_fails(dir.file("a"), zxplat::k_err_not_found);
+}
+
+TEST(zxplat, remove_deletes_a_link_and_not_its_target) {
+  const TempDir dir;
+  kit::write_file(dir.file("target"), "kept");
+  make_read_only(dir.file("target"));
+  if (!kit::make_link(dir.file("target"), dir.file("link"))) {
+    GTEST_SKIP() << "no links here";
+  }
+  EXPECT_TRUE(files.remove(dir.file("link")));
+  EXPECT_EQ(spellings_in(dir.path()), Names{"target"});
+}
+
+// ------------------------------------------------- questions about names --
+
+TEST(zxplat, kinds_tell_files_from_folders) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  EXPECT_EQ(zxplat::kind_of(dir.file("a")), NameKind::file);
+  EXPECT_EQ(zxplat::kind_of(dir.path()), NameKind::directory);
+  EXPECT_EQ(zxplat::kind_of(dir.path() + "\\"), NameKind::directory);
+  EXPECT_EQ(zxplat::kind_of(dir.path() + "/"), NameKind::directory);
+  EXPECT_EQ(zxplat::kind_of(dir.file("a\\")), NameKind::missing);
+  EXPECT_EQ(zxplat::kind_of("\\"), NameKind::directory);
+  expect_missing(dir.file("b"), zxplat::k_err_not_found);
+}
+
+TEST(zxplat, the_kind_of_a_link_is_that_of_its_target) {
+  const TempDir dir;
+  if (!kit::make_link(dir.path(), dir.file("folder")) ||
+      !kit::make_link("nowhere", dir.file("link"))) {
+    GTEST_SKIP() << "no links here";
+  }
+  EXPECT_EQ(zxplat::kind_of(dir.file("folder")), NameKind::directory);
+  expect_missing(dir.file("link"), zxplat::k_err_not_found);
+}
+
+TEST(zxplat, a_name_is_taken_by_whatever_has_it) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  EXPECT_TRUE(zxplat::name_taken(dir.file("a")));
+  EXPECT_TRUE(zxplat::name_taken(dir.file("A")));
+  EXPECT_TRUE(zxplat::name_taken(dir.path()));
+  expect_free(dir.file("b"));
+}
+
+TEST(zxplat, a_name_in_a_missing_folder_is_not_called_free) {
+  const TempDir dir;
+  set_last_error(k_untouched);
+  EXPECT_FALSE(zxplat::name_taken(dir.file("no\\a")));
+  EXPECT_EQ(last_error(), zxplat::k_err_path_not_found);
+}
+
+TEST(zxplat, a_name_is_taken_by_a_link_that_leads_nowhere) {
+  const TempDir dir;
+  if (!kit::make_link("nowhere", dir.file("link"))) {
+    GTEST_SKIP() << "no links here";
+  }
+  EXPECT_TRUE(zxplat::name_taken(dir.file("link")));
+  EXPECT_TRUE(zxplat::name_taken(dir.file("LINK")));
+  expect_free(dir.file("nowhere"));
+}
+
+TEST(zxplat, one_file_is_recognised_under_several_names) {
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  kit::write_file("a", "same");
+  kit::write_file("b", "same");
+  fs::create_hard_link("a", "hard");
+  for (const std::string& name :
+       {std::string("a"), std::string("A"), std::string(".\\a"),
+        std::string("hard"), dir.file("a")}) {
+    EXPECT_TRUE(zxplat::same_file("a", name)) << name;
+    EXPECT_TRUE(zxplat::same_file(name, "a")) << name;
+    EXPECT_FALSE(zxplat::same_file("b", name)) << name;
+  }
+}
+
+TEST(zxplat, a_link_is_the_same_file_as_its_target) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  if (!kit::make_link(dir.file("a"), dir.file("link"))) {
+    GTEST_SKIP() << "no links here";
+  }
+  EXPECT_TRUE(zxplat::same_file(dir.file("a"), dir.file("link")));
+}
+
+TEST(zxplat, a_missing_file_is_not_the_same_as_any) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  EXPECT_FALSE(zxplat::same_file(dir.file("a"), dir.file("b")));
+  EXPECT_EQ(last_error(), zxplat::k_err_not_found);
+  EXPECT_FALSE(zxplat::same_file(dir.file("b"), dir.file("b")));
+}
+
+TEST(zxplat, names_of_one_folder_lie_on_one_device) {
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  kit::write_file("a", "");
+  EXPECT_TRUE(zxplat::on_one_device("a", "b"));
+  EXPECT_TRUE(zxplat::on_one_device(dir.file("a"), "b"));
+  EXPECT_TRUE(zxplat::on_one_device("a", dir.file("b")));
+}
+
+TEST(zxplat, what_cannot_be_told_counts_as_one_device) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  set_last_error(k_untouched);
+  EXPECT_TRUE(zxplat::on_one_device(dir.file("missing"), dir.file("b")));
+  EXPECT_TRUE(zxplat::on_one_device(dir.file("a"), dir.file("no\\b")));
+  EXPECT_EQ(last_error(), k_untouched);
+}
+
+TEST(zxplat, another_device_is_known_ahead_of_the_rename) {
+  const std::string other = kit::other_device_folder();
+  if (other.empty()) GTEST_SKIP() << "no second device";
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  EXPECT_FALSE(zxplat::on_one_device(dir.file("a"), other + "\\b"));
+  EXPECT_FALSE(zxplat::on_one_device(dir.file("A"), other + "/b"));
+}
+
+TEST(zxplat, attributes_are_the_time_and_the_permissions) {
+  const TempDir dir;
+  const std::string from = dir.file("From");
+  const std::string to = dir.file("To");
+  kit::write_file(from, "x");
+  kit::write_file(to, "kept");
+  fs::last_write_time(from,
+                      fs::last_write_time(from) - std::chrono::hours(1000));
+  make_read_only(from);
+  EXPECT_TRUE(zxplat::copy_attributes(dir.file("FROM"), dir.file("TO")))
+      << last_error();
+  EXPECT_EQ(fs::last_write_time(to), fs::last_write_time(from));
+  EXPECT_EQ(fs::status(to).permissions(), fs::status(from).permissions());
+  EXPECT_EQ(kit::read_file(to), "kept");
+}
+
+TEST(zxplat, attributes_replace_those_of_a_file_without_write_permission) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  kit::write_file(dir.file("b"), "");
+  make_read_only(dir.file("b"));
+  EXPECT_TRUE(zxplat::copy_attributes(dir.file("a"), dir.file("b")))
+      << last_error();
+  EXPECT_TRUE(files.remove(dir.file("b"))) << last_error();
+}
+
+TEST(zxplat, attributes_need_two_files) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  EXPECT_FALSE(zxplat::copy_attributes(dir.file("a"), dir.file("b")));
+  EXPECT_EQ(last_error(), zxplat::k_err_not_found);
+  EXPECT_FALSE(zxplat::copy_attributes(dir.file("no\\b"), dir.file("a")));
+  EXPECT_EQ(last_error(), zxplat::k_err_path_not_found);
+}
+
+// --------------------------------------------------------------- folders --
+
+using FolderCall = std::size_t (*)(std::span<char>);
+
+// Expects the text from any buffer that is large enough, and nothing stored
+// in one that is not.
+void expect_text(FolderCall call, const std::string& expected) {
+  const std::size_t length = expected.size();
+  for (std::size_t size = 0; size < length + 3; ++size) {
+    std::string out(size, '#');
+    EXPECT_EQ(call(out), length) << size;
+    if (size <= length) {
+      EXPECT_EQ(out, std::string(size, '#'));
+    } else {
+      EXPECT_STREQ(out.c_str(), expected.c_str());
+      EXPECT_EQ(out.substr(length + 1), std::string(size - length - 1, '#'));
+    }
+  }
+}
+
+TEST(zxplat, the_working_directory_is_in_win32_form) {
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  const std::string expected = with_slashes(fs::current_path().string(), '\\');
+  expect_text(zxplat::current_directory, expected);
+  EXPECT_EQ(zxplat::kind_of(expected), NameKind::directory);
+}
+
+TEST(zxplat, the_temporary_directory_ends_in_a_backslash) {
+  char text[1000];
+  const std::size_t length = zxplat::temp_directory(text);
+  ASSERT_LT(length, sizeof text);
+  ASSERT_GT(length, 0u);
+  EXPECT_EQ(text[length - 1], '\\');
+  EXPECT_EQ(text[length], '\0');
+  EXPECT_EQ(std::string(text).find('/'), std::string::npos);
+  EXPECT_EQ(zxplat::kind_of(text), NameKind::directory);
+  expect_text(zxplat::temp_directory, text);
+}
+
+// Variables as they were at the end of the block.
+class Variables {
+ public:
+  explicit Variables(std::vector<std::string> wanted) {
+    for (const std::string& name : wanted) {
+      const char* value = std::getenv(name.c_str());
+      before.emplace_back(name, value != nullptr ? value : "");
+    }
+  }
+  Variables(const Variables&) = delete;
+  Variables& operator=(const Variables&) = delete;
+  ~Variables() {
+    for (const auto& [name, value] : before) {
+      kit::set_variable(name, value.empty() ? nullptr : value.c_str());
+    }
+  }
+
+  void clear() const {
+    for (const auto& entry : before) {
+      kit::set_variable(entry.first, nullptr);
+    }
+  }
+
+ private:
+  std::vector<std::pair<std::string, std::string>> before;
+};
+
+TEST(zxplat, the_temporary_directory_is_named_by_the_environment) {
+  if (kit::on_windows()) GTEST_SKIP() << "the system has its own rules";
+  const Variables variables({"TMPDIR", "TMP", "TEMP"});
+  variables.clear();
+  expect_text(zxplat::temp_directory, "\\tmp\\");
+  kit::set_variable("TEMP", "/a/b");
+  expect_text(zxplat::temp_directory, "\\a\\b\\");
+  kit::set_variable("TMP", "c\\d/");
+  expect_text(zxplat::temp_directory, "c\\d\\");
+  kit::set_variable("TMPDIR", "/");
+  expect_text(zxplat::temp_directory, "\\");
+  kit::set_variable("TMPDIR", "");
+  expect_text(zxplat::temp_directory, "c\\d\\");
+}
+
+// --------------------------------------------------------------- process --
+
+TEST(zxplat, the_clock_counts_seconds_since_1970) {
+  using std::chrono::system_clock;
+  const std::int64_t before = system_clock::to_time_t(system_clock::now());
+  const std::int64_t now = zxplat::process.clock();
+  const std::int64_t after = system_clock::to_time_t(system_clock::now());
+  EXPECT_GE(now, before - 1);
+  EXPECT_LE(now, after + 1);
+}
+
+TEST(zxplat, sleeping_lets_the_ticks_advance) {
+  // Some systems count in steps of 16 milliseconds.
+  const std::uint32_t before = zxplat::process.ticks();
+  zxplat::process.sleep(60);
+  const std::uint32_t passed = zxplat::process.ticks() - before;
+  EXPECT_GE(passed, 44u);
+  EXPECT_LT(passed, 30'000u);
+}
+
+// A test that runs itself again as a process of its own finds its folder
+// here; in the test itself it is empty.
+constexpr const char* k_child_variable = "ZXPLAT_TEST_FOLDER";
+
+std::string child_folder() {
+  const char* folder = std::getenv(k_child_variable);
+  return folder != nullptr ? folder : "";
+}
+
+kit::ProcessResult run_as_child(const TempDir& dir,
+                                kit::ProcessOptions options = {}) {
+  const auto* test = testing::UnitTest::GetInstance()->current_test_info();
+  const std::string name =
+      std::string(test->test_suite_name()) + "." + test->name();
+  options.variables.emplace_back(k_child_variable, dir.path());
+  options.variables.emplace_back("GTEST_FILTER", name);
+  return kit::run_process({kit::self_path()}, options);
+}
+
+void leave_a_note() {
+  kit::write_file(child_folder() + "/note", "exit handlers ran");
+}
+
+TEST(zxplat, exit_ends_the_process_through_its_exit_handlers) {
+  if (!child_folder().empty()) {
+    std::atexit(leave_a_note);
+    zxplat::process.exit(77);
+  }
+  const TempDir dir;
+  EXPECT_EQ(run_as_child(dir).exit_code, 77);
+  EXPECT_EQ(kit::read_file(dir.file("note")), "exit handlers ran");
+}
+
+// The child's part: no file comes to stand under the number of a stream, and
+// what is said there is lost.
+void write_without_streams() {
+  zxplat::prepare_process();
+  const Open file(child_folder() + "/data", OpenMode::create);
+  EXPECT_GT(file.fd, zxplat::k_stderr_fd);
+  for (const Fd fd : {0, 1, 2}) {
+    EXPECT_EQ(files.write(fd, "lost", 4), 4) << fd << ' ' << last_error();
+  }
+  char byte;
+  EXPECT_EQ(files.read(zxplat::k_stdin_fd, &byte, 1), 0);
+  EXPECT_EQ(file.write("data"), 4);
+}
+
+TEST(zxplat, streams_that_the_process_lacks_become_the_null_device) {
+  if (!child_folder().empty()) return write_without_streams();
+  const TempDir dir;
+  kit::ProcessOptions options;
+  options.missing = kit::k_no_input | kit::k_no_output | kit::k_no_errors;
+  const kit::ProcessResult result = run_as_child(dir, options);
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out + result.err, "");
+  EXPECT_EQ(kit::read_file(dir.file("data")), "data");
+}
+
+// The child's part: input to output, byte by byte.
+void copy_streams() {
+  zxplat::prepare_process();
+  EXPECT_TRUE(zxplat::set_binary(zxplat::k_stdin_fd));
+  EXPECT_TRUE(zxplat::set_binary(zxplat::k_stderr_fd));
+  EXPECT_FALSE(zxplat::is_terminal(zxplat::k_stdin_fd));
+  EXPECT_FALSE(zxplat::is_terminal(zxplat::k_stderr_fd));
+  char bytes[64];
+  std::int64_t count;
+  while ((count = files.read(0, bytes, sizeof bytes)) > 0) {
+    files.write(2, bytes, static_cast<std::size_t>(count));
+  }
+}
+
+TEST(zxplat, standard_streams_carry_every_byte) {
+  if (!child_folder().empty()) return copy_streams();
+  const TempDir dir;
+  kit::ProcessOptions options;
+  for (int i = 0; i < 1000 * 256; ++i) {
+    options.input += static_cast<char>(i);
+  }
+  const kit::ProcessResult result = run_as_child(dir, options);
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_TRUE(result.err == options.input) << result.err.size();
+}
+
+// The child's part: the number of the open file means nothing there.
+void look_for_the_file() {
+  const std::string number = kit::read_file(child_folder() + "/fd");
+  EXPECT_EQ(files.seek(std::stoi(number), 0, Whence::current), -1);
+  EXPECT_EQ(last_error(), zxplat::k_err_bad_handle);
+}
+
+TEST(zxplat, a_child_process_does_not_inherit_open_files) {
+  if (!child_folder().empty()) return look_for_the_file();
+  const TempDir dir;
+  const Open file(dir.file("a"), OpenMode::create);
+  kit::write_file(dir.file("fd"), std::to_string(file.fd));
+  const kit::ProcessResult result = run_as_child(dir);
+  EXPECT_EQ(result.exit_code, 0) << result.out;
+}
+
+// ---------------------------------------------------------------- memory --
+
+TEST(zxplat, the_heap_keeps_what_fits_when_a_block_is_resized) {
+  auto* block = static_cast<char*>(zxplat::heap_realloc(nullptr, 4));
+  ASSERT_NE(block, nullptr);
+  std::memcpy(block, "abcd", 4);
+  block = static_cast<char*>(zxplat::heap_realloc(block, 100'000));
+  ASSERT_NE(block, nullptr);
+  EXPECT_EQ(std::string_view(block, 4), "abcd");
+  block = static_cast<char*>(zxplat::heap_realloc(block, 2));
+  ASSERT_NE(block, nullptr);
+  EXPECT_EQ(std::string_view(block, 2), "ab");
+  EXPECT_EQ(zxplat::heap_realloc(block, 0), nullptr);
+}
+
+TEST(zxplat, an_exhausted_heap_gives_null_and_keeps_the_block) {
+  auto* block = static_cast<char*>(zxplat::heap_realloc(nullptr, 4));
+  ASSERT_NE(block, nullptr);
+  std::memcpy(block, "abcd", 4);
+  set_last_error(k_untouched);
+  EXPECT_EQ(zxplat::heap_realloc(block, SIZE_MAX / 2), nullptr);
+  EXPECT_EQ(last_error(), zxplat::k_err_no_memory);
+  EXPECT_EQ(std::string_view(block, 4), "abcd");
+  zxplat::heap_realloc(block, 0);
+}
+
+// ---------------------------------------------------------------- tables --
+
+TEST(zxplat, the_tables_start_as_the_systems_own_calls) {
+  EXPECT_EQ(std::memcmp(&files, &zxplat::system_files, sizeof files), 0);
+  EXPECT_EQ(std::memcmp(&zxplat::process, &zxplat::system_process,
+                        sizeof zxplat::process),
+            0);
+}
+
+int g_slept = 0;
+
+TEST(zxplat, a_test_can_replace_entries_of_the_tables) {
+  const TempDir dir;
+  files.remove = [](std::string_view) {
+    set_last_error(zxplat::k_err_sharing);
+    return false;
+  };
+  zxplat::process.sleep = [](std::uint32_t milliseconds) {
+    g_slept += static_cast<int>(milliseconds);
+  };
+  expect_remove_fails(dir.file("a"), zxplat::k_err_sharing);
+  zxplat::process.sleep(1'000'000);
+  EXPECT_EQ(g_slept, 1'000'000);
+
+  files = zxplat::system_files;
+  zxplat::process = zxplat::system_process;
+  expect_remove_fails(dir.file("a"), zxplat::k_err_not_found);
+}
+
+}  // namespace

@@ -1,0 +1,107 @@
+// zxfile.h - zxStream, the library's buffered stream over a descriptor of
+// the platform.
+//
+// The library uses no stdio: here each system call can be made to fail by a
+// test, the buffer is open to callers that read byte by byte, and a failed
+// close is never repeated on freed memory.  All streams are binary.
+//
+// A stream is idle, reading or writing, and changes over by itself: unread
+// bytes are given back to the file, unwritten ones are flushed.  A seek to a
+// place whose bytes are in the read buffer costs no system call.
+//
+// Read-ahead adapts: it starts small behind each seek and doubles while the
+// reading goes on in sequence, so that scattered records cost one small read
+// each and whole files few large ones.
+#ifndef ZXFILE_H
+#define ZXFILE_H
+
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+
+#include "zxplat.h"
+
+class zxStream {
+ public:
+  // A stream over an open descriptor, which the stream does not own until
+  // close() is called.  The buffer is taken at the first use.
+  constexpr explicit zxStream(zxplat::Fd descriptor) : fd(descriptor) {}
+  zxStream(const zxStream&) = delete;
+  zxStream& operator=(const zxStream&) = delete;
+
+  // Opens a file; null on failure, the reason in zxplat::last_error().  The
+  // stream goes by close() only.
+  static zxStream* open(std::string_view name, zxplat::OpenMode mode);
+
+  // Flushes, closes the descriptor and destroys a stream that open() made,
+  // whatever the result; false if data may not have reached the file, now or
+  // at an earlier write.
+  static bool close(zxStream* stream);
+
+  // Reads up to `size` bytes; the count.  A short count sets eof() or
+  // error().
+  std::size_t read(void* out, std::size_t size);
+
+  // Takes `size` bytes for writing; false, and error() set, if the system
+  // refused bytes.
+  bool write(const void* bytes, std::size_t size);
+
+  // Writes down what write() took; false on failure.
+  bool flush();
+
+  // The same, and forces the file's bytes to the device.
+  bool sync();
+
+  // Moves the position; false, the position unknown, on failure.  Clears
+  // eof().
+  bool seek(std::int64_t offset, zxplat::Whence whence);
+
+  // The position, or -1.
+  std::int64_t tell();
+
+  // An end of file was met; a system call failed since the stream was made.
+  bool eof() const { return at_end; }
+  bool error() const { return read_failed || write_failed; }
+
+  // Writes reach the system at once, not when the buffer is full; for
+  // streams that a person reads.
+  void set_unbuffered() { unbuffered = true; }
+
+  zxplat::Fd descriptor() const { return fd; }
+
+ private:
+  enum class State : std::uint8_t { idle, reading, writing };
+
+  void take_buffer();
+  void fill();
+  bool begin_reading();
+  bool begin_writing();
+  bool give_back_unread();
+  bool write_down(const char* bytes, std::size_t size);
+  bool move_within_buffer(std::int64_t offset);
+  std::size_t read_from_system(char* out, std::size_t size);
+  std::size_t read_from_buffer(char* out, std::size_t size);
+
+  zxplat::Fd fd;
+  State state = State::idle;
+  bool at_end = false;
+  bool read_failed = false;
+  bool write_failed = false;  // bytes were lost: close() will say so
+  bool unbuffered = false;
+
+  // Reading: bytes [next, end) are unread.  Writing: bytes [0, next) are to
+  // be written.
+  char* buffer = nullptr;
+  std::size_t next = 0;
+  std::size_t end = 0;
+  std::size_t read_ahead = 0;
+
+  // The descriptor's position where it is known, else -1.
+  std::int64_t position = -1;
+};
+
+// The streams of the three standard descriptors; they live as long as the
+// process and are never closed.
+zxStream& zx_standard_stream(zxplat::Fd descriptor);
+
+#endif  // ZXFILE_H

@@ -1,0 +1,46 @@
+// zxle.h - little-endian numbers in files.
+//
+// Structures that lie in files byte for byte are built from these: each is
+// exactly its bytes, needs no alignment and reads the same on every machine,
+// so a structure of them has the file's layout without padding or packing.
+#ifndef ZXLE_H
+#define ZXLE_H
+
+#include <cstddef>
+#include <type_traits>
+
+// The integer T as sizeof(T) bytes, the lowest first.  It converts from and
+// to T like the integer itself.  Default construction leaves the bytes alone.
+template <class T>
+class zxLe {
+  static_assert(std::is_integral_v<T>);
+  using Bits = std::make_unsigned_t<T>;
+
+ public:
+  zxLe() = default;
+  constexpr zxLe(T value) { store(value); }
+  constexpr zxLe& operator=(T value) {
+    store(value);
+    return *this;
+  }
+
+  constexpr operator T() const {
+    Bits bits = 0;
+    for (std::size_t i = 0; i < sizeof(T); ++i)
+      bits = static_cast<Bits>(bits | static_cast<Bits>(bytes[i]) << 8 * i);
+    return static_cast<T>(bits);
+  }
+
+ private:
+  constexpr void store(T value) {
+    const Bits bits = static_cast<Bits>(value);
+    for (std::size_t i = 0; i < sizeof(T); ++i)
+      bytes[i] = static_cast<unsigned char>(bits >> 8 * i);
+  }
+
+  unsigned char bytes[sizeof(T)];
+};
+
+static_assert(sizeof(zxLe<int>) == 4 && alignof(zxLe<int>) == 1);
+
+#endif  // ZXLE_H

@@ -1,0 +1,103 @@
+// zxmainf.cpp - start-up and shutdown.
+// Tests: tests/zxlib/zxmainf_test.cpp.
+#include "zxmainf.h"
+
+#include <cstdlib>
+
+#include "zxpkg.h"
+#include "zxplat.h"
+#include "zxsfmt.h"
+#include "zxsys2.h"
+
+constinit zxStr program_path;
+constinit zxStr program_name;
+constinit zxStr program_version;
+constinit zxStr current_dir;
+constinit zxQVA<zxStr> g_args;
+
+namespace {
+
+bool not_yet_started = true;
+
+constexpr std::int32_t k_max_name = 20;
+
+ZxPackage package_record = {"zx", "3.64b", "test w32  vc", 0, nullptr};
+[[maybe_unused]] const bool package_registered =
+    (register_package(&package_record), true);
+
+// ---- what the failure core asks for
+
+const char* path_for_core() { return program_path.c_str(); }
+const char* version_for_core() { return program_version.c_str(); }
+
+// By way of the stream, so that nothing overtakes what was printed before.
+void print_for_core(std::string_view text) {
+  zxStream& out = zx_standard_stream(zxplat::k_stdout_fd);
+  out.write(text.data(), text.size());
+  out.flush();
+}
+
+// ---- program values
+
+bool has_ending(const zxStr& text, std::string_view ending) {
+  return text.view().ends_with(ending);
+}
+
+// The name that the program goes by, from an upper-cased file name.
+zxStr name_from_file(zxStr name) {
+  name.to_upper();
+  if (has_ending(name, ".EXE") || has_ending(name, ".DLL"))
+    name.set_length(name.length() - 4);
+  if (name.length() > k_max_name) name.set_length(k_max_name);
+  return name;
+}
+
+void set_program_values(const char* path) {
+  program_path = path;
+  program_version = program_version_text ? program_version_text : "v0";
+  program_name = name_from_file(file_part(program_path));
+  current_dir = working_directory();
+}
+
+void bind_standard_streams() {
+  const zxStr name = "-";
+  attach_stream(g_stdin, name, zx_standard_stream(zxplat::k_stdin_fd));
+  attach_stream(g_stdout, name, zx_standard_stream(zxplat::k_stdout_fd));
+  attach_stream(g_stderr, name, zx_standard_stream(zxplat::k_stderr_fd));
+}
+
+// The order of clearing is fixed; other modules join it here.
+void clear_at_exit() {
+  program_path.clear();
+  program_version.clear();
+  current_dir.clear();
+  program_name.clear();
+  g_args.clear();
+  clear_temp_path();
+  g_stdin.close();
+  g_stdout.close();
+  g_stderr.close();
+}
+
+}  // namespace
+
+void init_zxlib_args(int argc, const char* const* argv) {
+  if (!not_yet_started) return bailf("init_zxlib called twice");
+  not_yet_started = false;
+  zxplat::prepare_process();
+  std::atexit(clear_at_exit);
+  bail_hooks = {path_for_core, version_for_core, print_for_core};
+  set_program_values(argc > 0 && argv[0] != nullptr ? argv[0] : "");
+  for (int i = 1; i < argc; ++i) g_args.append(argv[i]);
+  bind_standard_streams();
+}
+
+void attach_stream(zxBFile& file, const zxStr& name, zxStream& stream) {
+  const zxplat::Fd descriptor = stream.descriptor();
+  if (!ZX_ASSERT_AT(zxplat::set_binary(descriptor), "zxmainf", 44)) return;
+  if (descriptor == zxplat::k_stderr_fd || zxplat::is_terminal(descriptor))
+    stream.set_unbuffered();
+  file.handle = &stream;
+  file.name = name;
+  file.lines = 0;
+}

@@ -1,0 +1,5 @@
+// zxmainf_version_text.cpp - the default of a value that an application may
+// define itself: alone in its object, it is left out of the program then.
+#include "zxmainf.h"
+
+const char* program_version_text = nullptr;

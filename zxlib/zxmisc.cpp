@@ -1,0 +1,60 @@
+// zxmisc.cpp - source positions and the allocator slot.
+// Tests: tests/zxlib/zxmisc_test.cpp.
+#include "zxmisc.h"
+
+#include <cstdlib>
+#include <cstring>
+
+#include "zxatsys.h"
+#include "zxplat.h"
+
+zxPos zx_pos;
+
+namespace {
+
+// The longest name that a position shows, and the room for its text: that
+// name, a colon, eleven characters of a number and a NUL.
+constexpr std::size_t k_max_shown = 20;
+constexpr std::size_t k_pos_room = 48;
+char pos_text[k_pos_room];
+
+bool ends_in_cpp(const char* name, std::size_t length) {
+  const char* end = name + length;
+  return length >= 4 && end[-4] == '.' && zx_lower(end[-3]) == 'c' &&
+         zx_lower(end[-2]) == 'p' && zx_lower(end[-1]) == 'p';
+}
+
+// Writes the name, shortened, at the start of pos_text; returns its length.
+std::size_t write_shown_name(const char* name) {
+  std::size_t length = std::strlen(name);
+  const bool cut = length > k_max_shown;
+  if (cut && ends_in_cpp(name, length)) length -= 4;
+  const std::size_t shown = length < k_max_shown ? length : k_max_shown;
+  std::memcpy(pos_text, name + length - shown, shown);
+  if (cut) pos_text[0] = '~';
+  return shown;
+}
+
+// Memory for strings is taken from the heap.  Exhaustion is the end of the
+// process, also while another failure is being handled, for no caller can
+// go on without the block.
+void* heap_slot(void* block, std::size_t size) {
+  void* result = zxplat::heap_realloc(block, size);
+  if (result == nullptr && size != 0) {
+    bail_code(2000);
+    std::_Exit(k_exit_failure);
+  }
+  return result;
+}
+
+}  // namespace
+
+zxReallocFunction zx_realloc = heap_slot;
+
+const char* pos_string(zxPos& position) {
+  if (position.file == nullptr) position.file = "?";
+  zxText text(pos_text, write_shown_name(position.file));
+  text.add(":");
+  text.add_int(position.line);
+  return pos_text;
+}

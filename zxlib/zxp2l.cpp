@@ -1,0 +1,325 @@
+// zxp2l.cpp - Hebrew reordering.
+// Tests: tests/zxlib/zxp2l_test.cpp.
+#include "zxp2l.h"
+
+#include <cstring>
+#include <string_view>
+
+namespace {
+
+constexpr char k_ltr_mark = static_cast<char>(253);
+constexpr char k_rtl_mark = static_cast<char>(254);
+// The distance of the Hebrew letters of code page 1255 from those of 862.
+constexpr int k_dos_distance = 96;
+
+constexpr unsigned k_class_letter = k_class_latin | k_class_hebrew;
+
+bool is_hebrew(char byte) { return zx_is(byte, k_class_hebrew); }
+bool is_mark(char byte) { return byte == k_ltr_mark || byte == k_rtl_mark; }
+bool is_strong(char byte) {
+  return zx_is(byte, k_class_letter) || is_mark(byte);
+}
+bool is_rtl(char strong_byte) {
+  return is_hebrew(strong_byte) || strong_byte == k_rtl_mark;
+}
+bool is_separator(char byte) {
+  return byte != '\0' && std::strchr(",/:+-.$", byte) != nullptr;
+}
+
+char mirrored(char byte) {
+  switch (byte) {
+    case '(': return ')';
+    case ')': return '(';
+    case '[': return ']';
+    case ']': return '[';
+    case '{': return '}';
+    case '}': return '{';
+    default: return byte;
+  }
+}
+
+// ---- runs
+
+struct Run {
+  std::size_t length;
+  bool rtl;
+};
+
+std::size_t find_strong(std::string_view text, std::size_t from) {
+  while (from < text.size() && !is_strong(text[from])) ++from;
+  return from;
+}
+
+// Gives back the neutral bytes at the end of a run.
+std::size_t without_neutral_end(std::string_view run) {
+  std::size_t length = run.size();
+  while (length > 0 && !is_strong(run[length - 1]) &&
+         !zx_is_digit(run[length - 1]))
+    --length;
+  return length;
+}
+
+// The run at the start of a text that is not empty.
+Run split_run(std::string_view text, bool base) {
+  const std::size_t strong = find_strong(text, 0);
+  if (strong == text.size()) return {text.size(), base};
+  const bool rtl = is_rtl(text[strong]);
+  if (rtl != base && strong > 0) return {strong, base};
+  std::size_t end = strong;
+  while (end < text.size() && is_rtl(text[end]) == rtl)
+    end = find_strong(text, end + 1);
+  if (rtl != base) end = without_neutral_end(text.substr(0, end));
+  return {end, rtl};
+}
+
+// The length of a run of the lesser direction up to its last letter.
+std::size_t up_to_last_letter(std::string_view run, bool rtl) {
+  const unsigned letters = rtl ? k_class_hebrew : k_class_latin;
+  std::size_t length = run.size();
+  while (length > 0 && !zx_is(run[length - 1], letters)) --length;
+  return length;
+}
+
+// ---- reversing
+
+// True if a number ends with byte i: a digit, or a percent sign behind one.
+bool ends_number(std::string_view run, std::size_t i) {
+  if (zx_is_digit(run[i])) return true;
+  return run[i] == '%' && i > 0 && zx_is_digit(run[i - 1]);
+}
+
+// Where the number that ends with byte i starts: over digits, over a
+// separator that has a digit ahead of it, and a currency sign in front
+// unless the run starts with it.
+std::size_t number_start(std::string_view run, std::size_t i) {
+  while (i > 0) {
+    const char before = run[i - 1];
+    const bool joins = zx_is_digit(before) ||
+                       (is_separator(before) && i > 1 &&
+                        zx_is_digit(run[i - 2]));
+    if (!joins) break;
+    --i;
+  }
+  if (i > 1 && run[i - 1] == '$') --i;
+  return i;
+}
+
+// Writes a right-to-left run reversed; `out` has room for twice its length.
+// With `mark`, a number behind a written currency sign is kept off it by a
+// right-to-left mark.  Returns the end of what was written.
+char* reverse_run(char* out, std::string_view run, bool mark) {
+  char* const start = out;
+  for (std::size_t i = run.size(); i-- > 0;) {
+    if (run[i] == k_rtl_mark) continue;
+    if (!ends_number(run, i)) {
+      *out++ = mirrored(run[i]);
+      continue;
+    }
+    const std::size_t first = number_start(run, i);
+    if (mark && out > start && out[-1] == '$' && zx_is_digit(run[first]))
+      *out++ = k_rtl_mark;
+    const std::size_t length = i - first + 1;
+    std::memcpy(out, run.data() + first, length);
+    out += length;
+    i = first;
+  }
+  return out;
+}
+
+// ---- composing a line
+
+// The first digit or Hebrew letter of a text, or NUL.  A digit there would
+// be read as a part of a Latin run that stands ahead of it.
+char leading_anchor(std::string_view text) {
+  for (const char byte : text)
+    if (zx_is(byte, k_class_digit | k_class_hebrew)) return byte;
+  return '\0';
+}
+
+// A line under composition.  Pieces join in front of it or behind it, by the
+// base direction; the room is twice the line's length, which the reversing
+// never exceeds, a mark for each joint included.
+class Line {
+ public:
+  Line(std::size_t source_length, bool base) : rtl(base) {
+    const std::size_t room_size = 2 * source_length;
+    room = text.buffer(zx_count(room_size));
+    start = end = rtl ? room + room_size : room;
+  }
+
+  // Adds a run reversed: behind the line at once, in front of it by way of
+  // the free room at the start.
+  void add_reversed(std::string_view run, bool mark) {
+    char* const out = rtl ? room : end;
+    char* const out_end = reverse_run(out, run, mark);
+    if (rtl)
+      put_in_front({out, static_cast<std::size_t>(out_end - out)});
+    else
+      end = out_end;
+  }
+
+  void add(std::string_view piece) {
+    if (rtl) {
+      put_in_front(piece);
+    } else {
+      std::memcpy(end, piece.data(), piece.size());
+      end += piece.size();
+    }
+  }
+
+  void add(char byte) { add(std::string_view(&byte, 1)); }
+
+  bool is_empty() const { return start == end; }
+
+  // True if the first digit or Hebrew letter of the line is a digit; known
+  // for a line that grows at its front.
+  bool leads_with_digit() const { return zx_is_digit(anchor); }
+
+  zxStr take() const {
+    return {start, static_cast<std::int32_t>(end - start)};
+  }
+
+ private:
+  void put_in_front(std::string_view piece) {
+    start -= piece.size();
+    std::memmove(start, piece.data(), piece.size());
+    if (const char found = leading_anchor({start, piece.size()}))
+      anchor = found;
+  }
+
+  zxStr text;
+  bool rtl;
+  char anchor = '\0';
+  char* room = nullptr;
+  char* start = nullptr;
+  char* end = nullptr;
+};
+
+// Cuts a physical line into runs and adds each to the line.
+void add_logical(Line& line, std::string_view source, bool base) {
+  while (!source.empty()) {
+    Run run = split_run(source, base);
+    if (run.rtl != base)
+      run.length = up_to_last_letter(source.substr(0, run.length), run.rtl);
+    if (!ZX_ASSERT(run.length > 0)) return;
+    const std::string_view piece = source.substr(0, run.length);
+    source.remove_prefix(run.length);
+    if (run.rtl) {
+      line.add_reversed(piece, true);
+    } else if (base) {
+      if (line.leads_with_digit()) line.add(k_rtl_mark);
+      line.add(piece);
+    } else {
+      if (!line.is_empty() && zx_is_digit(leading_anchor(piece)))
+        line.add(k_ltr_mark);
+      line.add(piece);
+    }
+  }
+}
+
+zxStr without_ltr_marks(std::string_view run) {
+  zxStr kept;
+  kept.reserve(zx_count(run.size()));
+  for (const char byte : run)
+    if (byte != k_ltr_mark) kept.append(byte);
+  return kept;
+}
+
+// Splits a text at CR LF and converts each line by itself.
+template <class Convert>
+zxStr convert_lines(const zxStr& text, Convert convert) {
+  constexpr std::string_view k_line_end = "\r\n";
+  std::string_view rest = text.view();
+  std::size_t end = rest.find(k_line_end);
+  if (end == std::string_view::npos) return convert(text);
+  zxStr result;
+  while (end != std::string_view::npos) {
+    result.append(convert(zxStr(rest.substr(0, end))));
+    result.append("\r\n", 2);
+    rest.remove_prefix(end + k_line_end.size());
+    end = rest.find(k_line_end);
+  }
+  return result.append(convert(zxStr(rest)));
+}
+
+// Moves the bytes of one class by a distance.
+void shift_class(zxStr& text, unsigned class_bit, int distance) {
+  for (std::int32_t i = 0; i < text.length(); ++i) {
+    const char byte = text.c_str()[i];
+    if (zx_is(byte, class_bit)) text.at(i) = static_cast<char>(byte + distance);
+  }
+}
+
+}  // namespace
+
+zxStr logical_from_phys(const zxStr& text, bool rtl) {
+  if (text.is_empty()) return {};
+  zxStr source = text;
+  dos_to_ansi(source);
+  Line line(zx_size(source.length()), rtl);
+  add_logical(line, source.view(), rtl);
+  return line.take();
+}
+
+zxStr phys_from_logical(const zxStr& text, bool rtl) {
+  if (text.is_empty()) return {};
+  Line line(zx_size(text.length()), rtl);
+  std::string_view source = text.view();
+  while (!source.empty()) {
+    const Run run = split_run(source, rtl);
+    if (!ZX_ASSERT(run.length > 0 && run.length <= source.size())) break;
+    const std::string_view piece = source.substr(0, run.length);
+    if (run.rtl) {
+      line.add_reversed(piece, false);
+    } else {
+      const zxStr kept = without_ltr_marks(piece);
+      line.add(kept.view());
+    }
+    source.remove_prefix(run.length);
+  }
+  zxStr result = line.take();
+  ansi_to_dos(result);
+  return result;
+}
+
+zxStr logical_from_phys_lines(const zxStr& text, bool rtl) {
+  return convert_lines(text, [rtl](const zxStr& line) {
+    return logical_from_phys(line, rtl);
+  });
+}
+
+zxStr phys_from_logical_lines(const zxStr& text, bool rtl) {
+  return convert_lines(text, [rtl](const zxStr& line) {
+    return phys_from_logical(line, rtl);
+  });
+}
+
+void dos_to_ansi(zxStr& text) {
+  shift_class(text, k_class_hebdos, k_dos_distance);
+}
+
+void ansi_to_dos(zxStr& text) {
+  shift_class(text, k_class_hebrew, -k_dos_distance);
+}
+
+// Every code point here lies between 0x80 and 0x7FF: two bytes.
+zxStr ansi_to_utf8(const zxStr& text) {
+  constexpr int k_alef_byte = 224;
+  constexpr int k_alef = 0x5D0;
+  constexpr int k_tav = 0x5EA;
+  zxStr result;
+  char* const start = result.buffer(zx_count(2 * zx_size(text.length())));
+  char* out = start;
+  for (const char byte : text.view()) {
+    const int value = static_cast<unsigned char>(byte);
+    const int code = value - k_alef_byte + k_alef;
+    if (value < 0x80) {
+      *out++ = byte;
+    } else if (code <= k_tav) {
+      *out++ = static_cast<char>(0xC0 | code >> 6);
+      *out++ = static_cast<char>(0x80 | (code & 0x3F));
+    }
+  }
+  result.set_length(static_cast<std::int32_t>(out - start));
+  return result;
+}

@@ -1,0 +1,203 @@
+// zxplat.h - the platform line: all that the library asks of the operating
+// system.
+//
+// No other header or source of the library names a system call, a system
+// header or a system macro; the build picks the sources that carry this out
+// for its target.  The terms are the library's own:
+//
+//   names       byte strings in Win32 form: the backslash separates, the
+//               forward slash is accepted, "C:" is understood.  At most
+//               k_max_name bytes; a name with a NUL byte inside is refused
+//               (k_err_bad_name).  Natively there is one drive, "C:" or
+//               nothing; a name that is not there as spelled is looked for
+//               without regard to ASCII case, the exact spelling first.
+//   descriptors small integers, 0 to 2 the standard streams.  All byte
+//               streams are binary.
+//   failures    a result that says so, and then the system's number in
+//               last_error().  A call that succeeds leaves last_error()
+//               alone, so the number of the last failure stays readable.
+//
+// Calls that fail in real life go through the tables `files` and `process`,
+// which a test may replace entry by entry; everything else is a plain
+// function.  Nothing here allocates, keeps a pointer that it was given, or
+// calls back into the library.
+#ifndef ZXPLAT_H
+#define ZXPLAT_H
+
+#include <cstddef>
+#include <cstdint>
+#include <span>
+#include <string_view>
+
+namespace zxplat {
+
+// The longest name that the platform takes, in bytes.
+inline constexpr std::size_t k_max_name = 4095;
+
+// Error numbers that callers or tests tell apart.  They are the Windows
+// numbers on both targets.
+inline constexpr int k_err_none = 0;
+inline constexpr int k_err_not_found = 2;       // the last component is missing
+inline constexpr int k_err_path_not_found = 3;  // a folder ahead of it is
+inline constexpr int k_err_too_many_open = 4;
+inline constexpr int k_err_denied = 5;
+inline constexpr int k_err_bad_handle = 6;
+inline constexpr int k_err_no_memory = 8;
+inline constexpr int k_err_other_device = 17;
+inline constexpr int k_err_write_protected = 19;
+inline constexpr int k_err_io = 31;
+inline constexpr int k_err_sharing = 32;
+inline constexpr int k_err_lock = 33;
+inline constexpr int k_err_exists_on_create = 80;
+inline constexpr int k_err_bad_parameter = 87;
+inline constexpr int k_err_broken_pipe = 109;
+inline constexpr int k_err_disk_full = 112;
+inline constexpr int k_err_bad_name = 123;
+inline constexpr int k_err_exists = 183;
+
+// The number of the last call of this module that failed, or what
+// set_last_error() stored behind it.
+int last_error();
+void set_last_error(int number);
+
+// ---------------------------------------------------------------- files --
+
+using Fd = int;
+inline constexpr Fd k_no_fd = -1;
+inline constexpr Fd k_stdin_fd = 0;
+inline constexpr Fd k_stdout_fd = 1;
+inline constexpr Fd k_stderr_fd = 2;
+
+enum class OpenMode {
+  read,        // existing file, reading
+  create,      // writing; made, or cut to nothing
+  create_new,  // writing; refused (80) if the name is taken, even by a link
+  create_private,  // as create_new, for the owner's eyes alone
+  read_write,      // existing file, both; refused without the right to write
+  append,          // writing, always at the end; made if it is missing.  The
+                   // position after opening is the end.
+};
+
+enum class Whence { start, current, end };
+
+enum class RenameResult {
+  done,
+  other_device,  // the two names lie on different devices (17)
+  failed,        // for the reason in last_error()
+};
+
+// The calls on files that a test can make fail.
+struct FileCalls {
+  // Opens `name`; k_no_fd on failure.  A folder fails with 5.  The name
+  // "nul" in any case is the null device.  Other processes are not locked
+  // out, and child processes do not inherit the descriptor.
+  Fd (*open)(std::string_view name, OpenMode mode);
+
+  // Reads up to `size` bytes; the count, 0 at the end of the file, -1 on
+  // failure.  A short count is no failure.
+  std::int64_t (*read)(Fd fd, void* buffer, std::size_t size);
+
+  // Writes up to `size` bytes; the count, which may be short, or -1.
+  std::int64_t (*write)(Fd fd, const void* buffer, std::size_t size);
+
+  // Moves the position; the new position from the start, or -1.
+  std::int64_t (*seek)(Fd fd, std::int64_t offset, Whence whence);
+
+  // Forces what was written down to the device.
+  bool (*flush)(Fd fd);
+
+  // The file's size in bytes, or -1.
+  std::int64_t (*size)(Fd fd);
+
+  // Gives the descriptor back.  It is gone whatever the result is; false
+  // means that data may not have reached the file.
+  bool (*close)(Fd fd);
+
+  // Renames; an existing `to` is never replaced (183).
+  RenameResult (*rename)(std::string_view from, std::string_view to);
+
+  // Deletes a file.  A folder fails with 5, and so does a file without any
+  // write permission.
+  bool (*remove)(std::string_view name);
+};
+
+// The system's own calls, and the table in force, which starts as a copy of
+// them.
+extern const FileCalls system_files;
+extern FileCalls files;
+
+// What a name stands for.  Links are followed.
+enum class NameKind {
+  missing,    // nothing, or not to be reached; the reason in last_error()
+  file,       // a regular file
+  directory,  // a folder
+  device,     // a character device
+  other,      // a pipe, a socket or the like
+};
+NameKind kind_of(std::string_view name);
+
+// True if something has this name, be it a link that leads nowhere.  False
+// with 2 in last_error() says that the name is free; with any other number,
+// that it cannot be told.
+bool name_taken(std::string_view name);
+
+// True if both names lead to one existing file.
+bool same_file(std::string_view a, std::string_view b);
+
+// False if it is known that a rename of the file `from` to the name `to`
+// would have to cross devices; true otherwise, also when it cannot be told.
+bool on_one_device(std::string_view from, std::string_view to);
+
+// Gives the file `to` the modification time and the permissions of `from`.
+bool copy_attributes(std::string_view from, std::string_view to);
+
+// The working directory and the system's directory for temporary files, in
+// Win32 form.  Each returns the length of the text and stores it with a NUL
+// if it fits `out`, NUL included; a result of out.size() or more asks for a
+// larger buffer (nothing was stored), 0 means failure.  The temporary
+// directory is, natively, TMPDIR, TMP or TEMP of the environment, else
+// "\tmp\"; it ends in a backslash.
+std::size_t current_directory(std::span<char> out);
+std::size_t temp_directory(std::span<char> out);
+
+// -------------------------------------------------------------- process --
+
+// The calls on the process and its clocks that a test can replace.
+struct ProcessCalls {
+  // Ends the process through its exit handlers; comes back only in tests.
+  void (*exit)(int code);
+
+  // Seconds since 1970-01-01 00:00 UTC.
+  std::int64_t (*clock)();
+
+  // Milliseconds since some moment, modulo 2^32.
+  std::uint32_t (*ticks)();
+
+  // Lets the given time pass.
+  void (*sleep)(std::uint32_t milliseconds);
+};
+
+extern const ProcessCalls system_process;
+extern ProcessCalls process;
+
+// Prepares the process, once, ahead of everything else: a write to a closed
+// pipe is an error and not a signal, and each of the descriptors 0 to 2
+// that the process was started without is bound to the null device, so that
+// no data file can come to stand under its number.
+void prepare_process();
+
+// Switches a descriptor to bytes without translation; false if that fails.
+bool set_binary(Fd fd);
+
+// True if a person sits at the other end.
+bool is_terminal(Fd fd);
+
+// --------------------------------------------------------------- memory --
+
+// The heap: null and a size allocates, a block and a size resizes, a block
+// and 0 frees (null comes back).  Null on exhaustion; the old block stays.
+void* heap_realloc(void* block, std::size_t size);
+
+}  // namespace zxplat
+
+#endif  // ZXPLAT_H

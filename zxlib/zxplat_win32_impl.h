@@ -1,0 +1,56 @@
+// zxplat_win32_impl.h - private to zxplat_win32*.cpp: what the calls of the
+// runtime and of the system do to the last error, and names closed by a NUL.
+#ifndef ZXPLAT_WIN32_IMPL_H
+#define ZXPLAT_WIN32_IMPL_H
+
+#include <cstddef>
+#include <string_view>
+
+#include "zxplat.h"
+
+namespace zxplat::win32 {
+
+// Stands around the calls of one operation.  They may leave any number
+// behind even when they succeed; settle() puts things right.
+class Attempt {
+ public:
+  Attempt();
+
+  // Passes `result` on.  Success restores the number from before, failure
+  // sees to it that there is one and that it is the library's.
+  template <typename Result>
+  Result settle(Result result, bool is_good) const {
+    is_good ? restore() : settle_failure();
+    return result;
+  }
+
+  bool settle(bool is_good) const { return settle(is_good, is_good); }
+
+  void restore() const;
+
+ private:
+  static void settle_failure();
+
+  int before;
+};
+
+// A name for the system's calls.  Some four kilobytes; it lives on the stack
+// of one call.
+struct Name {
+  char text[k_max_name + 1];
+};
+
+// True for the name of the null device.
+bool is_null_device(std::string_view name);
+
+// Closes a name by a NUL.  False with the number set if no file can have
+// that name; the null device is none.
+bool to_name(std::string_view name, Name& out);
+
+// Stores the number of a failed call.  Always false, for the caller to
+// return.
+bool fail_with(int number);
+
+}  // namespace zxplat::win32
+
+#endif  // ZXPLAT_WIN32_IMPL_H

@@ -1,0 +1,456 @@
+// zxstr.cpp - the string class and the checksum of 16 bits.
+// Tests: tests/zxlib/zxstr_test.cpp.
+#include "zxstr.h"
+
+#include <array>
+#include <climits>
+#include <cstring>
+
+namespace {
+
+// What append and set_length take beyond the length asked for.
+constexpr std::int32_t k_margin = 64;
+// Bytes of a block beyond its capacity: three counts, the NUL, three spare.
+constexpr std::size_t k_overhead = 16;
+
+std::size_t block_size(std::int32_t capacity) {
+  return zx_size(capacity) + k_overhead;
+}
+
+zxStrRep* new_block(std::int32_t capacity) {
+  void* block = zx_realloc(nullptr, block_size(capacity));
+  return ::new (block) zxStrRep{capacity, 1, 0, {'\0'}};
+}
+
+// The sum of two lengths, or -1 if no string can be that long.
+std::int32_t sum_of(std::int32_t a, std::int32_t b) {
+  const std::int64_t sum = std::int64_t{a} + b;
+  return sum > INT32_MAX ? -1 : static_cast<std::int32_t>(sum);
+}
+
+// Sets the characters of a block that is large enough for both pieces; `a`
+// may lie within it.
+void fill(zxStrRep* rep, const char* a, std::int32_t a_length, const char* b,
+          std::int32_t b_length) {
+  std::memmove(rep->data, a, zx_size(a_length));
+  if (b_length > 0)
+    std::memcpy(rep->data + a_length, b, zx_size(b_length));
+  rep->length = a_length + b_length;
+  rep->data[rep->length] = '\0';
+}
+
+// A place that may be written to when the right one is out of reach.
+char& scratch_byte() {
+  static char byte;
+  byte = '\0';
+  return byte;
+}
+
+}  // namespace
+
+zxStrRep zx_empty_rep = {0, 0, 0, {'\0'}};
+
+// ---- representation
+
+bool zxStr::check() const {
+  return ZX_ASSERT(rep->length >= 0 && rep->length <= rep->capacity &&
+                   rep->refs >= 0 && rep->data[rep->length] == '\0');
+}
+
+void zxStr::release() {
+  if (rep->refs == 0) return;
+  if (--rep->refs == 0) zx_realloc(rep, 0);
+}
+
+bool zxStr::is_within(const char* place) const {
+  const auto start = reinterpret_cast<std::uintptr_t>(rep->data);
+  const auto at = reinterpret_cast<std::uintptr_t>(place);
+  return at >= start && at - start <= zx_size(rep->capacity);
+}
+
+// Moves the characters into a new block of capacity n, of this string alone.
+void zxStr::take_exactly(std::int32_t n) {
+  zxStrRep* fresh = new_block(n);
+  std::memcpy(fresh->data, rep->data, zx_size(rep->length) + 1);
+  fresh->length = rep->length;
+  release();
+  rep = fresh;
+}
+
+// Changes the capacity of a block that is this string's alone.
+void zxStr::resize_block(std::int32_t n) {
+  rep = static_cast<zxStrRep*>(zx_realloc(rep, block_size(n)));
+  rep->capacity = n;
+}
+
+void zxStr::unshare() {
+  if (!check()) return;
+  if (rep->refs >= 2) take_exactly(rep->length);
+}
+
+void zxStr::clear() {
+  if (!check()) return;
+  if (rep->refs != 0) {
+    release();
+    rep = &zx_empty_rep;
+  } else if (rep->length != 0) {
+    rep->length = 0;
+    rep->data[0] = '\0';
+  }
+}
+
+// ---- making and assigning
+
+zxStr::zxStr(const char* text) : zxStr() {
+  if (!ZX_ASSERT(text != nullptr)) return;
+  build(text, zx_count(std::strlen(text)));
+}
+
+zxStr::zxStr(const char* characters, std::int32_t length) : zxStr() {
+  build(characters, length);
+}
+
+zxStr::zxStr(char byte) : zxStr() { build(&byte, 1); }
+
+zxStr::zxStr(std::string_view text) : zxStr() {
+  build(text.empty() ? "" : text.data(), zx_count(text.size()));
+}
+
+zxStr::zxStr(const zxStr& other) : zxStr() { *this = other; }
+
+zxStr& zxStr::operator=(const zxStr& other) {
+  if (!check() || !other.check() || rep == other.rep) return *this;
+  if (other.rep->length == 0) {
+    clear();
+  } else if (rep->refs == 0 && rep->capacity >= other.rep->length) {
+    std::memcpy(rep->data, other.rep->data, zx_size(other.rep->length) + 1);
+    rep->length = other.rep->length;
+  } else if (other.rep->refs == 0) {
+    build(other.rep->data, other.rep->length);
+  } else {
+    ++other.rep->refs;
+    release();
+    rep = other.rep;
+  }
+  return *this;
+}
+
+// A block that is not counted lies inside some string object or is the
+// shared empty one: it is copied, never taken.
+zxStr& zxStr::operator=(zxStr&& other) noexcept {
+  const bool inner_room = rep->refs == 0 && rep != &zx_empty_rep;
+  if (inner_room || other.rep->refs == 0) return *this = other;
+  if (rep == other.rep) return *this;
+  release();
+  rep = other.rep;
+  other.rep = &zx_empty_rep;
+  return *this;
+}
+
+zxStr& zxStr::operator=(const char* text) {
+  if (!check() || !ZX_ASSERT(text != nullptr)) return *this;
+  build(text, zx_count(std::strlen(text)));
+  return *this;
+}
+
+zxStr& zxStr::operator=(char byte) {
+  build(&byte, 1);
+  return *this;
+}
+
+void zxStr::build(const char* a, std::int32_t a_length, const char* b,
+                  std::int32_t b_length) {
+  if (!check() || !ZX_ASSERT(b != nullptr || b_length == 0) ||
+      !ZX_ASSERT(a != nullptr && a_length >= 0 && b_length >= 0))
+    return;
+  const std::int32_t sum = sum_of(a_length, b_length);
+  if (!ZX_ASSERT(sum >= 0)) return;
+
+  // The string's own characters can be moved to its start in place; anything
+  // else that involves them is put together in a block beside.
+  const bool b_is_own = b_length > 0 && is_within(b);
+  const bool grows = rep->capacity < sum;
+  if (rep->refs != 1 || b_is_own || (grows && is_within(a))) {
+    zxStrRep* fresh = new_block(sum);
+    fill(fresh, a, a_length, b, b_length);
+    release();
+    rep = fresh;
+  } else {
+    if (grows) resize_block(sum);
+    fill(rep, a, a_length, b, b_length);
+  }
+}
+
+// ---- reading
+
+char zxStr::operator[](std::int32_t i) const {
+  if (!check() || !ZX_ASSERT(i >= 0 && i < rep->length)) return '\0';
+  return rep->data[i];
+}
+
+char& zxStr::at(std::int32_t i) {
+  if (!check() || !ZX_ASSERT(i >= 0 && i < rep->length)) return scratch_byte();
+  unshare();
+  return rep->data[i];
+}
+
+bool zxStr::equals(const char* text, std::int32_t size) const {
+  return check() && rep->length == size &&
+         std::memcmp(rep->data, text, zx_size(size)) == 0;
+}
+
+bool zxStr::operator==(const char* text) const {
+  if (!ZX_ASSERT(text != nullptr)) return false;
+  return equals(text, zx_count(std::strlen(text)));
+}
+
+bool zxStr::operator==(char byte) const { return equals(&byte, 1); }
+
+void zxStr::copy_to(char* out, std::int32_t size) const {
+  if (!check() || !ZX_ASSERT(out != nullptr && size > rep->length)) return;
+  std::memcpy(out, rep->data, zx_size(rep->length) + 1);
+}
+
+// ---- sizing
+
+void zxStr::reserve(std::int32_t n) {
+  if (!check() || !ZX_ASSERT(n >= 0)) return;
+  if (n < rep->length) return;
+  if (rep->refs != 0 && n == 0) {
+    clear();
+  } else if (rep->capacity < n) {
+    make_room(n);
+  }
+}
+
+// Gives the string a block of its own with capacity n, which is above the
+// present capacity.
+void zxStr::make_room(std::int32_t n) {
+  if (rep->refs == 1)
+    resize_block(n);
+  else
+    take_exactly(n);
+}
+
+void zxStr::set_length(std::int32_t n) {
+  if (!check() || !ZX_ASSERT(n >= 0)) return;
+  if (n == rep->length) return;
+  const std::int32_t with_margin = sum_of(n, k_margin);
+  if (!ZX_ASSERT(with_margin >= 0)) return;
+  unshare();
+  if (n > rep->capacity) make_room(with_margin);
+  if (n > rep->length)
+    std::memset(rep->data + rep->length, 0, zx_size(n - rep->length));
+  rep->length = n;
+  rep->data[n] = '\0';
+}
+
+char* zxStr::buffer(std::int32_t n) {
+  set_length(n);
+  unshare();
+  return rep->data;
+}
+
+void zxStr::sync_length() {
+  if (!check()) return;
+  const void* end = std::memchr(rep->data, '\0', zx_size(rep->capacity) + 1);
+  if (!ZX_ASSERT(end != nullptr)) return;
+  rep->length =
+      static_cast<std::int32_t>(static_cast<const char*>(end) - rep->data);
+}
+
+// ---- appending
+
+zxStr& zxStr::append(char byte) {
+  if (!check()) return *this;
+  const std::int32_t old_length = rep->length;
+  if (rep->refs >= 2) {
+    build(rep->data, old_length, &byte, 1);
+    return *this;
+  }
+  if (old_length >= rep->capacity) {
+    const std::int32_t wanted = sum_of(old_length, k_margin);
+    if (!ZX_ASSERT(wanted >= 0)) return *this;
+    make_room(wanted);
+  }
+  rep->data[old_length] = byte;
+  rep->length = old_length + 1;
+  rep->data[rep->length] = '\0';
+  return *this;
+}
+
+zxStr& zxStr::append(const char* characters, std::int32_t size) {
+  if (!check() || !ZX_ASSERT(characters != nullptr && size >= 0))
+    return *this;
+  const std::int32_t old_length = rep->length;
+  const std::int32_t sum = sum_of(old_length, size);
+  if (!ZX_ASSERT(sum >= 0)) return *this;
+  if (rep->refs >= 2) {
+    build(rep->data, old_length, characters, size);
+    return *this;
+  }
+  if (sum >= rep->capacity) {
+    const std::int32_t wanted = sum_of(sum, k_margin);
+    if (!ZX_ASSERT(wanted >= 0)) return *this;
+    const bool own_text = is_within(characters);
+    const std::ptrdiff_t offset = own_text ? characters - rep->data : 0;
+    make_room(wanted);
+    if (own_text) characters = rep->data + offset;
+  }
+  std::memmove(rep->data + old_length, characters, zx_size(size));
+  rep->length = sum;
+  rep->data[sum] = '\0';
+  return *this;
+}
+
+zxStr& zxStr::append(const char* text) {
+  if (!ZX_ASSERT(text != nullptr)) return *this;
+  return append(text, zx_count(std::strlen(text)));
+}
+
+zxStr& zxStr::append(const zxStr& other) {
+  if (!other.check()) return *this;
+  return append(other.rep->data, other.rep->length);
+}
+
+// ---- letters and numbers
+
+template <class Fold>
+void zxStr::fold_case(Fold fold) {
+  if (!check()) return;
+  for (std::int32_t i = 0; i < rep->length; ++i) {
+    const char folded = fold(rep->data[i]);
+    if (folded == rep->data[i]) continue;
+    unshare();
+    rep->data[i] = folded;
+  }
+}
+
+void zxStr::to_upper() { fold_case(zx_upper); }
+void zxStr::to_lower() { fold_case(zx_lower); }
+
+namespace {
+
+std::string_view trimmed(std::string_view text) {
+  while (!text.empty() && zx_is_space(text.front())) text.remove_prefix(1);
+  while (!text.empty() && zx_is_space(text.back())) text.remove_suffix(1);
+  return text;
+}
+
+// What a last letter multiplies by; 1 for any other byte.
+std::int32_t factor_of(char suffix) {
+  switch (zx_lower(suffix)) {
+    case 'k': return 1000;
+    case 'm': return 1000000;
+    default: return 1;
+  }
+}
+
+// True if byte i of the digits is a comma that belongs to the number.
+bool is_inner_comma(std::string_view text, std::size_t i) {
+  return text[i] == ',' && i > 0 && i + 1 < text.size() &&
+         zx_is_digit(text[i - 1]) && zx_is_digit(text[i + 1]);
+}
+
+// The value of digits with inner commas; -1 if the text is anything else or
+// the value does not fit.
+std::int64_t unsigned_value(std::string_view text) {
+  std::int64_t value = 0;
+  for (std::size_t i = 0; i < text.size(); ++i) {
+    if (value != 0 && is_inner_comma(text, i)) continue;
+    if (!zx_is_digit(text[i])) return -1;
+    value = value * 10 + (text[i] - '0');
+    if (value > INT32_MAX) return -1;
+  }
+  return value;
+}
+
+}  // namespace
+
+std::int32_t zxStr::to_int() const {
+  if (!check()) return 0;
+  std::string_view text = trimmed(view());
+  if (text.empty()) return 0;
+  const bool negative = text.front() == '-';
+  if (negative || text.front() == '+') text.remove_prefix(1);
+  const std::int32_t factor = text.empty() ? 1 : factor_of(text.back());
+  if (factor != 1) text.remove_suffix(1);
+  const std::int64_t value = unsigned_value(text) * factor;
+  if (value < 0 || value > INT32_MAX) return 0;
+  return static_cast<std::int32_t>(negative ? -value : value);
+}
+
+// ---- concatenation
+
+namespace {
+
+zxStr joined(const char* a, std::int32_t a_length, const char* b,
+             std::int32_t b_length) {
+  zxStr result;
+  result.build(a, a_length, b, b_length);
+  return result;
+}
+
+}  // namespace
+
+zxStr operator+(const zxStr& a, const zxStr& b) {
+  if (a.is_empty()) return b;
+  if (b.is_empty()) return a;
+  return joined(a.c_str(), a.length(), b.c_str(), b.length());
+}
+
+zxStr operator+(const zxStr& a, const char* b) {
+  if (!ZX_ASSERT(b != nullptr) || *b == '\0') return a;
+  return joined(a.c_str(), a.length(), b, zx_count(std::strlen(b)));
+}
+
+zxStr operator+(const char* a, const zxStr& b) {
+  if (!ZX_ASSERT(a != nullptr) || *a == '\0') return b;
+  return joined(a, zx_count(std::strlen(a)), b.c_str(), b.length());
+}
+
+zxStr operator+(const zxStr& a, char b) {
+  return joined(a.c_str(), a.length(), &b, 1);
+}
+
+zxStr operator+(char a, const zxStr& b) {
+  return joined(&a, 1, b.c_str(), b.length());
+}
+
+void bail_code(std::int32_t number, const zxStr& text,
+               const BailDetail& detail) {
+  bail_code(number, text.c_str(), detail);
+}
+
+// ---- checksum
+
+namespace {
+
+constexpr std::array<std::uint16_t, 256> make_crc16_table() {
+  std::array<std::uint16_t, 256> table{};
+  for (unsigned i = 0; i < 256; ++i) {
+    unsigned crc = i << 8;
+    for (int bit = 0; bit < 8; ++bit)
+      crc = (crc & 0x8000U) ? (crc << 1) ^ 0x1021U : crc << 1;
+    table[i] = static_cast<std::uint16_t>(crc);
+  }
+  return table;
+}
+
+constexpr auto k_crc16_table = make_crc16_table();
+constexpr std::uint16_t k_crc16_start = 0xFFFF;
+
+}  // namespace
+
+std::uint16_t crc16_add(std::uint16_t crc, const void* bytes,
+                        std::size_t size) {
+  const auto* byte = static_cast<const unsigned char*>(bytes);
+  for (; size != 0; --size, ++byte)
+    crc = static_cast<std::uint16_t>((crc << 8) ^
+                                     k_crc16_table[(crc >> 8) ^ *byte]);
+  return crc;
+}
+
+std::uint16_t crc16(const void* bytes, std::size_t size) {
+  return crc16_add(k_crc16_start, bytes, size);
+}
