@@ -2,8 +2,8 @@
 // Tests: tests/hvl/hvldec_test.cpp.
 #include "hvldec.h"
 
+#include <array>
 #include <bit>
-#include <charconv>
 #include <cmath>
 #include <cstdlib>
 #include <cstring>
@@ -136,56 +136,104 @@ bool HvlDecimal::is_sixty_fourths() const {
 }
 
 // ---- text
+//
+// The text is made without a branch that depends on the number, but for the
+// rare ones: tables of numbers mix forms and lengths so that a processor
+// could not foresee them.
 
 namespace {
 
-// A number as its decimal digits: digits * 10^-places.
-struct Digits {
-  std::int64_t digits;
-  int places;  // 0, 2, 4, 6 or 8
+constexpr std::uint32_t k_unit = 100000000;  // 10^8, the finest scale
+
+// How a word turns into units of 10^-8: shift, then multiply.
+struct UnitForm {
+  std::uint8_t shift;
+  std::uint64_t factor;
 };
 
-Digits digits_of(std::int32_t word) {
-  if (is_integer_form(word)) return {word >> 1, 0};
-  if (is_hundredths_form(word)) {
-    const std::int32_t hundredths = word >> 2;
-    if (!is_whole(hundredths)) return {hundredths, 2};
-    return {std::int64_t{hundredths / 100} * 15625, 6};
+constexpr UnitForm unit_form(std::int32_t low_bits, bool whole) {
+  if (low_bits % 2 == 0) return {1, k_unit};
+  switch (low_bits) {
+    case k_ten_thousandths: return {4, 10000};
+    case k_millionths: return {4, 100};
+    case k_hundred_millionths: return {4, 1};
+    case k_thousands: return {4, std::uint64_t{1000} * k_unit};
+    // Whole hundredths are 100 times a number of sixty-fourths.
+    default: return {2, whole ? k_unit / 6400 : k_unit / 100};
   }
-  constexpr int k_places[4] = {4, 6, 8, 0};
-  const int scale = (word >> 2) & 3;
-  const std::int64_t digits = word >> 4;
-  return {scale == 3 ? digits * 1000 : digits, k_places[scale]};
 }
 
-char* write_unsigned(char* out, std::uint64_t number) {
-  return std::to_chars(out, out + HvlDecimal::k_max_text, number).ptr;
+// By the four low bits, and 16 more if word >> 2 is a multiple of 100.
+constexpr auto make_unit_forms() {
+  std::array<UnitForm, 32> forms{};
+  for (int i = 0; i < 32; ++i)
+    forms[static_cast<std::size_t>(i)] = unit_form(i % 16, i >= 16);
+  return forms;
+}
+constexpr auto k_unit_forms = make_unit_forms();
+
+// The size of a number in units of 10^-8; at most 1.35e19, for thousands.
+std::uint64_t units_of(std::int32_t word) {
+  const int index = (word & 15) + 16 * is_whole(word >> 2);
+  const UnitForm& form = k_unit_forms[static_cast<std::size_t>(index)];
+  const std::int32_t shifted = word >> form.shift;
+  const auto bits = static_cast<std::uint32_t>(shifted);
+  const std::uint32_t size = shifted < 0 ? 0U - bits : bits;
+  return size * form.factor;
 }
 
-constexpr std::uint32_t k_powers[9] = {1,      10,      100,
-                                       1000,   10000,   100000,
-                                       1000000, 10000000, 100000000};
-constexpr int k_fraction_digits = 8;
+// The eight decimal digits of a number below 10^8, one in each byte, the
+// first in the lowest: halves of four, pairs of two, then single digits, all
+// parts of a step at once.
+inline std::uint64_t eight_digits(std::uint32_t number) {
+  const std::uint64_t fours =
+      number / 10000 | std::uint64_t{number % 10000} << 32;
+  const std::uint64_t hundreds = (fours * 10486 >> 20) & 0x7F0000007F;
+  const std::uint64_t pairs = ((fours - 100 * hundreds) << 16) + hundreds;
+  const std::uint64_t tens = (pairs * 103 >> 10) & 0x000F000F000F000F;
+  return ((pairs - 10 * tens) << 8) + tens;
+}
 
-// Writes a fraction of 8 digits behind a point and returns the end without
-// its trailing zeros; a fraction of 0 leaves nothing, not even the point.
+constexpr std::uint64_t k_ascii_zeros = 0x3030303030303030;
+
+void put_eight(char* out, std::uint64_t digits) {
+  static_assert(std::endian::native == std::endian::little);
+  const std::uint64_t text = digits | k_ascii_zeros;
+  std::memcpy(out, &text, sizeof text);
+}
+
+// Writes a number below 10^8 without leading zeros.
+char* write_eight(char* out, std::uint32_t number) {
+  const std::uint64_t digits = eight_digits(number);
+  // A bit set in the last byte keeps one digit for 0.
+  const int leading = std::countr_zero(digits | std::uint64_t{1} << 56) / 8;
+  put_eight(out, digits >> 8 * leading);
+  return out + 8 - leading;
+}
+
+// Writes a whole number below 10^12.
+char* write_whole(char* out, std::uint64_t number) {
+  if (number < k_unit) return write_eight(out, static_cast<std::uint32_t>(number));
+  out = write_eight(out, static_cast<std::uint32_t>(number / k_unit));
+  put_eight(out, eight_digits(static_cast<std::uint32_t>(number % k_unit)));
+  return out + 8;
+}
+
+// Writes a fraction of eight digits behind a point, without its trailing
+// zeros; a fraction of 0 takes no room.
 char* write_fraction(char* out, std::uint32_t fraction) {
-  if (fraction == 0) return out;
-  *out = '.';
-  for (int i = k_fraction_digits; i > 0; --i) {
-    out[i] = static_cast<char>('0' + fraction % 10);
-    fraction /= 10;
-  }
-  char* end = out + k_fraction_digits + 1;
-  while (end[-1] == '0') --end;
-  return end;
+  const std::uint64_t digits = eight_digits(fraction);
+  out[0] = '.';
+  put_eight(out + 1, digits);
+  const int length = 8 - std::countl_zero(digits | 1) / 8;
+  return fraction == 0 ? out : out + 1 + length;
 }
 
-// A number below 0.0001: its digits with a point behind the first, and an
-// exponent of three digits.
-char* write_exponent_form(char* out, std::uint64_t digits, int places) {
-  char* end = write_unsigned(out + 1, digits);
-  const int exponent = places - static_cast<int>(end - out - 2);
+// Writes a number below 0.0001: its digits with a point behind the first,
+// and an exponent of three digits.
+char* write_exponent_form(char* out, std::uint32_t units) {
+  char* end = write_eight(out + 1, units);
+  const int exponent = 8 - static_cast<int>(end - out - 2);
   while (end[-1] == '0') --end;
   out[0] = out[1];
   out[1] = '.';
@@ -198,15 +246,12 @@ char* write_exponent_form(char* out, std::uint64_t digits, int places) {
 }  // namespace
 
 char* HvlDecimal::write_text(char* out) const {
-  const auto [signed_digits, places] = digits_of(word());
-  if (signed_digits < 0) *out++ = '-';
-  const auto digits = static_cast<std::uint64_t>(std::llabs(signed_digits));
-  const std::uint32_t unit = k_powers[places];
-  constexpr std::uint64_t k_plain_from = 10000;  // 0.0001 is the last plain
-  if (digits != 0 && digits * k_plain_from < unit)
-    return write_exponent_form(out, digits, places);
-  out = write_unsigned(out, digits / unit);
-  const auto fraction = static_cast<std::uint32_t>(digits % unit);
-  return write_fraction(out, fraction *
-                                 k_powers[k_fraction_digits - places]);
+  constexpr std::uint64_t k_plain_from = k_unit / 10000;
+  const std::uint64_t units = units_of(word());
+  out[0] = '-';
+  out += word() < 0 && units != 0;
+  if (units < k_plain_from && units != 0) [[unlikely]]
+    return write_exponent_form(out, static_cast<std::uint32_t>(units));
+  out = write_whole(out, units / k_unit);
+  return write_fraction(out, static_cast<std::uint32_t>(units % k_unit));
 }

@@ -61,8 +61,9 @@ class HvlDecimal {
   // Writes the number's text, without a NUL, and returns its end: the text
   // that to_double() has with up to 15 significant digits, as in "12.5",
   // "-1000", "1.25e-006".  It is made from the word's digits, with no
-  // floating point on the way.
-  static constexpr int k_max_text = 20;
+  // floating point on the way.  `out` has room for k_max_text bytes; bytes
+  // behind the text are overwritten.
+  static constexpr int k_max_text = 32;
   char* write_text(char* out) const;
 
   friend bool operator==(const HvlDecimal& a, const HvlDecimal& b) {

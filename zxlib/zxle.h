@@ -6,6 +6,7 @@
 #ifndef ZXLE_H
 #define ZXLE_H
 
+#include <bit>
 #include <cstddef>
 #include <type_traits>
 
@@ -24,18 +25,21 @@ class zxLe {
     return *this;
   }
 
-  constexpr operator T() const {
-    Bits bits = 0;
-    for (std::size_t i = 0; i < sizeof(T); ++i)
-      bits = static_cast<Bits>(bits | static_cast<Bits>(bytes[i]) << 8 * i);
-    return static_cast<T>(bits);
-  }
+  constexpr operator T() const { return in_file_order(std::bit_cast<T>(*this)); }
 
  private:
   constexpr void store(T value) {
-    const Bits bits = static_cast<Bits>(value);
-    for (std::size_t i = 0; i < sizeof(T); ++i)
-      bytes[i] = static_cast<unsigned char>(bits >> 8 * i);
+    *this = std::bit_cast<zxLe>(in_file_order(value));
+  }
+
+  // The machine's order turned to the file's, and back.
+  static constexpr T in_file_order(T value) {
+    if constexpr (std::endian::native == std::endian::little) return value;
+    Bits from = static_cast<Bits>(value);
+    Bits to = 0;
+    for (std::size_t i = 0; i < sizeof(T); ++i, from >>= 8)
+      to = static_cast<Bits>(to << 8 | (from & 0xFF));
+    return static_cast<T>(to);
   }
 
   unsigned char bytes[sizeof(T)];

@@ -12,21 +12,54 @@ constexpr char k_rtl_mark = static_cast<char>(254);
 // The distance of the Hebrew letters of code page 1255 from those of 862.
 constexpr int k_dos_distance = 96;
 
-constexpr unsigned k_class_letter = k_class_latin | k_class_hebrew;
+// ---- kinds of bytes
 
-bool is_hebrew(char byte) { return zx_is(byte, k_class_hebrew); }
-bool is_mark(char byte) { return byte == k_ltr_mark || byte == k_rtl_mark; }
-bool is_strong(char byte) {
-  return zx_is(byte, k_class_letter) || is_mark(byte);
-}
-bool is_rtl(char strong_byte) {
-  return is_hebrew(strong_byte) || strong_byte == k_rtl_mark;
-}
-bool is_separator(char byte) {
-  return byte != '\0' && std::strchr(",/:+-.$", byte) != nullptr;
+constexpr std::uint8_t k_latin_letter = 0x01;
+constexpr std::uint8_t k_hebrew_letter = 0x02;
+constexpr std::uint8_t k_ltr_strong = 0x04;  // Latin letters, byte 253
+constexpr std::uint8_t k_rtl_strong = 0x08;  // Hebrew letters, byte 254
+constexpr std::uint8_t k_digit = 0x10;
+constexpr std::uint8_t k_separator = 0x20;  // holds digits together
+constexpr std::uint8_t k_strong = k_ltr_strong | k_rtl_strong;
+
+// Which bytes are Hebrew letters: those of code page 1255, or those of 862
+// as well.
+enum class Letters : std::uint8_t { ansi, ansi_and_dos };
+
+constexpr std::uint8_t kind_of(char byte, Letters letters) {
+  const unsigned hebrew_classes = letters == Letters::ansi
+                                      ? k_class_hebrew
+                                      : k_class_hebrew | k_class_hebdos;
+  constexpr std::string_view k_separators = ",/:+-.$";
+  if (byte == k_ltr_mark) return k_ltr_strong;
+  if (byte == k_rtl_mark) return k_rtl_strong;
+  if (zx_is(byte, k_class_latin)) return k_ltr_strong | k_latin_letter;
+  if (zx_is(byte, hebrew_classes)) return k_rtl_strong | k_hebrew_letter;
+  if (zx_is_digit(byte)) return k_digit;
+  return k_separators.find(byte) != std::string_view::npos ? k_separator : 0;
 }
 
-char mirrored(char byte) {
+template <Letters letters>
+constexpr auto make_kinds() {
+  std::array<std::uint8_t, 256> kinds{};
+  for (int byte = 0; byte < 256; ++byte)
+    kinds[static_cast<std::size_t>(byte)] =
+        kind_of(static_cast<char>(byte), letters);
+  return kinds;
+}
+
+template <Letters letters>
+constexpr std::array<std::uint8_t, 256> k_kinds = make_kinds<letters>();
+
+template <Letters letters>
+bool is(char byte, unsigned kinds) {
+  return (k_kinds<letters>[static_cast<unsigned char>(byte)] & kinds) != 0;
+}
+
+bool is_digit(char byte) { return is<Letters::ansi>(byte, k_digit); }
+bool is_separator(char byte) { return is<Letters::ansi>(byte, k_separator); }
+
+constexpr char mirrored_bracket(char byte) {
   switch (byte) {
     case '(': return ')';
     case ')': return '(';
@@ -38,6 +71,17 @@ char mirrored(char byte) {
   }
 }
 
+constexpr auto make_mirror() {
+  std::array<char, 256> mirror{};
+  for (int byte = 0; byte < 256; ++byte)
+    mirror[static_cast<std::size_t>(byte)] =
+        mirrored_bracket(static_cast<char>(byte));
+  return mirror;
+}
+constexpr auto k_mirror = make_mirror();
+
+char mirrored(char byte) { return k_mirror[static_cast<unsigned char>(byte)]; }
+
 // ---- runs
 
 struct Run {
@@ -45,47 +89,55 @@ struct Run {
   bool rtl;
 };
 
-std::size_t find_strong(std::string_view text, std::size_t from) {
-  while (from < text.size() && !is_strong(text[from])) ++from;
+template <Letters letters>
+std::size_t find_kind(std::string_view text, std::size_t from,
+                      unsigned kinds) {
+  while (from < text.size() && !is<letters>(text[from], kinds)) ++from;
   return from;
 }
 
-// Gives back the neutral bytes at the end of a run.
-std::size_t without_neutral_end(std::string_view run) {
+// How far a run reaches without the bytes at its end that are of no kind
+// among these.
+template <Letters letters>
+std::size_t up_to_kind(std::string_view run, unsigned kinds) {
   std::size_t length = run.size();
-  while (length > 0 && !is_strong(run[length - 1]) &&
-         !zx_is_digit(run[length - 1]))
-    --length;
+  while (length > 0 && !is<letters>(run[length - 1], kinds)) --length;
   return length;
 }
 
-// The run at the start of a text that is not empty.
+// The run at the start of a text that is not empty.  A run against the base
+// gives its neutral end back.
+template <Letters letters>
 Run split_run(std::string_view text, bool base) {
-  const std::size_t strong = find_strong(text, 0);
+  const std::size_t strong = find_kind<letters>(text, 0, k_strong);
   if (strong == text.size()) return {text.size(), base};
-  const bool rtl = is_rtl(text[strong]);
+  const bool rtl = is<letters>(text[strong], k_rtl_strong);
   if (rtl != base && strong > 0) return {strong, base};
-  std::size_t end = strong;
-  while (end < text.size() && is_rtl(text[end]) == rtl)
-    end = find_strong(text, end + 1);
-  if (rtl != base) end = without_neutral_end(text.substr(0, end));
+  std::size_t end = find_kind<letters>(text, strong,
+                                       rtl ? k_ltr_strong : k_rtl_strong);
+  if (rtl != base)
+    end = up_to_kind<letters>(text.substr(0, end), k_strong | k_digit);
   return {end, rtl};
 }
 
-// The length of a run of the lesser direction up to its last letter.
-std::size_t up_to_last_letter(std::string_view run, bool rtl) {
-  const unsigned letters = rtl ? k_class_hebrew : k_class_latin;
-  std::size_t length = run.size();
-  while (length > 0 && !zx_is(run[length - 1], letters)) --length;
-  return length;
+// The same for physical text, in which a run against the base ends with its
+// last letter; without one it is empty.
+template <Letters letters>
+Run split_physical_run(std::string_view text, bool base) {
+  Run run = split_run<letters>(text, base);
+  if (run.rtl != base)
+    run.length = up_to_kind<letters>(
+        text.substr(0, run.length),
+        run.rtl ? k_hebrew_letter : k_latin_letter);
+  return run;
 }
 
 // ---- reversing
 
 // True if a number ends with byte i: a digit, or a percent sign behind one.
 bool ends_number(std::string_view run, std::size_t i) {
-  if (zx_is_digit(run[i])) return true;
-  return run[i] == '%' && i > 0 && zx_is_digit(run[i - 1]);
+  if (is_digit(run[i])) return true;
+  return run[i] == '%' && i > 0 && is_digit(run[i - 1]);
 }
 
 // Where the number that ends with byte i starts: over digits, over a
@@ -94,9 +146,9 @@ bool ends_number(std::string_view run, std::size_t i) {
 std::size_t number_start(std::string_view run, std::size_t i) {
   while (i > 0) {
     const char before = run[i - 1];
-    const bool joins = zx_is_digit(before) ||
-                       (is_separator(before) && i > 1 &&
-                        zx_is_digit(run[i - 2]));
+    const bool joins =
+        is_digit(before) ||
+        (is_separator(before) && i > 1 && is_digit(run[i - 2]));
     if (!joins) break;
     --i;
   }
@@ -116,7 +168,7 @@ char* reverse_run(char* out, std::string_view run, bool mark) {
       continue;
     }
     const std::size_t first = number_start(run, i);
-    if (mark && out > start && out[-1] == '$' && zx_is_digit(run[first]))
+    if (mark && out > start && out[-1] == '$' && is_digit(run[first]))
       *out++ = k_rtl_mark;
     const std::size_t length = i - first + 1;
     std::memcpy(out, run.data() + first, length);
@@ -131,9 +183,9 @@ char* reverse_run(char* out, std::string_view run, bool mark) {
 // The first digit or Hebrew letter of a text, or NUL.  A digit there would
 // be read as a part of a Latin run that stands ahead of it.
 char leading_anchor(std::string_view text) {
-  for (const char byte : text)
-    if (zx_is(byte, k_class_digit | k_class_hebrew)) return byte;
-  return '\0';
+  const std::size_t i = find_kind<Letters::ansi>(
+      text, 0, k_digit | k_hebrew_letter);
+  return i < text.size() ? text[i] : '\0';
 }
 
 // A line under composition.  Pieces join in front of it or behind it, by the
@@ -173,7 +225,7 @@ class Line {
 
   // True if the first digit or Hebrew letter of the line is a digit; known
   // for a line that grows at its front.
-  bool leads_with_digit() const { return zx_is_digit(anchor); }
+  bool leads_with_digit() const { return is_digit(anchor); }
 
   zxStr take() const {
     return {start, static_cast<std::int32_t>(end - start)};
@@ -198,9 +250,7 @@ class Line {
 // Cuts a physical line into runs and adds each to the line.
 void add_logical(Line& line, std::string_view source, bool base) {
   while (!source.empty()) {
-    Run run = split_run(source, base);
-    if (run.rtl != base)
-      run.length = up_to_last_letter(source.substr(0, run.length), run.rtl);
+    const Run run = split_physical_run<Letters::ansi>(source, base);
     if (!ZX_ASSERT(run.length > 0)) return;
     const std::string_view piece = source.substr(0, run.length);
     source.remove_prefix(run.length);
@@ -210,7 +260,7 @@ void add_logical(Line& line, std::string_view source, bool base) {
       if (line.leads_with_digit()) line.add(k_rtl_mark);
       line.add(piece);
     } else {
-      if (!line.is_empty() && zx_is_digit(leading_anchor(piece)))
+      if (!line.is_empty() && is_digit(leading_anchor(piece)))
         line.add(k_ltr_mark);
       line.add(piece);
     }
@@ -266,7 +316,7 @@ zxStr phys_from_logical(const zxStr& text, bool rtl) {
   Line line(zx_size(text.length()), rtl);
   std::string_view source = text.view();
   while (!source.empty()) {
-    const Run run = split_run(source, rtl);
+    const Run run = split_run<Letters::ansi>(source, rtl);
     if (!ZX_ASSERT(run.length > 0 && run.length <= source.size())) break;
     const std::string_view piece = source.substr(0, run.length);
     if (run.rtl) {
@@ -322,4 +372,88 @@ zxStr ansi_to_utf8(const zxStr& text) {
   }
   result.set_length(static_cast<std::int32_t>(out - start));
   return result;
+}
+
+// ---- straight to UTF-8
+//
+// With a right-to-left base each run goes in front of those before it, and a
+// reversed run is its bytes one by one in front of each other: so the text
+// is read once from its start and the result written once from its end.  The
+// marks vanish in UTF-8 and need not be set.
+
+char* zxLogicalExport::put_in_front(char* start, char byte) const {
+  const Unit& unit = units[static_cast<unsigned char>(byte)];
+  std::memcpy(start - 2, unit.bytes, 2);
+  return start - unit.size;
+}
+
+char* zxLogicalExport::put_in_front(char* start,
+                                    std::string_view piece) const {
+  for (std::size_t i = piece.size(); i-- > 0;)
+    start = put_in_front(start, piece[i]);
+  return start;
+}
+
+namespace {
+
+// The end of the number that starts with byte i of a right-to-left run, i
+// itself if none does: the same numbers that number_start() finds from their
+// other end.
+std::size_t number_end(std::string_view run, std::size_t i) {
+  const std::size_t size = run.size();
+  std::size_t end = i;
+  if (run[i] == '$' && i > 0 && i + 1 < size) ++end;
+  if (!is_digit(run[end])) return i;
+  do {
+    while (end < size && is_digit(run[end])) ++end;
+  } while (end + 1 < size && is_separator(run[end]) &&
+           is_digit(run[end + 1]) && ++end);
+  if (end < size && run[end] == '%') ++end;
+  return end;
+}
+
+}  // namespace
+
+char* zxLogicalExport::reverse_in_front(char* start,
+                                        std::string_view run) const {
+  for (std::size_t i = 0; i < run.size();) {
+    const std::size_t end = number_end(run, i);
+    if (end == i) {
+      start = put_in_front(start, mirrored(run[i++]));
+    } else {
+      start = put_in_front(start, run.substr(i, end - i));
+      i = end;
+    }
+  }
+  return start;
+}
+
+char* zxLogicalExport::line_in_front(char* start,
+                                     std::string_view line) const {
+  while (!line.empty()) {
+    const Run run = split_physical_run<Letters::ansi_and_dos>(line, true);
+    if (!ZX_ASSERT(run.length > 0)) break;
+    const std::string_view piece = line.substr(0, run.length);
+    start = run.rtl ? reverse_in_front(start, piece)
+                    : put_in_front(start, piece);
+    line.remove_prefix(run.length);
+  }
+  return start;
+}
+
+std::string_view zxLogicalExport::convert(char* room,
+                                          std::string_view physical) const {
+  char* const end = room + room_for(physical.size());
+  char* start = end;
+  constexpr std::string_view k_line_end = "\r\n";
+  if (std::memchr(physical.data(), '\r', physical.size()) != nullptr) {
+    for (std::size_t at = physical.rfind(k_line_end);
+         at != std::string_view::npos; at = physical.rfind(k_line_end)) {
+      start = line_in_front(start, physical.substr(at + k_line_end.size()));
+      start = put_in_front(start, k_line_end);
+      physical = physical.substr(0, at);
+    }
+  }
+  start = line_in_front(start, physical);
+  return {start, static_cast<std::size_t>(end - start)};
 }

@@ -21,6 +21,11 @@
 #ifndef ZXP2L_H
 #define ZXP2L_H
 
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+
 #include "zxstr.h"
 
 // One line of physical text as logical text, and the reverse (which gives
@@ -42,5 +47,64 @@ void ansi_to_dos(zxStr& text);
 // marks among them, are dropped; those from 128 to 223 come out as the code
 // points as far below alef as they stand below its byte.
 zxStr ansi_to_utf8(const zxStr& text);
+
+// The road of exports, from stored fields to UTF-8 in one pass: what
+//   ansi_to_utf8(logical_from_phys_lines(text, true))
+// gives, less the ASCII bytes that the target file has no room for.
+//
+//   static constexpr zxLogicalExport cells("\",");
+//   std::string_view text = cells.convert(room, field);
+class zxLogicalExport {
+ public:
+  // An object that drops the given ASCII bytes from its results; all else
+  // happens as if they stayed to the end.
+  constexpr explicit zxLogicalExport(std::string_view dropped);
+
+  // Room for the result of a text of n bytes.
+  static constexpr std::size_t room_for(std::size_t n) { return 2 * n + 2; }
+
+  // Converts a text into `room`, of room_for(its length) bytes; the result
+  // lies somewhere in it.  A mark without its letter fails an assertion, as
+  // it does in logical_from_phys().
+  std::string_view convert(char* room, std::string_view physical) const;
+
+ private:
+  // What a byte of logical text becomes: `size` bytes, the last of them at
+  // the end of `bytes`, so that both can be stored ahead of the result and
+  // only those that count be kept.
+  struct Unit {
+    char bytes[2];
+    std::uint8_t size;
+  };
+  using Units = std::array<Unit, 256>;
+
+  static constexpr Unit unit_of(int byte);
+  char* put_in_front(char* start, char byte) const;
+  char* put_in_front(char* start, std::string_view piece) const;
+  char* reverse_in_front(char* start, std::string_view run) const;
+  char* line_in_front(char* start, std::string_view line) const;
+
+  Units units{};
+};
+
+constexpr zxLogicalExport::Unit zxLogicalExport::unit_of(int byte) {
+  constexpr int k_alef_byte = 224;
+  constexpr int k_alef = 0x5D0;
+  constexpr int k_tav = 0x5EA;
+  if (byte < 128) return {{'\0', static_cast<char>(byte)}, 1};
+  const int from_dos = byte >= 128 && byte <= 154 ? 96 : 0;
+  const int code = byte + from_dos - k_alef_byte + k_alef;
+  if (code > k_tav) return {{}, 0};
+  return {{static_cast<char>(0xC0 | code >> 6),
+           static_cast<char>(0x80 | (code & 0x3F))},
+          2};
+}
+
+constexpr zxLogicalExport::zxLogicalExport(std::string_view dropped) {
+  for (int byte = 0; byte < 256; ++byte)
+    units[static_cast<std::size_t>(byte)] = unit_of(byte);
+  for (const char byte : dropped)
+    units[static_cast<unsigned char>(byte)].size = 0;
+}
 
 #endif  // ZXP2L_H

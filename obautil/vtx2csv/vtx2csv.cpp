@@ -2,7 +2,8 @@
 // Tests: tests/obautil/vtx2csv_test.cpp, tests/e2e/.
 #include "vtx2csv.h"
 
-#include <cstdio>
+#include <cstring>
+#include <iterator>
 #include <memory>
 
 #include "zxaa.h"
@@ -34,7 +35,6 @@ struct ProgramVersion {
 const ProgramVersion program_version_setter;
 
 constexpr char k_default_output[] = "r9qvtx.csv";
-constexpr char k_separator[] = ", ";
 
 // The letters of record types 0 to 2; every other type shows as NUL.
 constexpr char k_type_letters[] = {'B', 'I', 'R', '\0'};
@@ -46,48 +46,89 @@ char type_letter(std::int32_t type) {
 
 // ---- cells
 
-void append_num(zxStr& line, HvlDecimal number) {
-  char text[HvlDecimal::k_max_text];
-  const char* end = number.write_text(text);
-  line.append(text, static_cast<std::int32_t>(end - text));
+// Text cells have no quoting: these bytes go.
+constexpr zxLogicalExport k_text_cells("\",");
+
+// A line under composition.
+class Row {
+ public:
+  explicit Row(const VtxRecord& source) : record(source) {}
+
+  void add_cell(const ColumnDef& column);
+  void add_separator();
+
+  // The line, with a line feed in the place of the last separator.
+  zxStr finish();
+
+ private:
+  static constexpr std::size_t k_text_room =
+      zxLogicalExport::room_for(sizeof(VtxRecord));
+  static constexpr std::size_t k_room = 8192;
+
+  void add_text(std::string_view field);
+  void add_date(zxDate date);
+  void flush();
+
+  const VtxRecord& record;
+  zxStr line;         // what did not fit the room any more
+  char room[k_room];  // cells are made here
+  char* at = room;
+};
+
+// Text may run to the record's end, so a row has no limit worth reserving.
+void Row::flush() {
+  line.append(room, static_cast<std::int32_t>(at - room));
+  at = room;
 }
 
-void append_date(zxStr& line, zxDate date) {
-  char text[zxDate::k_text_length];
-  if (date.write_text(text)) line.append(text, zxDate::k_text_length);
+void Row::add_text(std::string_view field) {
+  const std::string_view text = k_text_cells.convert(at, field);
+  std::memmove(at, text.data(), text.size());
+  at += text.size();
 }
 
-bool is_deleted(char byte) { return byte == '"' || byte == ','; }
-
-zxStr without_deleted(const zxStr& text) {
-  zxStr kept;
-  kept.reserve(text.length());
-  for (const char byte : text.view())
-    if (!is_deleted(byte)) kept.append(byte);
-  return kept;
+void Row::add_date(zxDate date) {
+  if (date.write_text(at)) at += zxDate::k_text_length;
 }
 
-void append_cell(zxStr& line, const ColumnDef& column,
-                 const VtxRecord& record) {
+void Row::add_cell(const ColumnDef& column) {
+  constexpr std::size_t k_cell_room = k_text_room + 2;  // and a separator
+  if (static_cast<std::size_t>(at - room) > k_room - k_cell_room) flush();
   const std::int32_t i = column.index;
   if (column.type == k_num) {
-    append_num(line, record.num[i]);
+    at = record.num[i].write_text(at);
   } else if (column.type == k_text) {
-    line.append(clean_text_field(zxStr(record.text_field(i))));
+    add_text(record.text_field(i));
   } else if (column.type == k_date) {
-    append_date(line, record.dates[i]);
+    add_date(record.dates[i]);
   } else if (column.type == k_natype) {
-    line.append(type_letter(record.type));
+    *at++ = type_letter(record.type);
   } else {
     ZX_HERE;
     bailf("Unknown array type #", column.type);
   }
 }
 
+void Row::add_separator() {
+  *at++ = ',';
+  *at++ = ' ';
+}
+
+zxStr Row::finish() {
+  if (at != room) {
+    at[-2] = '\n';
+    --at;
+  }
+  flush();
+  return line;
+}
+
 }  // namespace
 
 zxStr clean_text_field(const zxStr& text) {
-  return without_deleted(ansi_to_utf8(logical_from_phys_lines(text, true)));
+  zxStr room;
+  const std::size_t size = zxLogicalExport::room_for(zx_size(text.length()));
+  return zxStr(k_text_cells.convert(room.buffer(zx_count(size)), text.view()));
 }
 
 void write_header_row(zxBFile& out, std::span<const ColumnDef> columns) {
@@ -104,13 +145,13 @@ void write_header_row(zxBFile& out, std::span<const ColumnDef> columns) {
 
 void write_record_row(const VtxRecord& record, zxBFile& out,
                       std::span<const ColumnDef> columns) {
-  zxStr line;
+  Row row(record);
   for (const ColumnDef& column : columns) {
-    append_cell(line, column, record);
-    line.append(&column == &columns.back() ? "\n" : k_separator);
+    row.add_cell(column);
+    row.add_separator();
   }
   ZX_HERE;
-  fprint(out, "#", line);
+  fprint(out, "#", row.finish());
 }
 
 // ---- the run
