@@ -55,8 +55,10 @@ zxStr candidate_name(const zxStr& directory, const char* extension) {
   const auto end = std::to_chars(digits, digits + sizeof digits, number).ptr;
   zxStr name = with_slash(directory) + "tmp";
   name.append(digits, static_cast<std::int32_t>(end - digits));
-  const char* ending = extension == nullptr ? "tmp" : extension;
-  return *ending == '\0' ? name : name + "." + ending;
+  name.append('.').append(extension == nullptr ? "tmp" : extension);
+  const std::int32_t last = name.length() - 1;
+  if (name[last] == '.') name.set_length(last);
+  return name;
 }
 
 bool is_free(const zxStr& name) {

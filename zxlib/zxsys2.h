@@ -30,7 +30,7 @@ const zxStr& temp_path();
 void clear_temp_path();
 
 // A name in `directory` that no file has: "tmp", a number and the extension,
-// which is "tmp" if null; an empty one leaves no dot.  Nothing is created or
+// which is "tmp" if null; a dot at the very end goes.  Nothing is created or
 // reserved.  Fatal when 30 names in a row are taken or cannot be judged
 // (1037).
 zxStr uniqfile(const zxStr& directory, const char* extension);

@@ -18,8 +18,6 @@
 
 #include "process.h"
 
-extern char** environ;
-
 namespace kit {
 namespace {
 
@@ -92,7 +90,8 @@ std::vector<std::string> environment_for(const ProcessOptions& options) {
   }
   for (const auto& [name, value] : options.variables) {
     remove_variable(entries, name);
-    entries.push_back(name + "=" + value);
+    entries.push_back(name);
+    entries.back().append("=").append(value);
   }
   for (const std::string& name : options.removed_variables) {
     remove_variable(entries, name);
@@ -102,6 +101,7 @@ std::vector<std::string> environment_for(const ProcessOptions& options) {
 
 std::vector<char*> pointers_to(std::vector<std::string>& texts) {
   std::vector<char*> pointers;
+  pointers.reserve(texts.size() + 1);
   for (std::string& text : texts) pointers.push_back(text.data());
   pointers.push_back(nullptr);
   return pointers;

@@ -108,7 +108,8 @@ std::string environment_block(const ProcessOptions& options) {
   std::vector<std::string> entries = own_environment();
   for (const auto& [name, value] : options.variables) {
     remove_variable(entries, name);
-    entries.push_back(name + "=" + value);
+    entries.push_back(name);
+    entries.back().append("=").append(value);
   }
   for (const std::string& name : options.removed_variables) {
     remove_variable(entries, name);

@@ -164,6 +164,13 @@ std::string with_slashes(std::string name, char slash) {
   return name;
 }
 
+std::string in_capitals(std::string name) {
+  for (char& c : name) {
+    if (c >= 'a' && c <= 'z') c = static_cast<char>(c - 'a' + 'A');
+  }
+  return name;
+}
+
 // ------------------------------------------------------------ last error --
 
 TEST(zxplat, the_last_error_is_what_was_stored) {
@@ -242,7 +249,7 @@ TEST(zxplat, read_only_descriptors_take_no_bytes) {
 TEST(zxplat, write_only_descriptors_give_no_bytes) {
   const TempDir dir;
   for (const OpenMode mode :
-       {OpenMode::create, OpenMode::append, OpenMode::create}) {
+       {OpenMode::create_new, OpenMode::create, OpenMode::append}) {
     const Open file(dir.file("a"), mode);
     char byte;
     EXPECT_EQ(files.read(file.fd, &byte, 1), -1);
@@ -400,7 +407,7 @@ TEST(zxplat, running_out_of_descriptors_is_a_failure_of_its_own) {
   std::vector<Fd> open;
   set_last_error(k_untouched);
   for (;;) {
-    const Fd fd = files.open(dir.file("a"), OpenMode::read);
+    const Fd fd = files.open("nul", OpenMode::read);
     if (fd == k_no_fd || open.size() > 100'000) break;
     open.push_back(fd);
   }
@@ -808,6 +815,17 @@ TEST(zxplat, nul_is_no_file) {
   EXPECT_EQ(spellings_in(dir.path()), Names{"a"});
 }
 
+// On a system that lets a file be called so, the device still has the name.
+TEST(zxplat, a_file_called_nul_is_out_of_reach) {
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  kit::write_file("nul", "kept");
+  EXPECT_EQ(read_through("nul"), "");
+  expect_missing("nul", zxplat::k_err_not_found);
+  expect_remove_fails("nul", zxplat::k_err_not_found);
+  expect_rename_fails("nul", "b", zxplat::k_err_not_found);
+}
+
 // -------------------------------------------------------------- renaming --
 
 TEST(zxplat, a_rename_moves_the_bytes_to_the_new_name) {
@@ -1067,6 +1085,7 @@ TEST(zxplat, another_device_is_known_ahead_of_the_rename) {
   kit::write_file(dir.file("a"), "");
   EXPECT_FALSE(zxplat::on_one_device(dir.file("a"), other + "\\b"));
   EXPECT_FALSE(zxplat::on_one_device(dir.file("A"), other + "/b"));
+  EXPECT_FALSE(zxplat::on_one_device(dir.file("a"), in_capitals(other) + "/b"));
 }
 
 TEST(zxplat, attributes_are_the_time_and_the_permissions) {
@@ -1144,10 +1163,10 @@ TEST(zxplat, the_temporary_directory_ends_in_a_backslash) {
   expect_text(zxplat::temp_directory, text);
 }
 
-// Variables as they were at the end of the block.
+// Gives variables their old values back at the end of the block.
 class Variables {
  public:
-  explicit Variables(std::vector<std::string> wanted) {
+  explicit Variables(const std::vector<std::string>& wanted) {
     for (const std::string& name : wanted) {
       const char* value = std::getenv(name.c_str());
       before.emplace_back(name, value != nullptr ? value : "");
@@ -1311,24 +1330,24 @@ TEST(zxplat, a_child_process_does_not_inherit_open_files) {
 TEST(zxplat, the_heap_keeps_what_fits_when_a_block_is_resized) {
   auto* block = static_cast<char*>(zxplat::heap_realloc(nullptr, 4));
   ASSERT_NE(block, nullptr);
-  std::memcpy(block, "abcd", 4);
+  std::fill_n(block, 4, 'x');
   block = static_cast<char*>(zxplat::heap_realloc(block, 100'000));
   ASSERT_NE(block, nullptr);
-  EXPECT_EQ(std::string_view(block, 4), "abcd");
+  EXPECT_EQ(std::string_view(block, 4), "xxxx");
   block = static_cast<char*>(zxplat::heap_realloc(block, 2));
   ASSERT_NE(block, nullptr);
-  EXPECT_EQ(std::string_view(block, 2), "ab");
+  EXPECT_EQ(std::string_view(block, 2), "xx");
   EXPECT_EQ(zxplat::heap_realloc(block, 0), nullptr);
 }
 
 TEST(zxplat, an_exhausted_heap_gives_null_and_keeps_the_block) {
   auto* block = static_cast<char*>(zxplat::heap_realloc(nullptr, 4));
   ASSERT_NE(block, nullptr);
-  std::memcpy(block, "abcd", 4);
+  std::fill_n(block, 4, 'x');
   set_last_error(k_untouched);
   EXPECT_EQ(zxplat::heap_realloc(block, SIZE_MAX / 2), nullptr);
   EXPECT_EQ(last_error(), zxplat::k_err_no_memory);
-  EXPECT_EQ(std::string_view(block, 4), "abcd");
+  EXPECT_EQ(std::string_view(block, 4), "xxxx");
   zxplat::heap_realloc(block, 0);
 }
 
