@@ -158,10 +158,9 @@ class zxAA {
 
   // The entry for which `matches` holds, or the free slot at which the walk
   // from the hash's home slot ended; null if the table is full of others
-  // (message 2206) or has no slot.
+  // (message 2206).  There must be a slot.
   template <class Matches>
   Entry* walk(std::uint32_t hash, Matches matches) const {
-    if (capacity == 0) return nullptr;
     bool wrapped = false;
     for (std::int32_t i = home_of(hash, capacity, mask);; ++i) {
       if (i == capacity) {
@@ -205,6 +204,7 @@ class zxAA {
   }
 
   Entry* probe(const K& key) const {
+    if (capacity == 0) return nullptr;  // not worth hashing the key
     return walk(Traits::hash(key), [&](const K& k) { return k == key; });
   }
 
@@ -288,6 +288,7 @@ class zxSA : public zxAA<zxStr, V> {
   // The value of a key given as plain text, or null; no string is built.
   V* find(const char* key) {
     if (!ZX_ASSERT(key != nullptr)) return nullptr;
+    if (Base::slots() == 0) return nullptr;
     const std::string_view text(key);
     auto* entry = Base::walk(crc16(text.data(), text.size()),
                              [&](const zxStr& k) { return k.view() == text; });

@@ -15,8 +15,13 @@ namespace {
 constexpr std::size_t k_message_room = 16384;
 // Eight numbers or cut texts, brackets and separators.
 constexpr std::size_t k_line_room = 192;
-// Path, version, message, line and the words between.
-constexpr std::size_t k_screen_room = 2 * k_message_room;
+// What the screen shows of a program path and a version at most, so that the
+// message and the line always have their place.
+constexpr std::size_t k_shown_path = 4096;
+constexpr std::size_t k_shown_version = 256;
+// All of these and the words between.
+constexpr std::size_t k_screen_room =
+    k_shown_path + k_shown_version + k_message_room + k_line_room + 64;
 
 // A message and a line that are together shorter than this share one line
 // of the screen.
@@ -32,15 +37,6 @@ char bail_line[k_line_room];
 char bail_screen[k_screen_room];
 
 const char* no_text() { return ""; }
-
-void print_to_descriptor(std::string_view text) {
-  while (!text.empty()) {
-    const std::int64_t done =
-        zxplat::files.write(zxplat::k_stdout_fd, text.data(), text.size());
-    if (done <= 0) return;
-    text.remove_prefix(static_cast<std::size_t>(done));
-  }
-}
 
 struct Failure {
   std::int32_t number;
@@ -126,9 +122,9 @@ void print_screen(std::string_view message, std::string_view line) {
   const bool one_line = message.size() + line.size() < k_one_line;
   zxText out(bail_screen);
   out.add("\r\n");
-  out.add(bail_hooks.program_path());
+  out.add(bail_hooks.program_path(), k_shown_path);
   out.add(" ");
-  out.add(bail_hooks.program_version());
+  out.add(bail_hooks.program_version(), k_shown_version);
   out.add(" Fatal Error ");
   out.add(message);
   out.add(one_line ? " " : "\r\n           ");
@@ -161,9 +157,19 @@ void bail_core(std::int32_t number, const char* text,
 
 }  // namespace
 
-bool bail_guard = false;
-std::int64_t bail_wait_seconds = 2;
-BailHooks bail_hooks = {no_text, no_text, print_to_descriptor};
+constinit bool bail_guard = false;
+constinit std::int64_t bail_wait_seconds = 2;
+constinit BailHooks bail_hooks = {no_text, no_text, bail_print_directly};
+
+void bail_print_directly(std::string_view text) {
+  zxplat::set_binary(zxplat::k_stdout_fd);  // start-up may not have come yet
+  while (!text.empty()) {
+    const std::int64_t done =
+        zxplat::files.write(zxplat::k_stdout_fd, text.data(), text.size());
+    if (done <= 0) return;
+    text.remove_prefix(static_cast<std::size_t>(done));
+  }
+}
 
 void bail_code(std::int32_t number) { bail_core(number, nullptr, no_detail); }
 
@@ -196,7 +202,7 @@ zxText::zxText(std::span<char> buffer, std::size_t length)
 void zxText::add(std::string_view text) {
   const std::size_t left = room.size() - 1 - used;
   const std::size_t size = text.size() < left ? text.size() : left;
-  std::memcpy(room.data() + used, text.data(), size);
+  if (size > 0) std::memcpy(room.data() + used, text.data(), size);
   used += size;
   room[used] = '\0';
 }

@@ -91,6 +91,9 @@ struct BailHooks {
 };
 extern BailHooks bail_hooks;
 
+// The default of BailHooks::print: straight to the descriptor.
+void bail_print_directly(std::string_view text);
+
 // The seconds for which the failure screen stands before the process ends.
 // Programs leave it alone; tests shorten it.
 extern std::int64_t bail_wait_seconds;

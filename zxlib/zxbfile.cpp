@@ -76,9 +76,12 @@ void zxBFile::create(const zxStr& file_name, const BailDetail& detail) {
   if (!try_create(file_name)) bail_code(1004, file_name, detail);
 }
 
+bool zxBFile::try_create_new(const zxStr& file_name) {
+  return open_as(file_name, OpenMode::create_new);
+}
+
 void zxBFile::create_new(const zxStr& file_name, const BailDetail& detail) {
-  if (!open_as(file_name, OpenMode::create_new))
-    bail_code(1004, file_name, detail);
+  if (!try_create_new(file_name)) bail_code(1004, file_name, detail);
 }
 
 bool zxBFile::try_create_private(const zxStr& file_name) {
@@ -122,9 +125,11 @@ bool zxBFile::read(void* buffer, std::int32_t size, std::int32_t* got,
   return false;
 }
 
-void zxBFile::read_all(void* buffer, std::int32_t size,
+bool zxBFile::read_all(void* buffer, std::int32_t size,
                        const BailDetail& detail) {
-  if (!read(buffer, size, nullptr, detail)) bail_code(1014, name, detail);
+  if (read(buffer, size, nullptr, detail)) return true;
+  bail_code(1014, name, detail);
+  return false;
 }
 
 void zxBFile::write(const void* buffer, std::int32_t size,
@@ -146,16 +151,20 @@ void zxBFile::sync(const BailDetail& detail) {
 
 // ---- positions
 
-void zxBFile::seek(std::int32_t position, const BailDetail& detail) {
-  if (!ZX_ASSERT(handle != nullptr && position >= 0)) return;
-  if (!handle->seek(position, Whence::start))
-    return bail_code(1012, name, detail);
+bool zxBFile::seek(std::int32_t position, const BailDetail& detail) {
+  if (!ZX_ASSERT(handle != nullptr && position >= 0)) return false;
+  if (!handle->seek(position, Whence::start)) {
+    bail_code(1012, name, detail);
+    return false;
+  }
   if (position == 0) lines = 0;
+  return true;
 }
 
-void zxBFile::seek_end(const BailDetail& detail) {
-  if (handle == nullptr || !handle->seek(0, Whence::end))
-    bail_code(1012, name, detail);
+bool zxBFile::seek_end(const BailDetail& detail) {
+  if (handle != nullptr && handle->seek(0, Whence::end)) return true;
+  bail_code(1012, name, detail);
+  return false;
 }
 
 std::int32_t zxBFile::tell(const BailDetail& detail) {

@@ -43,11 +43,13 @@ class zxBFile {
   bool try_create(const zxStr& file_name);
   // As try_create(); a failure is fatal (1004).
   void create(const zxStr& file_name, const BailDetail& detail = no_detail);
-  // As create() for a name that must be free: a file or a link of that name
-  // is never followed or cut (1004 as well).
+  // As try_create() for a name that must be free: a file or a link of that
+  // name is never followed or cut.
+  bool try_create_new(const zxStr& file_name);
+  // The same; a failure is fatal (1004).
   void create_new(const zxStr& file_name,
                   const BailDetail& detail = no_detail);
-  // The same for a file that only its owner may read; false on failure.
+  // The same for a file that only its owner may read.
   bool try_create_private(const zxStr& file_name);
 
   // ---- closing.  A closed object is a success.  Whatever the result, the
@@ -63,7 +65,7 @@ class zxBFile {
   bool read(void* buffer, std::int32_t size, std::int32_t* got = nullptr,
             const BailDetail& detail = no_detail);
   // Reads exactly `size` bytes; a short count is fatal (1014).
-  void read_all(void* buffer, std::int32_t size,
+  bool read_all(void* buffer, std::int32_t size,
                 const BailDetail& detail = no_detail);
   // Writes `size` bytes; failure and a closed file are fatal (1016).
   void write(const void* buffer, std::int32_t size,
@@ -76,12 +78,13 @@ class zxBFile {
   // closed file are fatal (1020).
   void sync(const BailDetail& detail = no_detail);
 
-  // ---- positions, in bytes from the start
+  // ---- positions, in bytes from the start; true, if the call came back, says
+  // that the position is as told
   // Moves to `position`; 0 also zeroes `lines`.  A closed file or a negative
   // position fails an assertion; a failure is fatal (1012).
-  void seek(std::int32_t position, const BailDetail& detail = no_detail);
+  bool seek(std::int32_t position, const BailDetail& detail = no_detail);
   // Moves to the end; a failure or a closed file is fatal (1012).
-  void seek_end(const BailDetail& detail = no_detail);
+  bool seek_end(const BailDetail& detail = no_detail);
   // The position; a closed file, or a position that does not fit 31 bits, is
   // fatal (1013, and -1 comes back).
   std::int32_t tell(const BailDetail& detail = no_detail);

@@ -14,7 +14,7 @@ constexpr std::size_t k_buffer_size = 65536;
 // What is read at once behind a seek; it doubles up to the whole buffer.
 constexpr std::size_t k_first_read_ahead = 4096;
 
-zxStream standard_streams[] = {zxStream(zxplat::k_stdin_fd),
+constinit zxStream standard_streams[] = {zxStream(zxplat::k_stdin_fd),
                                zxStream(zxplat::k_stdout_fd),
                                zxStream(zxplat::k_stderr_fd)};
 
@@ -28,7 +28,8 @@ zxStream* zxStream::open(std::string_view name, zxplat::OpenMode mode) {
   const zxplat::Fd fd = zxplat::files.open(name, mode);
   if (fd == zxplat::k_no_fd) return nullptr;
   auto* stream = ::new (zx_realloc(nullptr, sizeof(zxStream))) zxStream(fd);
-  if (mode != zxplat::OpenMode::append) stream->position = 0;
+  stream->appends = mode == zxplat::OpenMode::append;
+  if (!stream->appends) stream->position = 0;
   return stream;
 }
 
@@ -117,7 +118,10 @@ bool zxStream::give_back_unread() {
 
 bool zxStream::begin_writing() {
   if (state == State::writing) return true;
-  if (state == State::reading && !give_back_unread()) return false;
+  if (state == State::reading && !give_back_unread()) {
+    write_failed = true;  // the caller's bytes have no place to go
+    return false;
+  }
   state = State::writing;
   take_buffer();
   return true;
@@ -134,6 +138,7 @@ bool zxStream::write_down(const char* bytes, std::size_t size) {
     size -= static_cast<std::size_t>(done);
     if (position >= 0) position += done;
   }
+  if (appends) position = -1;  // the system chose the place
   return true;
 }
 

@@ -88,6 +88,7 @@ class zxStream {
   bool read_failed = false;
   bool write_failed = false;  // bytes were lost: close() will say so
   bool unbuffered = false;
+  bool appends = false;
 
   // Reading: bytes [next, end) are unread.  Writing: bytes [0, next) are to
   // be written.

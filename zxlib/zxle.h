@@ -34,12 +34,15 @@ class zxLe {
 
   // The machine's order turned to the file's, and back.
   static constexpr T in_file_order(T value) {
-    if constexpr (std::endian::native == std::endian::little) return value;
-    Bits from = static_cast<Bits>(value);
-    Bits to = 0;
-    for (std::size_t i = 0; i < sizeof(T); ++i, from >>= 8)
-      to = static_cast<Bits>(to << 8 | (from & 0xFF));
-    return static_cast<T>(to);
+    if constexpr (std::endian::native == std::endian::little) {
+      return value;
+    } else {
+      const Bits from = static_cast<Bits>(value);
+      Bits to = 0;
+      for (std::size_t i = 0; i < sizeof(T); ++i)
+        to = static_cast<Bits>(to << 8 | ((from >> 8 * i) & 0xFF));
+      return static_cast<T>(to);
+    }
   }
 
   unsigned char bytes[sizeof(T)];

@@ -30,11 +30,11 @@ ZxPackage package_record = {"zx", "3.64b", "test w32  vc", 0, nullptr};
 const char* path_for_core() { return program_path.c_str(); }
 const char* version_for_core() { return program_version.c_str(); }
 
-// By way of the stream, so that nothing overtakes what was printed before.
+// Behind what was printed before, and past the stream's buffer: the heap
+// that it would be taken from may be what failed.
 void print_for_core(std::string_view text) {
-  zxStream& out = zx_standard_stream(zxplat::k_stdout_fd);
-  out.write(text.data(), text.size());
-  out.flush();
+  zx_standard_stream(zxplat::k_stdout_fd).flush();
+  bail_print_directly(text);
 }
 
 // ---- program values

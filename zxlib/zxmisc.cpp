@@ -8,7 +8,7 @@
 #include "zxatsys.h"
 #include "zxplat.h"
 
-zxPos zx_pos;
+constinit zxPos zx_pos;
 
 namespace {
 
@@ -49,7 +49,7 @@ void* heap_slot(void* block, std::size_t size) {
 
 }  // namespace
 
-zxReallocFunction zx_realloc = heap_slot;
+constinit zxReallocFunction zx_realloc = heap_slot;
 
 const char* pos_string(zxPos& position) {
   if (position.file == nullptr) position.file = "?";

@@ -48,12 +48,14 @@ struct zxModuleWord {
   }
 };
 
-// The word of the module that this stands in.
-#define ZX_MODULE                                              \
-  ([]() -> const char* {                                       \
-    static constexpr zxModuleWord word{__FILE__};              \
-    return word.text;                                          \
-  }())
+// The word of the module that this stands in, as a text that lives for ever;
+// a template argument and not a local variable, so that all inline copies of
+// a function share it.
+template <zxModuleWord word>
+constexpr const char* zx_module_text() {
+  return word.text;
+}
+#define ZX_MODULE zx_module_text<zxModuleWord{__FILE__}>()
 
 // Stores this place in zx_pos; stands ahead of a call that can fail, as in
 //   ZX_HERE;

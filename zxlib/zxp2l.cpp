@@ -446,7 +446,7 @@ std::string_view zxLogicalExport::convert(char* room,
   char* const end = room + room_for(physical.size());
   char* start = end;
   constexpr std::string_view k_line_end = "\r\n";
-  if (std::memchr(physical.data(), '\r', physical.size()) != nullptr) {
+  if (physical.find('\r') != std::string_view::npos) {
     for (std::size_t at = physical.rfind(k_line_end);
          at != std::string_view::npos; at = physical.rfind(k_line_end)) {
       start = line_in_front(start, physical.substr(at + k_line_end.size()));

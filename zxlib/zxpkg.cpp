@@ -2,7 +2,7 @@
 // Tests: tests/zxlib/zxpkg_test.cpp.
 #include "zxpkg.h"
 
-ZxPackage* packages = nullptr;
+constinit ZxPackage* packages = nullptr;
 
 void register_package(ZxPackage* package) {
   if (!ZX_ASSERT(package->next == nullptr)) return;

@@ -116,8 +116,8 @@ struct FileCalls {
   // Renames; an existing `to` is never replaced (183).
   RenameResult (*rename)(std::string_view from, std::string_view to);
 
-  // Deletes a file.  A folder fails with 5, and so does a file without any
-  // write permission.
+  // Deletes a file.  A folder fails with 5, and so do a device and a file
+  // without any write permission.
   bool (*remove)(std::string_view name);
 };
 
@@ -131,7 +131,7 @@ enum class NameKind {
   missing,    // nothing, or not to be reached; the reason in last_error()
   file,       // a regular file
   directory,  // a folder
-  device,     // a character device
+  device,     // a character device; Windows shows it as a file
   other,      // a pipe, a socket or the like
 };
 NameKind kind_of(std::string_view name);

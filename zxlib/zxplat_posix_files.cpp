@@ -55,21 +55,27 @@ bool is_read_only(const Status& status) {
   return S_ISREG(status.st_mode) && (status.st_mode & k_any_write) == 0;
 }
 
-// Refuses what the system lets through: a folder, and for writing a file
-// that nobody may write to, which does not stop the super-user.
+// Refuses what the system lets through: a folder; for writing a file that
+// nobody may write to, which does not stop the super-user; for both a pipe,
+// whose reader would wait for itself.
 int checked(int fd, int flags) {
   Status status;
   if (fd == k_no_fd) return fd;
   if (::fstat(fd, &status) != 0) return give_up(fd, errno);
   if (S_ISDIR(status.st_mode)) return give_up(fd, EISDIR);
-  const bool writes = (flags & O_ACCMODE) != O_RDONLY;
-  if (writes && is_read_only(status)) return give_up(fd, EACCES);
+  const int access = flags & O_ACCMODE;
+  if (access == O_RDWR && S_ISFIFO(status.st_mode)) return give_up(fd, EACCES);
+  if (access != O_RDONLY && is_read_only(status)) return give_up(fd, EACCES);
+  // From here on a reader waits for its writer.
+  if (::fcntl(fd, F_SETFL, flags & O_APPEND) != 0) return give_up(fd, errno);
   return fd;
 }
 
+// A pipe without another end must not hold the process up.
 int open_existing(Path& path, int flags) {
-  const int fd = on_existing(
-      path, [&](const char* text) { return open_path(text, flags); });
+  const int fd = on_existing(path, [&](const char* text) {
+    return open_path(text, flags | O_NONBLOCK);
+  });
   return checked(fd, flags);
 }
 
@@ -219,9 +225,14 @@ bool is_same_entry(const Path& a, const Path& b) {
 }
 
 // For file systems that know no rename without replacing: a second name
-// first, which the system refuses if it is taken.
+// first, which the system refuses if it is taken.  Where there are no second
+// names either, the plain rename is left: the name was free just before.
 int link_then_unlink(const char* from, const char* to) {
-  if (::link(from, to) != 0) return -1;
+  if (::link(from, to) != 0) {
+    const bool no_links =
+        errno == EPERM || errno == EOPNOTSUPP || errno == ENOSYS;
+    return no_links ? ::rename(from, to) : -1;
+  }
   if (::unlink(from) == 0) return 0;
   const int error = errno;
   ::unlink(to);
@@ -281,13 +292,18 @@ RenameResult rename_file(std::string_view from, std::string_view to) {
   return rename_path(source, target);
 }
 
+bool is_device(const Status& status) {
+  return S_ISCHR(status.st_mode) || S_ISBLK(status.st_mode);
+}
+
 // A link is deleted itself, whatever it leads to.
 bool remove_file(std::string_view name) {
   Path path;
   Status status;
   if (!to_path(name, path)) return false;
   if (!status_of_entry(path, status)) return fail_on(path);
-  if (S_ISDIR(status.st_mode)) return fail_with(k_err_denied);
+  if (S_ISDIR(status.st_mode) || is_device(status))
+    return fail_with(k_err_denied);
   if (is_read_only(status)) return fail_with(k_err_denied);
   return ::unlink(path.text) == 0 || fail_on(path);
 }
@@ -300,6 +316,24 @@ bool status_of_file(std::string_view name, Path& path, Status& status) {
   return on_existing(path, call) == 0 || fail_on(path);
 }
 
+// The mount that a path lies on: one device can be mounted twice, and no
+// rename crosses from one mount to the other.  False if it cannot be told.
+bool mount_of(const char* path, std::uint64_t& mount) {
+  struct statx status;
+  const int flags = AT_SYMLINK_NOFOLLOW;
+  if (::statx(AT_FDCWD, path, flags, STATX_MNT_ID, &status) != 0 ||
+      (status.stx_mask & STATX_MNT_ID) == 0)
+    return false;
+  mount = status.stx_mnt_id;
+  return true;
+}
+
+bool mounts_differ(const char* a, const char* b) {
+  std::uint64_t mount_a = 0;
+  std::uint64_t mount_b = 0;
+  return mount_of(a, mount_a) && mount_of(b, mount_b) && mount_a != mount_b;
+}
+
 // True if both devices are known and differ.
 bool crosses_devices(std::string_view from, std::string_view to) {
   Path source;
@@ -309,7 +343,11 @@ bool crosses_devices(std::string_view from, std::string_view to) {
   if (!to_path(from, source) || !to_path(to, target)) return false;
   if (!status_of_entry(source, file)) return false;
   find(target);  // for its folder, which may be spelled otherwise
-  return folder_status(target, folder) && file.st_dev != folder.st_dev;
+  if (!folder_status(target, folder)) return false;
+  Path folder_path;
+  folder_of(target, folder_path);
+  return file.st_dev != folder.st_dev ||
+         mounts_differ(source.text, folder_path.text);
 }
 
 bool set_attributes(const char* path, const Status& status) {

@@ -44,19 +44,16 @@ struct zxFmtArg {
       : tag('c'), value(static_cast<unsigned char>(byte)) {}
   zxFmtArg(const char* text)
       : tag('z'), value(reinterpret_cast<std::uintptr_t>(text)) {}
-  zxFmtArg(const zxStr& text)
-      : tag('s'), value(reinterpret_cast<std::uintptr_t>(&text)) {}
-  zxFmtArg(const double& number)
+  // Exactly these types: what only converts to one would be a temporary,
+  // gone by the time that the record is read.
+  zxFmtArg(const std::derived_from<zxStr> auto& text)
+      : tag('s'),
+        value(reinterpret_cast<std::uintptr_t>(
+            static_cast<const zxStr*>(&text))) {}
+  zxFmtArg(const std::same_as<double> auto& number)
       : tag('f'), value(reinterpret_cast<std::uintptr_t>(&number)) {}
-  zxFmtArg(const zxDate& date)
+  zxFmtArg(const std::same_as<zxDate> auto& date)
       : tag('t'), value(reinterpret_cast<std::uintptr_t>(&date)) {}
-
-  // Every other number type would have to be converted, which is the
-  // caller's decision.
-  template <class T>
-    requires(std::is_arithmetic_v<T> && !std::same_as<T, int> &&
-             !std::same_as<T, char> && !std::same_as<T, double>)
-  zxFmtArg(T) = delete;
 };
 
 // Composes into `out`, whose old text is dropped.  False on a bad format:

@@ -48,14 +48,9 @@ char& scratch_byte() {
 
 }  // namespace
 
-zxStrRep zx_empty_rep = {0, 0, 0, {'\0'}};
+constinit zxStrRep zx_empty_rep = {0, 0, 0, {'\0'}};
 
 // ---- representation
-
-bool zxStr::check() const {
-  return ZX_ASSERT(rep->length >= 0 && rep->length <= rep->capacity &&
-                   rep->refs >= 0 && rep->data[rep->length] == '\0');
-}
 
 void zxStr::release() {
   if (rep->refs == 0) return;
@@ -136,10 +131,12 @@ zxStr& zxStr::operator=(const zxStr& other) {
 }
 
 // A block that is not counted lies inside some string object or is the
-// shared empty one: it is copied, never taken.
+// shared empty one: it is copied, never taken.  An empty source clears.
 zxStr& zxStr::operator=(zxStr&& other) noexcept {
+  if (!check() || !other.check()) return *this;
   const bool inner_room = rep->refs == 0 && rep != &zx_empty_rep;
-  if (inner_room || other.rep->refs == 0) return *this = other;
+  if (inner_room || other.rep->refs == 0 || other.rep->length == 0)
+    return *this = other;
   if (rep == other.rep) return *this;
   release();
   rep = other.rep;
@@ -171,7 +168,8 @@ void zxStr::build(const char* a, std::int32_t a_length, const char* b,
   const bool b_is_own = b_length > 0 && is_within(b);
   const bool grows = rep->capacity < sum;
   if (rep->refs != 1 || b_is_own || (grows && is_within(a))) {
-    zxStrRep* fresh = new_block(sum);
+    const bool keeps_room = rep->refs == 1 && !grows;
+    zxStrRep* fresh = new_block(keeps_room ? rep->capacity : sum);
     fill(fresh, a, a_length, b, b_length);
     release();
     rep = fresh;
@@ -394,26 +392,31 @@ zxStr joined(const char* a, std::int32_t a_length, const char* b,
 }  // namespace
 
 zxStr operator+(const zxStr& a, const zxStr& b) {
+  if (!a.check() || !b.check()) return {};
   if (a.is_empty()) return b;
   if (b.is_empty()) return a;
   return joined(a.c_str(), a.length(), b.c_str(), b.length());
 }
 
 zxStr operator+(const zxStr& a, const char* b) {
+  if (!a.check()) return {};
   if (!ZX_ASSERT(b != nullptr) || *b == '\0') return a;
   return joined(a.c_str(), a.length(), b, zx_count(std::strlen(b)));
 }
 
 zxStr operator+(const char* a, const zxStr& b) {
+  if (!b.check()) return {};
   if (!ZX_ASSERT(a != nullptr) || *a == '\0') return b;
   return joined(a, zx_count(std::strlen(a)), b.c_str(), b.length());
 }
 
 zxStr operator+(const zxStr& a, char b) {
+  if (!a.check()) return {};
   return joined(a.c_str(), a.length(), &b, 1);
 }
 
 zxStr operator+(char a, const zxStr& b) {
+  if (!b.check()) return {};
   return joined(&a, 1, b.c_str(), b.length());
 }
 

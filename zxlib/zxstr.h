@@ -83,7 +83,7 @@ class zxStr {
 
   // ---- reading
   std::int32_t length() const { return rep->length; }
-  bool is_empty() const { return rep->length == 0; }
+  bool is_empty() const { return check() && rep->length == 0; }
   std::int32_t capacity() const { return rep->capacity; }
 
   // The characters with a NUL behind them; valid until the string changes or
@@ -101,9 +101,16 @@ class zxStr {
   // through it costs the sharing too.  The same bounds.
   char& at(std::int32_t i);
 
+  // Checks the representation's invariant, as nearly every operation does
+  // first; a broken one fails an assertion.
+  bool check() const {
+    return ZX_ASSERT(rep->length >= 0 && rep->length <= rep->capacity &&
+                     rep->refs >= 0 && rep->data[rep->length] == '\0');
+  }
+
   // ---- comparing, by length and bytes
   friend bool operator==(const zxStr& a, const zxStr& b) {
-    return a.equals(b.c_str(), b.length());
+    return b.check() && a.equals(b.c_str(), b.length());
   }
   bool operator==(const char* text) const;
   bool operator==(char byte) const;
@@ -163,7 +170,6 @@ class zxStr {
   const zxStrRep* representation() const { return rep; }
 
  private:
-  bool check() const;
   bool equals(const char* text, std::int32_t size) const;
   void release();
   bool is_within(const char* place) const;

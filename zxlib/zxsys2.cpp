@@ -35,13 +35,18 @@ zxStr text_of(std::size_t (*query)(std::span<char>), std::int32_t line) {
   }
 }
 
+// True if a name begins with a drive, as in "C:".
+bool is_drive(const zxStr& path) {
+  return zx_is(path.c_str()[0], k_class_latin) && path.c_str()[1] == ':';
+}
+
 // How far the directory of a name reaches.
 std::int32_t dir_length(const zxStr& path) {
   std::int32_t n = path.length();
   for (; n > 0; --n) {
     const char last = path.c_str()[n - 1];
     if (last == '\\' || last == '/') return n;
-    if (n == 2 && last == ':') return n;
+    if (n == 2 && is_drive(path)) return n;
   }
   return 0;
 }
@@ -74,29 +79,32 @@ void copy_rest(zxBFile& in, zxBFile& out) {
   while (in.read(room, k_copy_block, &got)) out.write(room, got);
 }
 
-// Opens a new file with a unique name beside `to`, for its owner alone: the
-// copy must never be more readable than its source.  Another process may
-// take the name in between; then the next one is tried.
-void create_beside(const zxStr& to, zxBFile& out) {
+// Creates a file under a unique name by `create`, a member of zxBFile that
+// refuses a name that is taken: another process may have taken it since it
+// was found free, and then the next one is tried.  The name, also on failure.
+zxStr create_unique(zxBFile& file, bool (zxBFile::*create)(const zxStr&),
+                    const zxStr& directory, const char* extension) {
   zxStr name;
   for (int i = 0; i < k_name_tries; ++i) {
-    name = uniqfile(dir_part(to), "cpy");
-    if (out.try_create_private(name)) return;
+    name = uniqfile(directory, extension);
+    if ((file.*create)(name)) return name;
     if (zxplat::last_error() != zxplat::k_err_exists_on_create) break;
   }
   bail_code(1004, name);
+  return name;
 }
 
-// Copies `from` into a new file beside `to`, down to the device.  The name of
+// Copies `from` into a new file beside `to`, down to the device, and for its
+// owner alone: it must never be more readable than its source.  The name of
 // the copy; empty if a failure was dropped on the way.
 zxStr copy_beside(const zxStr& from, const zxStr& to) {
   zxBFile in;
   in.open_or_die(from);
   if (!in.is_open()) return {};
   zxBFile out;
-  create_beside(to, out);
+  const zxStr name =
+      create_unique(out, &zxBFile::try_create_private, dir_part(to), "cpy");
   if (!out.is_open()) return {};
-  const zxStr name = out.name;
   copy_rest(in, out);
   out.sync(no_detail);
   const bool complete = !in.handle->error() && !out.handle->error();
@@ -111,23 +119,24 @@ bool crosses_devices(zxplat::RenameResult result) {
           zxplat::last_error() == zxplat::k_err_not_found);
 }
 
+// Deletes a copy that cannot take its place; the failure shows its own cause.
+bool give_copy_up(const zxStr& copy, std::int32_t message, const zxStr& to) {
+  const int reason = zxplat::last_error();
+  zxplat::files.remove(copy.view());
+  zxplat::set_last_error(reason);
+  bail_code(message, to);
+  return false;
+}
+
 // The whole of cpfile(); true if the copy stands under its name.
 bool copy_file(const zxStr& from, const zxStr& to) {
   const zxStr copy = copy_beside(from, to);
   if (copy.is_empty()) return false;
   zxplat::copy_attributes(from.view(), copy.view());
-  if (!try_delete(to)) {
-    bail_code(1027, to);
-    return false;
-  }
-  if (zxplat::files.rename(copy.view(), to.view()) ==
-      zxplat::RenameResult::done)
-    return true;
-  const int reason = zxplat::last_error();
-  zxplat::files.remove(copy.view());
-  zxplat::set_last_error(reason);
-  bail_code(1038, to);
-  return false;
+  if (!try_delete(to)) return give_copy_up(copy, 1027, to);
+  const bool renamed = zxplat::files.rename(copy.view(), to.view()) ==
+                       zxplat::RenameResult::done;
+  return renamed || give_copy_up(copy, 1038, to);
 }
 
 // The source goes only when the copy stands under the name `to`.
@@ -141,9 +150,7 @@ zxStr with_slash(const zxStr& directory) {
   const std::int32_t n = directory.length();
   if (n == 0) return directory;
   const char last = directory.c_str()[n - 1];
-  const bool bare_drive = n == 2 && last == ':' &&
-                          zx_is(directory.c_str()[0], k_class_latin);
-  if (last == '\\' || bare_drive) return directory;
+  if (last == '\\' || (n == 2 && is_drive(directory))) return directory;
   if (last != '/') return directory + '\\';
   zxStr result = directory;
   result.at(n - 1) = '\\';
@@ -183,6 +190,11 @@ zxStr uniqfile(const zxStr& directory, const char* extension) {
 
 zxStr unique_temp_name(const char* extension) {
   return uniqfile(temp_path(), extension);
+}
+
+zxStr create_temp_file(zxBFile& file, const char* extension) {
+  return create_unique(file, &zxBFile::try_create_new, temp_path(),
+                       extension);
 }
 
 bool try_delete(const zxStr& name) {

@@ -7,6 +7,7 @@
 #ifndef ZXSYS2_H
 #define ZXSYS2_H
 
+#include "zxbfile.h"
 #include "zxstr.h"
 
 // The directory with a separator at its end: unchanged if it is empty, ends
@@ -38,6 +39,12 @@ zxStr uniqfile(const zxStr& directory, const char* extension);
 // The same in the temporary directory.
 zxStr unique_temp_name(const char* extension);
 
+// Creates a file in the temporary directory under such a name, which comes
+// back, and leaves it open in `file`.  A file or a link that took the name
+// in between is never opened; then the next name is tried.  Fatal on failure
+// (1004, 1037).
+zxStr create_temp_file(zxBFile& file, const char* extension);
+
 // Deletes a file.  True if it is gone, also if it was not there.
 bool try_delete(const zxStr& name);
 // Deletes a file if it is there; failure is fatal (1027).
@@ -45,14 +52,15 @@ void delefile(const zxStr& name);
 // Deletes a file; failure, also a missing file, is fatal (1026).
 void delfile(const zxStr& name);
 
-// Copies a file with its time, by way of a temporary name beside `to`, so
-// that `to` is replaced by a complete copy only.  Fatal if `from` cannot be
-// opened (1002), the copy not be made (1004, 1014, 1016, 1010), `to` not be
-// deleted (1027) or the copy not be renamed (1038, the copy is deleted).
+// Copies a file with its modification time, by way of a temporary name
+// beside `to`, so that `to` is replaced by a complete copy only.  Fatal if
+// `from` cannot be opened (1002), the copy not be made (1004, 1010, 1014,
+// 1016, 1020, 1037), `to` not be deleted (1027) or the copy not be renamed
+// (1038); in the last two cases the copy is deleted.
 void cpfile(const zxStr& from, const zxStr& to);
 
-// Renames a file, replacing `to`; across devices it is copied and deleted
-// (1026).  One file under both names, or a directory as `to`, fails an
+// Renames a file, replacing `to`; across devices it is copied as by
+// cpfile(), with its messages, and deleted (1026).  One file under both names, or a directory as `to`, fails an
 // assertion.  Fatal if `from` is not there (1002), `to` cannot be deleted
 // (1027) or the rename fails (1036).
 //

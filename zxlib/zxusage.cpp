@@ -25,17 +25,11 @@ bool is_valid(const zxStr& value, Kind kind) {
   return value.is_empty() || value == "+" || value == "-";
 }
 
-struct Option {
-  zxStr name;
-  Kind kind = Kind::flag;
+// The declared options.
+struct Declared {
+  zxSA<zxStr> names;  // each spelling to its canonical name
+  zxSA<Kind> kinds;   // by canonical name
 };
-
-}  // namespace
-
-template <>
-inline constexpr bool zx_relocatable<Option> = true;
-
-namespace {
 
 // Takes the text ahead of the next byte for which `is_end` holds off the
 // front of `rest`, that byte included; pieces that are empty are skipped.
@@ -53,28 +47,30 @@ std::string_view next_piece(std::string_view& rest, IsEnd is_end) {
 
 bool ends_entry(char byte) { return byte == ',' || byte == ';'; }
 
-// The declared options under each of their spellings.
-using Declared = zxSA<Option>;
+// The kind that a word asks for: the first type letter behind a colon, the
+// word's other characters do not matter.  False if there is none.
+bool type_in(std::string_view word, Kind& kind) {
+  for (std::size_t i = word.find(':'); i != word.npos && i + 1 < word.size();
+       i = word.find(':', i + 1)) {
+    if (word[i + 1] != 's' && word[i + 1] != 'b') continue;
+    kind = word[i + 1] == 's' ? Kind::text : Kind::flag;
+    return true;
+  }
+  return false;
+}
 
 // Declares the option of one entry.
 void declare(std::string_view entry, Declared& declared) {
   const zxStr name(next_piece(entry, zx_is_space));
   if (name.is_empty()) return;
-  Option option{name, Kind::flag};
-  zxQVA<zxStr> spellings;
-  spellings.append(name);
+  declared.names.set(name, name);
+  Kind kind = Kind::flag;
   for (;;) {
     const std::string_view word = next_piece(entry, zx_is_space);
     if (word.empty()) break;
-    if (word.find(":s") != std::string_view::npos)
-      option.kind = Kind::text;
-    else if (word.find(":b") != std::string_view::npos)
-      option.kind = Kind::flag;
-    else
-      spellings.append(zxStr(word));
+    if (!type_in(word, kind)) declared.names.set(zxStr(word), name);
   }
-  for (std::int32_t i = 0; i < spellings.length(); ++i)
-    declared.set(spellings.get(i), option);
+  declared.kinds.set(name, kind);
 }
 
 void declare_all(const zxStr& declaration, Declared& declared) {
@@ -104,23 +100,24 @@ class Scan {
   // True if the scan goes on with the next argument.
   bool step() {
     const zxStr typed = args.get(0);
-    if (const Option* option = declared.find(typed))
-      return take_exact(*option, typed);
+    if (const zxStr* name = declared.names.find(typed))
+      return take_exact(*name, typed);
     if (!begins_with_dash(typed) || typed.length() < 2) return false;
-    const Option* option = declared.find(zxStr(typed.c_str(), 2));
-    return option != nullptr && take_attached(*option, typed);
+    const zxStr* name = declared.names.find(zxStr(typed.c_str(), 2));
+    return name != nullptr && take_attached(*name, typed);
   }
 
   // An option spelled in full, its parameter in the next argument.  One that
   // may be empty never takes the next argument.
-  bool take_exact(const Option& option, const zxStr& typed) {
+  bool take_exact(const zxStr& name, const zxStr& typed) {
+    const Kind kind = declared.kinds.get(name);
     args.drop_first();
-    if (is_valid(zxStr(), option.kind)) {
-      opts.set(option.name, zxStr());
+    if (is_valid(zxStr(), kind)) {
+      opts.set(name, zxStr());
       return true;
     }
-    if (args.length() > 0 && is_valid(args.get(0), option.kind)) {
-      opts.set(option.name, args.pop_first());
+    if (args.length() > 0 && is_valid(args.get(0), kind)) {
+      opts.set(name, args.pop_first());
       return true;
     }
     error = "bad or missing parm for " + typed;
@@ -128,15 +125,16 @@ class Scan {
   }
 
   // A dash and one character, with a parameter or further flags attached.
-  bool take_attached(const Option& option, const zxStr& typed) {
+  bool take_attached(const zxStr& name, const zxStr& typed) {
+    const Kind kind = declared.kinds.get(name);
     const zxStr rest(typed.c_str() + 2, typed.length() - 2);
-    if (is_valid(rest, option.kind)) {
-      opts.set(option.name, rest);
+    if (is_valid(rest, kind)) {
+      opts.set(name, rest);
       args.drop_first();
       return true;
     }
-    if (!is_valid(zxStr(), option.kind)) return false;
-    opts.set(option.name, zxStr());
+    if (!is_valid(zxStr(), kind)) return false;
+    opts.set(name, zxStr());
     args.ref(0) = '-' + rest;
     return true;
   }

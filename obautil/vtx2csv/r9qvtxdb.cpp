@@ -113,7 +113,7 @@ int read_data_head(const zxStr& directory) {
 
 int read_at(std::int32_t offset, VtxRecord& record) {
   if (offset == VtxIndexEntry::k_no_record) return k_vtx_no_record;
-  table.data_file.seek(offset);
+  if (!table.data_file.seek(offset)) return k_vtx_bad_data;
   return table.data_file.read(&record, sizeof record) ? k_vtx_ok
                                                       : k_vtx_bad_data;
 }
@@ -257,10 +257,12 @@ void vtx_put_record(const VtxRecord& record) {
   VtxIndexEntry* entry = find_entry(record.num[0].to_double());
   if (entry == nullptr) return bail_code(k_error_unknown_code);
   if (entry->offset != VtxIndexEntry::k_no_record) {
-    table.data_file.seek(entry->offset);
+    if (!table.data_file.seek(entry->offset)) return;
   } else {
-    table.data_file.seek_end();
-    entry->offset = table.data_file.tell();
+    if (!table.data_file.seek_end()) return;
+    const std::int32_t position = table.data_file.tell();
+    if (position < 0) return;
+    entry->offset = position;
     write_own_index();
   }
   table.data_file.write(&record, sizeof record);
@@ -268,8 +270,9 @@ void vtx_put_record(const VtxRecord& record) {
 
 void vtx_rebuild_index() {
   if (!check_open()) return;
-  table.data_file.seek(0);
-  table.data_file.read_all(&table.data_head, sizeof table.data_head);
+  if (!table.data_file.seek(0) ||
+      !table.data_file.read_all(&table.data_head, sizeof table.data_head))
+    return;
   std::int32_t position = table.data_file.tell();
   for (std::int32_t i = 0; i < table.entry_count; ++i)
     table.entries[i].offset = VtxIndexEntry::k_no_record;

@@ -96,11 +96,13 @@ void Row::add_cell(const ColumnDef& column) {
   if (static_cast<std::size_t>(at - room) > k_room - k_cell_room) flush();
   const std::int32_t i = column.index;
   if (column.type == k_num) {
-    at = record.num[i].write_text(at);
+    if (ZX_ASSERT(i >= 0 && i < VtxRecord::k_nums))
+      at = record.num[i].write_text(at);
   } else if (column.type == k_text) {
     add_text(record.text_field(i));
   } else if (column.type == k_date) {
-    add_date(record.dates[i]);
+    if (ZX_ASSERT(i >= 0 && i < VtxRecord::k_dates))
+      add_date(record.dates[i]);
   } else if (column.type == k_natype) {
     *at++ = type_letter(record.type);
   } else {
@@ -189,9 +191,8 @@ int zx_main() {
   ZX_HERE;
   oprint("start converting to #", output);
 
-  const zxStr temporary = unique_temp_name("csv");
   zxBFile out;
-  out.create_new(temporary);
+  const zxStr temporary = create_temp_file(out, "csv");
   write_table(out);
   out.close(no_detail);
   move_file(temporary, output);
