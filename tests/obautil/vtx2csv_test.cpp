@@ -27,8 +27,7 @@ zxStr str(std::string_view text) { return zxStr(text); }
 
 VtxRecord record_of(const Record& record) {
   VtxRecord result;
-  std::memcpy(static_cast<void*>(&result), record.bytes.data(),
-              sizeof result);
+  std::memcpy(static_cast<void*>(&result), record.bytes.data(), sizeof result);
   return result;
 }
 
@@ -63,9 +62,8 @@ std::string header(std::span<const ColumnDef> columns = g_columns) {
 
 Written try_row(const Record& record,
                 std::span<const ColumnDef> columns = g_columns) {
-  return written([&](zxBFile& out) {
-    write_record_row(record_of(record), out, columns);
-  });
+  return written(
+      [&](zxBFile& out) { write_record_row(record_of(record), out, columns); });
 }
 
 std::string row(const Record& record,
@@ -228,19 +226,18 @@ TEST(vtx2csv, a_record_of_zeros_has_zeros_and_the_first_day) {
 TEST(vtx2csv, every_cell_stands_in_its_column) {
   Record record;
   record.type(1);
-  for (int i = 0; i < 9; ++i) record.text(i, "t" + std::to_string(i));
+  for (int i = 0; i < 9; ++i) record.text(i, "t"s + static_cast<char>('a' + i));
   for (int i = 0; i < 53; ++i) record.num(i, 2 * (100 + i));
   for (int i = 0; i < 12; ++i) record.day(i, 31 + i);
-  EXPECT_EQ(
-      row(record),
-      "100, t0, I, t1, t2, t8, t3, t4, t5, t6, t7, 149, 152, "
-      "101, 102, 103, 104, 105, 106, 107, 108, 109, 110, 111, 112, "
-      "113, 114, 115, 116, 117, 118, 119, 120, 121, 122, 123, 124, "
-      "125, 126, 127, 128, 129, 130, 131, 132, 133, 134, 135, 136, "
-      "137, 138, 139, 140, 141, 142, 143, 144, 145, 146, 147, 148, "
-      "150, 151, "
-      "01-02-70, 02-02-70, 03-02-70, 04-02-70, 05-02-70, 06-02-70, "
-      "07-02-70, 08-02-70, 09-02-70, 10-02-70, 11-02-70, 12-02-70\n");
+  EXPECT_EQ(row(record),
+            "100, ta, I, tb, tc, ti, td, te, tf, tg, th, 149, 152, "
+            "101, 102, 103, 104, 105, 106, 107, 108, 109, 110, 111, 112, "
+            "113, 114, 115, 116, 117, 118, 119, 120, 121, 122, 123, 124, "
+            "125, 126, 127, 128, 129, 130, 131, 132, 133, 134, 135, 136, "
+            "137, 138, 139, 140, 141, 142, 143, 144, 145, 146, 147, 148, "
+            "150, 151, "
+            "01-02-70, 02-02-70, 03-02-70, 04-02-70, 05-02-70, 06-02-70, "
+            "07-02-70, 08-02-70, 09-02-70, 10-02-70, 11-02-70, 12-02-70\n");
 }
 
 // The first date, the blocks and the rest have no column.
@@ -258,7 +255,7 @@ struct Letter {
 
 TEST(vtx2csv, the_type_is_a_letter_or_a_nul) {
   constexpr Letter k_rows[] = {
-      {0, 'B'},  {1, 'I'},      {2, 'R'},       {3, '\0'},   {4, '\0'},
+      {0, 'B'},   {1, 'I'},    {2, 'R'},          {3, '\0'},         {4, '\0'},
       {-1, '\0'}, {100, '\0'}, {INT16_MAX, '\0'}, {INT16_MIN, '\0'},
   };
   for (const Letter& letter : k_rows) {
@@ -277,12 +274,18 @@ struct Number {
 
 TEST(vtx2csv, numbers_are_shown_with_up_to_15_digits) {
   constexpr Number k_rows[] = {
-      {0, "0"},           {2, "1"},
-      {-2, "-1"},         {5003, "12.5"},
-      {403, "0.015625"},  {160001, "1"},
-      {21, "1e-006"},     {25, "1e-008"},
-      {-7, "-1e-008"},    {1234 * 16 + 9, "1.234e-005"},
-      {17, "0.0001"},     {29, "1000"},
+      {0, "0"},
+      {2, "1"},
+      {-2, "-1"},
+      {5003, "12.5"},
+      {403, "0.015625"},
+      {160001, "1"},
+      {21, "1e-006"},
+      {25, "1e-008"},
+      {-7, "-1e-008"},
+      {1234 * 16 + 9, "1.234e-005"},
+      {17, "0.0001"},
+      {29, "1000"},
       {INT32_MAX - 2, "134217727000"},
       {INT32_MIN, "-1073741824"},
   };
@@ -367,8 +370,7 @@ TEST(vtx2csv, a_text_without_an_end_runs_into_the_next_field) {
 }
 
 TEST(vtx2csv, line_ends_in_a_text_stay) {
-  EXPECT_EQ(text_cell("\x81\x80\r\n\x82"),
-            "\xD7\x90\xD7\x91\r\n\xD7\x92");
+  EXPECT_EQ(text_cell("\x81\x80\r\n\x82"), "\xD7\x90\xD7\x91\r\n\xD7\x92");
   EXPECT_EQ(text_cell("a\nb"), "a\nb");
 }
 

@@ -1,0 +1,936 @@
+// zxbfile_test.cpp - the file class: each operation in success and in each
+// of its failures, with the whole messages; names; closed and open objects;
+// what is left behind a dropped failure.
+// Tests zxlib/zxbfile.h and zxbfile.cpp.
+#include "zxbfile.h"
+
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "kit/cases.h"
+#include "kit/failure.h"
+#include "kit/faults.h"
+#include "kit/target.h"
+#include "kit/tempdir.h"
+#include "zxmainf.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using kit::Call;
+using kit::Faults;
+using kit::read_file;
+using kit::TempDir;
+using kit::write_file;
+
+constexpr BailDetail k_detail(7, "context");
+
+// The diagnostic line of a failure, whose text it cuts.
+std::string line_of(int number, const std::string& text,
+                    const BailDetail& detail = no_detail) {
+  const std::string n = std::to_string(number);
+  return "[" + n + "-" + n + "-" + std::to_string(detail.number) + "/E-0/E/" +
+         text.substr(0, 12) + "/" +
+         (detail.text != nullptr ? detail.text : "") + "]";
+}
+
+void expect_failure(const std::function<void()>& statement, int number,
+                    const std::string& message, const std::string& text,
+                    const BailDetail& detail = no_detail) {
+  const std::string added = detail.number != 0 ? " (7: context)" : "";
+  EXPECT_FAILURE(statement(), std::to_string(number) + ": " + message + added,
+                 line_of(number, text, detail));
+}
+
+// Runs a statement without and with a detail: `run` gets the detail.
+void expect_failure_with_details(
+    const std::function<void(const BailDetail&)>& run, int number,
+    const std::string& message, const std::string& text) {
+  for (const BailDetail& detail : {no_detail, k_detail})
+    expect_failure([&] { run(detail); }, number, message, text, detail);
+}
+
+std::string quoted(const std::string& text) { return "'" + text + "'"; }
+
+std::string text_of(const zxStr& text) { return std::string(text.view()); }
+
+// A folder with a file of ten bytes.
+class zxbfile : public testing::Test {
+ protected:
+  zxbfile() { write_file(path, k_bytes); }
+
+  std::string bytes() const { return read_file(path); }
+
+  // Up to `size` bytes from the position on, as a read with a count gives
+  // them.
+  static std::string read(zxBFile& file, std::int32_t size) {
+    std::string bytes(static_cast<std::size_t>(size), '?');
+    std::int32_t got = -1;
+    const bool read = file.read(bytes.data(), size, &got);
+    EXPECT_EQ(read, got == size || got > 0);
+    bytes.resize(static_cast<std::size_t>(got));
+    return bytes;
+  }
+
+  static void write(zxBFile& file, std::string_view text) {
+    file.write(text.data(), static_cast<std::int32_t>(text.size()));
+  }
+
+  static constexpr std::string_view k_bytes = "0123456789";
+  TempDir folder;
+  const std::string path = folder.file("file");
+  const std::string missing = folder.file("none");
+  const zxStr name = path.c_str();
+  const zxStr missing_name = missing.c_str();
+};
+
+// The four ways of opening that exist as a try and as a fatal form or the
+// other way round.
+struct Opening {
+  const char* label;
+  void (*open)(zxBFile& file, const zxStr& name);
+  int already_open;  // the message of an object that is open
+  const char* already_open_text;
+};
+
+constexpr Opening k_openings[] = {
+    {"open", [](zxBFile& file, const zxStr& name) { file.open(name); }, 1009,
+     "open: File '%' already open"},
+    {"open_or_die",
+     [](zxBFile& file, const zxStr& name) { file.open_or_die(name); }, 1009,
+     "open: File '%' already open"},
+    {"open_rw", [](zxBFile& file, const zxStr& name) { file.open_rw(name); },
+     1005, "open_rw: File already open '%'"},
+    {"try_create",
+     [](zxBFile& file, const zxStr& name) { file.try_create(name); }, 1003,
+     "create: File already open"},
+    {"create", [](zxBFile& file, const zxStr& name) { file.create(name); },
+     1003, "create: File already open"},
+    {"create_new",
+     [](zxBFile& file, const zxStr& name) { file.create_new(name); }, 1003,
+     "create: File already open"},
+    {"try_create_new",
+     [](zxBFile& file, const zxStr& name) { file.try_create_new(name); }, 1003,
+     "create: File already open"},
+    {"try_create_private",
+     [](zxBFile& file, const zxStr& name) { file.try_create_private(name); },
+     1003, "create: File already open"},
+};
+
+std::string filled(std::string text, const std::string& argument) {
+  const std::size_t place = text.find('%');
+  if (place != text.npos) text.replace(place, 1, argument);
+  return text;
+}
+
+// ---- a closed object
+
+TEST_F(zxbfile, a_fresh_object_is_closed_and_has_no_name) {
+  const zxBFile file;
+  EXPECT_FALSE(file.is_open());
+  EXPECT_EQ(file.handle, nullptr);
+  EXPECT_TRUE(file.name.is_empty());
+  EXPECT_EQ(file.lines, 0);
+}
+
+TEST_F(zxbfile, a_closed_object_fails_each_operation_in_its_own_way) {
+  zxBFile file;
+  char room[4] = {};
+  std::int32_t got = 99;
+  using Detail = BailDetail;
+  expect_failure_with_details(
+      [&](const Detail& d) { file.read(room, 4, &got, d); }, 1014,
+      "read: '' operation failed", "");
+  EXPECT_EQ(got, 0);
+  expect_failure_with_details(
+      [&](const Detail& d) { file.read_all(room, 4, d); }, 1014,
+      "read: '' operation failed", "");
+  expect_failure_with_details([&](const Detail& d) { file.write("abc", 3, d); },
+                              1016, "write: failed on ''", "");
+  expect_failure([&] { file.puts("abc"); }, 1024, "puts: file not opened", "");
+  expect_failure_with_details([&](const Detail& d) { file.sync(d); }, 1020,
+                              "flush: '' operation failed", "");
+  expect_failure_with_details([&](const Detail& d) { file.seek_end(d); }, 1012,
+                              "seek: operation failed", "");
+  expect_failure_with_details([&](const Detail& d) { file.tell(d); }, 1013,
+                              "getpos: operation failed", "");
+  EXPECT_ASSERTION(file.seek(0), "zxbfile");
+  EXPECT_EQ(file.lines, 0);
+}
+
+TEST_F(zxbfile, closing_a_closed_object_is_a_success) {
+  zxBFile file;
+  EXPECT_TRUE(file.close());
+  file.close(k_detail);
+  EXPECT_FALSE(file.is_open());
+}
+
+TEST_F(zxbfile, a_closed_object_behind_dropped_failures_gives_neutral_values) {
+  zxBFile file;
+  char room[4] = {'a', 'b', 'c', 'd'};
+  std::int32_t got = 99;
+  kit::with_failures_dropped([&] {
+    EXPECT_FALSE(file.read(room, 4, &got));
+    EXPECT_EQ(got, 0);
+    EXPECT_FALSE(file.read(room, 0));
+    EXPECT_FALSE(file.read_all(room, 4));
+    file.write("xyz", 3);
+    file.puts("xyz");
+    file.sync();
+    EXPECT_FALSE(file.seek(0));
+    EXPECT_FALSE(file.seek(5));
+    EXPECT_FALSE(file.seek_end());
+    EXPECT_EQ(file.tell(), -1);
+  });
+  EXPECT_EQ(std::string(room, 4), "abcd");
+  EXPECT_FALSE(file.is_open());
+  EXPECT_EQ(file.lines, 0);
+}
+
+// ---- opening
+
+TEST_F(zxbfile, an_opened_object_has_its_name_and_no_lines) {
+  const std::string fresh = folder.file("fresh");
+  for (const Opening& opening : k_openings) {
+    SCOPED_TRACE(opening.label);
+    const bool is_new = opening.label == std::string("create_new") ||
+                        opening.label == std::string("try_create_new") ||
+                        opening.label == std::string("try_create_private");
+    const zxStr used = is_new ? zxStr(fresh.c_str()) : name;
+    zxBFile file;
+    file.lines = 12;
+    opening.open(file, used);
+    EXPECT_TRUE(file.is_open());
+    EXPECT_TRUE(file.name == used);
+    EXPECT_EQ(file.lines, 0);
+    EXPECT_EQ(file.tell(), 0);
+    EXPECT_TRUE(file.close());
+    EXPECT_FALSE(file.is_open());
+    EXPECT_TRUE(file.name.is_empty());
+    fs::remove(fresh);
+  }
+}
+
+TEST_F(zxbfile, the_try_forms_tell_their_success) {
+  zxBFile file;
+  EXPECT_TRUE(file.open(name));
+  file.close();
+  EXPECT_TRUE(file.open_rw(name));
+  file.close();
+  EXPECT_TRUE(file.try_create(name));
+  file.close();
+  EXPECT_TRUE(file.try_create_private(missing_name));
+  file.close();
+  EXPECT_TRUE(file.try_create_new(folder.file("another").c_str()));
+}
+
+TEST_F(zxbfile, reading_reads_and_reading_and_writing_does_both) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  EXPECT_EQ(read(file, 20), k_bytes);
+  file.close();
+  ASSERT_TRUE(file.open_rw(name));
+  EXPECT_EQ(read(file, 2), "01");
+  write(file, "ab");
+  EXPECT_EQ(read(file, 2), "45");
+  EXPECT_TRUE(file.close());
+  EXPECT_EQ(bytes(), "01ab456789");
+}
+
+TEST_F(zxbfile, creating_cuts_an_old_file_and_makes_a_new_one) {
+  zxBFile file;
+  ASSERT_TRUE(file.try_create(name));
+  EXPECT_EQ(bytes(), "");
+  file.close();
+  file.create(missing_name);
+  write(file, "new");
+  EXPECT_TRUE(file.close());
+  EXPECT_EQ(read_file(missing), "new");
+}
+
+TEST_F(zxbfile, a_missing_file_is_refused_and_not_made) {
+  zxBFile file;
+  EXPECT_FALSE(file.open(missing_name));
+  EXPECT_FALSE(file.open_rw(missing_name));
+  EXPECT_FALSE(file.is_open());
+  EXPECT_TRUE(file.name.is_empty());
+  EXPECT_FALSE(fs::exists(missing));
+  expect_failure_with_details(
+      [&](const BailDetail& d) { file.open_or_die(missing_name, d); }, 1002,
+      "open: Can't open file " + quoted(missing) + " for reading", missing);
+  EXPECT_FALSE(file.is_open());
+}
+
+TEST_F(zxbfile, a_file_in_a_missing_folder_is_not_made) {
+  const std::string lost = folder.file("none") + "\\file";
+  const zxStr lost_name = lost.c_str();
+  zxBFile file;
+  EXPECT_FALSE(file.try_create(lost_name));
+  EXPECT_FALSE(file.try_create_private(lost_name));
+  EXPECT_FALSE(file.try_create_new(lost_name));
+  const std::string message =
+      "create: Can't open file " + quoted(lost) + " for writing";
+  expect_failure_with_details(
+      [&](const BailDetail& d) { file.create(lost_name, d); }, 1004, message,
+      lost);
+  expect_failure_with_details(
+      [&](const BailDetail& d) { file.create_new(lost_name, d); }, 1004,
+      message, lost);
+  EXPECT_FALSE(file.is_open());
+}
+
+TEST_F(zxbfile, a_folder_is_no_file) {
+  const zxStr folder_name = folder.path().c_str();
+  zxBFile file;
+  EXPECT_FALSE(file.open(folder_name));
+  EXPECT_FALSE(file.open_rw(folder_name));
+  EXPECT_FALSE(file.try_create(folder_name));
+  EXPECT_FALSE(file.try_create_private(folder_name));
+  EXPECT_FALSE(file.try_create_new(folder_name));
+  EXPECT_FALSE(file.is_open());
+}
+
+TEST_F(zxbfile, a_file_that_may_not_be_written_opens_for_reading_alone) {
+  fs::permissions(
+      path,
+      fs::perms::owner_write | fs::perms::group_write | fs::perms::others_write,
+      fs::perm_options::remove);
+  zxBFile file;
+  EXPECT_FALSE(file.open_rw(name));
+  EXPECT_FALSE(file.try_create(name));
+  EXPECT_TRUE(file.open(name));
+  EXPECT_EQ(read(file, 20), k_bytes);
+}
+
+TEST_F(zxbfile, a_new_file_must_have_a_free_name) {
+  zxBFile file;
+  EXPECT_FALSE(file.try_create_private(name));
+  EXPECT_FALSE(file.try_create_new(name));
+  expect_failure_with_details(
+      [&](const BailDetail& d) { file.create_new(name, d); }, 1004,
+      "create: Can't open file " + quoted(path) + " for writing", path);
+  EXPECT_EQ(bytes(), k_bytes);
+  file.create_new(missing_name);
+  write(file, "new");
+  EXPECT_TRUE(file.close());
+  EXPECT_EQ(read_file(missing), "new");
+}
+
+TEST_F(zxbfile, a_new_file_never_goes_through_a_link) {
+  const std::string link = folder.file("link");
+  const std::string dangling = folder.file("dangling");
+  if (!kit::make_link(path, link) || !kit::make_link(missing, dangling))
+    GTEST_SKIP() << "a program cannot make links here";
+  zxBFile file;
+  for (const std::string& at : {link, dangling}) {
+    EXPECT_FALSE(file.try_create_private(at.c_str()));
+    EXPECT_FALSE(file.try_create_new(at.c_str()));
+    expect_failure([&] { file.create_new(at.c_str()); }, 1004,
+                   "create: Can't open file " + quoted(at) + " for writing",
+                   at);
+  }
+  EXPECT_EQ(bytes(), k_bytes);
+  EXPECT_FALSE(fs::exists(missing));
+}
+
+TEST_F(zxbfile, a_private_file_is_its_owners_alone) {
+  if (kit::on_windows()) GTEST_SKIP() << "permissions are not shown here";
+  zxBFile file;
+  ASSERT_TRUE(file.try_create_private(missing_name));
+  EXPECT_EQ(fs::status(missing).permissions(),
+            fs::perms::owner_read | fs::perms::owner_write);
+}
+
+TEST_F(zxbfile, an_open_object_is_not_opened_again_in_any_way) {
+  for (const Opening& opening : k_openings) {
+    SCOPED_TRACE(opening.label);
+    zxBFile file;
+    ASSERT_TRUE(file.open(name));
+    EXPECT_EQ(read(file, 3), "012");
+    const zxStream* stream = file.handle;
+    expect_failure([&] { opening.open(file, missing_name); },
+                   opening.already_open,
+                   filled(opening.already_open_text, missing), missing);
+    kit::with_failures_dropped([&] { opening.open(file, missing_name); });
+    EXPECT_EQ(file.handle, stream);
+    EXPECT_TRUE(file.name == name);
+    EXPECT_EQ(read(file, 20), "3456789");
+    EXPECT_FALSE(fs::exists(missing));
+  }
+}
+
+TEST_F(zxbfile, an_open_object_refuses_even_names_that_no_file_can_have) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  expect_failure([&] { file.open(""); }, 1009, "open: File '' already open",
+                 "");
+  expect_failure([&] { file.open_rw("-"); }, 1005,
+                 "open_rw: File already open '-'", "-");
+}
+
+TEST_F(zxbfile, a_dropped_failure_to_open_leaves_a_closed_object) {
+  zxBFile file;
+  kit::with_failures_dropped([&] {
+    file.open_or_die(missing_name);
+    EXPECT_FALSE(file.is_open());
+    file.create(folder.path().c_str());
+    EXPECT_FALSE(file.is_open());
+    file.create_new(name);
+    EXPECT_FALSE(file.is_open());
+  });
+  EXPECT_EQ(bytes(), k_bytes);
+  EXPECT_TRUE(file.open(name));
+}
+
+// ---- names
+
+// A name in the folder that is `length` bytes long.
+std::string name_of_length(const TempDir& folder, std::size_t length) {
+  std::string long_name = folder.file("");
+  EXPECT_LT(long_name.size(), length);
+  long_name.resize(length, 'n');
+  return long_name;
+}
+
+TEST_F(zxbfile, a_name_of_254_bytes_is_the_longest) {
+  const std::string longest = name_of_length(folder, 254);
+  zxBFile file;
+  file.create(longest.c_str());
+  write(file, "long");
+  EXPECT_TRUE(text_of(file.name) == longest);
+  file.close(no_detail);
+  EXPECT_EQ(read_file(longest), "long");
+  EXPECT_TRUE(file.open(longest.c_str()));
+}
+
+TEST_F(zxbfile, a_name_of_255_bytes_is_refused_without_a_call) {
+  const std::string too_long = name_of_length(folder, 255);
+  const zxStr too_long_name = too_long.c_str();
+  const Faults calls;
+  zxplat::set_last_error(1234);
+  zxBFile file;
+  EXPECT_FALSE(file.open(too_long_name));
+  EXPECT_FALSE(file.open_rw(too_long_name));
+  EXPECT_FALSE(file.try_create(too_long_name));
+  EXPECT_FALSE(file.try_create_private(too_long_name));
+  EXPECT_FALSE(file.try_create_new(too_long_name));
+  EXPECT_EQ(zxplat::last_error(), 1234);
+  expect_failure([&] { file.open_or_die(too_long_name); }, 1002,
+                 "open: Can't open file " + quoted(too_long) + " for reading",
+                 too_long);
+  expect_failure([&] { file.create(too_long_name); }, 1004,
+                 "create: Can't open file " + quoted(too_long) + " for writing",
+                 too_long);
+  EXPECT_EQ(calls.count(Call::open), 0);
+  EXPECT_FALSE(file.is_open());
+}
+
+TEST_F(zxbfile, an_empty_name_is_refused_without_a_call) {
+  const Faults calls;
+  zxBFile file;
+  EXPECT_FALSE(file.open(""));
+  EXPECT_FALSE(file.open_rw(""));
+  EXPECT_FALSE(file.try_create(""));
+  EXPECT_FALSE(file.try_create_private(""));
+  EXPECT_FALSE(file.try_create_new(""));
+  expect_failure([&] { file.open_or_die(""); }, 1002,
+                 "open: Can't open file '' for reading", "");
+  expect_failure([&] { file.create(""); }, 1004,
+                 "create: Can't open file '' for writing", "");
+  expect_failure([&] { file.create_new(""); }, 1004,
+                 "create: Can't open file '' for writing", "");
+  EXPECT_EQ(calls.count(Call::open), 0);
+}
+
+TEST_F(zxbfile, a_name_with_a_nul_is_not_the_name_up_to_the_nul) {
+  zxStr with_nul = name;
+  with_nul.append('\0').append("x");
+  zxStr new_with_nul = missing_name;
+  new_with_nul.append('\0');
+  zxBFile file;
+  EXPECT_FALSE(file.open(with_nul));
+  EXPECT_FALSE(file.open_rw(with_nul));
+  EXPECT_FALSE(file.try_create(with_nul));
+  EXPECT_FALSE(file.try_create(new_with_nul));
+  EXPECT_FALSE(file.try_create_private(new_with_nul));
+  EXPECT_FALSE(file.try_create_new(new_with_nul));
+  EXPECT_EQ(bytes(), k_bytes);
+  EXPECT_FALSE(fs::exists(missing));
+}
+
+TEST_F(zxbfile, a_dash_is_the_standard_input_or_output) {
+  zxStream* const in = &zx_standard_stream(zxplat::k_stdin_fd);
+  zxStream* const out = &zx_standard_stream(zxplat::k_stdout_fd);
+  const Faults calls;
+  zxBFile file;
+  EXPECT_TRUE(file.open("-"));
+  EXPECT_EQ(file.handle, in);
+  EXPECT_TRUE(file.name == "-");
+  EXPECT_TRUE(file.close());
+  EXPECT_EQ(file.handle, nullptr);
+  EXPECT_TRUE(file.name.is_empty());
+  file.open_or_die("-");
+  EXPECT_EQ(file.handle, in);
+  file.close(no_detail);
+  EXPECT_TRUE(file.try_create("-"));
+  EXPECT_EQ(file.handle, out);
+  EXPECT_TRUE(file.close());
+  file.create("-");
+  EXPECT_EQ(file.handle, out);
+  file.close(no_detail);
+  EXPECT_EQ(calls.count(Call::open), 0);
+  EXPECT_EQ(calls.count(Call::close), 0);
+}
+
+TEST_F(zxbfile, a_dash_for_reading_and_writing_fails_an_assertion) {
+  zxBFile file;
+  expect_failure([&] { file.open_rw("-"); }, 1000, "bailed out: zxfile:185 ",
+                 "zxfile:185");
+  kit::with_failures_dropped([&] { EXPECT_FALSE(file.open_rw("-")); });
+  EXPECT_FALSE(file.is_open());
+}
+
+TEST_F(zxbfile, more_than_a_dash_is_a_file) {
+  const zxStr dash = (folder.path() + "\\-").c_str();
+  zxBFile file;
+  file.create(dash);
+  write(file, "x");
+  file.close(no_detail);
+  EXPECT_EQ(read_file(folder.file("-")), "x");
+}
+
+// A program whose standard output is closed by one object goes on to write
+// by another.
+ZX_CASE(zxbfile_writes_to_a_dash_twice) {
+  init_zxlib_args(argc, argv);
+  for (const char* text : {"one\r\n", "two\n"}) {
+    zxBFile file;
+    file.create("-");
+    file.puts(text);
+    file.close(no_detail);
+  }
+  zxBFile in;
+  in.open_or_die("-");
+  char room[100];
+  std::int32_t got = 0;
+  while (in.read(room, sizeof room, &got)) g_stdout.write(room, got);
+  return 0;
+}
+
+TEST_F(zxbfile, a_dash_passes_bytes_in_and_out_as_they_are) {
+  kit::ProcessOptions options;
+  options.input = std::string("a\r\nb\nc\r\x1A\0d", 10);
+  const kit::ProcessResult result =
+      kit::run_case("zxbfile_writes_to_a_dash_twice", {}, options);
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out, "one\r\ntwo\n" + options.input);
+  EXPECT_EQ(result.err, "");
+}
+
+// ---- reading
+
+TEST_F(zxbfile, a_read_has_three_outcomes) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  char room[20] = {};
+  std::int32_t got = -1;
+  EXPECT_TRUE(file.read(room, 4, &got));  // all
+  EXPECT_EQ(got, 4);
+  EXPECT_EQ(std::string(room, 4), "0123");
+  EXPECT_TRUE(file.read(room, 20, &got));  // some
+  EXPECT_EQ(got, 6);
+  EXPECT_EQ(std::string(room, 6), "456789");
+  EXPECT_FALSE(file.read(room, 20, &got));  // the end
+  EXPECT_EQ(got, 0);
+}
+
+TEST_F(zxbfile, without_a_count_some_is_not_enough) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  char room[20] = {};
+  EXPECT_TRUE(file.read(room, 4));
+  EXPECT_FALSE(file.read(room, 7));
+  EXPECT_EQ(file.tell(), 10);
+  EXPECT_FALSE(file.read(room, 1));
+}
+
+TEST_F(zxbfile, reading_nothing_succeeds_anywhere) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  std::int32_t got = -1;
+  EXPECT_TRUE(file.read(nullptr, 0, &got));
+  EXPECT_EQ(got, 0);
+  file.seek_end();
+  EXPECT_TRUE(file.read(nullptr, 0));
+  EXPECT_TRUE(file.read_all(nullptr, 0));
+}
+
+TEST_F(zxbfile, a_failed_read_is_fatal) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  char room[4];
+  std::int32_t got = -1;
+  Faults faults;
+  faults.fail_all(Call::read);
+  const std::string message = "read: " + quoted(path) + " operation failed";
+  expect_failure_with_details(
+      [&](const BailDetail& d) { file.read(room, 4, nullptr, d); }, 1014,
+      message, path);
+  expect_failure_with_details(
+      [&](const BailDetail& d) { file.read(room, 4, &got, d); }, 1014, message,
+      path);
+  EXPECT_EQ(got, 0);
+  kit::with_failures_dropped([&] { EXPECT_FALSE(file.read(room, 4, &got)); });
+  EXPECT_TRUE(file.is_open());
+}
+
+TEST_F(zxbfile, with_a_count_a_read_that_fails_later_gives_what_came) {
+  write_file(path, std::string(10'000, 'x'));
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  std::string room(10'000, '?');
+  std::int32_t got = -1;
+  Faults faults;
+  faults.fail_nth(Call::read, 2);
+  EXPECT_TRUE(file.read(room.data(), 10'000, &got));
+  EXPECT_GT(got, 0);
+  EXPECT_LT(got, 10'000);
+  // The error stays: at the end of the file it is told.
+  EXPECT_TRUE(file.read(room.data(), 10'000, &got));
+  EXPECT_EQ(file.tell(), 10'000);
+  expect_failure([&] { file.read(room.data(), 1, &got); }, 1014,
+                 "read: " + quoted(path) + " operation failed", path);
+}
+
+TEST_F(zxbfile, reading_an_output_file_is_fatal) {
+  zxBFile file;
+  file.create(missing_name);
+  char room[4];
+  expect_failure([&] { file.read(room, 4); }, 1014,
+                 "read: " + quoted(missing) + " operation failed", missing);
+}
+
+TEST_F(zxbfile, read_all_takes_nothing_less) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  char room[20];
+  EXPECT_TRUE(file.read_all(room, 10));
+  EXPECT_EQ(std::string(room, 10), k_bytes);
+  const std::string message = "read: " + quoted(path) + " operation failed";
+  for (const std::int32_t place : {10, 9, 1}) {
+    file.seek(place);
+    expect_failure_with_details(
+        [&](const BailDetail& d) { file.read_all(room, 10, d); }, 1014, message,
+        path);
+  }
+}
+
+TEST_F(zxbfile, negative_sizes_fail_an_assertion) {
+  zxBFile file;
+  ASSERT_TRUE(file.open_rw(name));
+  char room[4] = {'a', 'b', 'c', 'd'};
+  std::int32_t got = 99;
+  for (const std::int32_t size : {-1, INT32_MIN}) {
+    EXPECT_ASSERTION(file.read(room, size, &got), "zxbfile");
+    EXPECT_ASSERTION(file.read_all(room, size), "zxbfile");
+    EXPECT_ASSERTION(file.write(room, size), "zxbfile");
+    kit::with_failures_dropped([&] {
+      EXPECT_FALSE(file.read(room, size, &got));
+      EXPECT_EQ(got, 0);
+      EXPECT_FALSE(file.read_all(room, size));
+      file.write(room, size);
+    });
+  }
+  EXPECT_EQ(std::string(room, 4), "abcd");
+  EXPECT_EQ(file.tell(), 0);
+  EXPECT_TRUE(file.close());
+  EXPECT_EQ(bytes(), k_bytes);
+}
+
+// ---- writing
+
+TEST_F(zxbfile, a_write_that_the_system_refuses_is_fatal) {
+  const std::string large(100'000, 'x');
+  zxBFile file;
+  file.create(missing_name);
+  Faults faults;
+  faults.fail_all(Call::write, zxplat::k_err_disk_full);
+  expect_failure_with_details(
+      [&](const BailDetail& d) { file.write(large.data(), 100'000, d); }, 1016,
+      "write: failed on " + quoted(missing), missing);
+  const zxStr large_text(std::string_view{large});
+  expect_failure([&] { file.puts(large_text); }, 1016,
+                 "write: failed on " + quoted(missing), missing);
+  EXPECT_TRUE(file.is_open());
+  EXPECT_FALSE(file.close());
+}
+
+TEST_F(zxbfile, writing_nothing_succeeds) {
+  zxBFile file;
+  file.create(missing_name);
+  file.write(nullptr, 0);
+  EXPECT_TRUE(file.close());
+  EXPECT_EQ(read_file(missing), "");
+}
+
+TEST_F(zxbfile, puts_writes_bytes_as_they_are_and_counts_lines) {
+  zxBFile file;
+  file.create(missing_name);
+  file.puts(zxStr("a\0b", 3));
+  file.puts("");
+  file.puts("c\nd\r\n");
+  EXPECT_EQ(file.lines, 3);
+  write(file, "e\n");
+  EXPECT_EQ(file.lines, 3);
+  file.close(no_detail);
+  EXPECT_EQ(read_file(missing), std::string("a\0bc\nd\r\ne\n", 10));
+}
+
+TEST_F(zxbfile, a_sync_brings_the_bytes_down) {
+  zxBFile file;
+  file.create(missing_name);
+  write(file, "abc");
+  const Faults calls;
+  file.sync();
+  EXPECT_EQ(calls.count(Call::flush), 1);
+  EXPECT_EQ(read_file(missing), "abc");
+}
+
+TEST_F(zxbfile, a_failed_sync_is_fatal) {
+  const std::string message = "flush: " + quoted(missing) + " operation failed";
+  for (const Call call : {Call::write, Call::flush}) {
+    SCOPED_TRACE(kit::name_of(call));
+    zxBFile file;
+    file.create(missing_name);
+    for (const BailDetail& detail : {no_detail, k_detail}) {
+      Faults faults;
+      faults.fail_nth(call, 1);
+      write(file, "abc");
+      expect_failure([&] { file.sync(detail); }, 1020, message, missing,
+                     detail);
+    }
+    EXPECT_FALSE(file.close());
+  }
+}
+
+// ---- positions
+
+TEST_F(zxbfile, positions_count_from_the_start) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  EXPECT_TRUE(file.seek(4));
+  EXPECT_EQ(file.tell(), 4);
+  EXPECT_EQ(read(file, 2), "45");
+  EXPECT_EQ(file.tell(), 6);
+  EXPECT_TRUE(file.seek_end());
+  EXPECT_EQ(file.tell(), 10);
+  EXPECT_TRUE(file.seek(100));
+  EXPECT_EQ(file.tell(), 100);
+  EXPECT_EQ(read(file, 2), "");
+  file.seek(0);
+  EXPECT_EQ(read(file, 20), k_bytes);
+}
+
+TEST_F(zxbfile, a_seek_to_the_start_alone_takes_the_lines_back) {
+  zxBFile file;
+  ASSERT_TRUE(file.open_rw(name));
+  file.puts("ab");
+  file.puts("cd");
+  file.seek(1);
+  file.seek_end();
+  EXPECT_EQ(file.lines, 2);
+  file.seek(0);
+  EXPECT_EQ(file.lines, 0);
+}
+
+TEST_F(zxbfile, a_negative_position_fails_an_assertion) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  file.seek(3);
+  EXPECT_ASSERTION(file.seek(-1), "zxbfile");
+  EXPECT_ASSERTION(file.seek(INT32_MIN), "zxbfile");
+  kit::with_failures_dropped([&] { EXPECT_FALSE(file.seek(-1)); });
+  EXPECT_EQ(file.tell(), 3);
+}
+
+TEST_F(zxbfile, a_failed_seek_is_fatal_and_shows_the_name_in_the_line) {
+  zxBFile file;
+  ASSERT_TRUE(file.open_rw(name));
+  file.puts("x");
+  ASSERT_TRUE(file.handle->flush());
+  Faults faults;
+  faults.fail_all(Call::seek);
+  expect_failure_with_details([&](const BailDetail& d) { file.seek(0, d); },
+                              1012, "seek: operation failed", path);
+  EXPECT_EQ(file.lines, 1);
+  expect_failure_with_details([&](const BailDetail& d) { file.seek_end(d); },
+                              1012, "seek: operation failed", path);
+}
+
+TEST_F(zxbfile, a_position_that_the_system_does_not_tell_is_fatal) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  Faults faults;
+  faults.fail_all(Call::seek);
+  kit::with_failures_dropped([&] {
+    EXPECT_FALSE(file.seek(5000));
+    EXPECT_FALSE(file.seek_end());
+  });
+  expect_failure_with_details([&](const BailDetail& d) { file.tell(d); }, 1013,
+                              "getpos: operation failed", path);
+  kit::with_failures_dropped([&] { EXPECT_EQ(file.tell(), -1); });
+}
+
+// A file whose end is where the test says.
+class EndAt {
+ public:
+  explicit EndAt(std::int64_t place) {
+    end = place;
+    zxplat::files.seek = [](zxplat::Fd, std::int64_t, zxplat::Whence) {
+      return end;
+    };
+  }
+  EndAt(const EndAt&) = delete;
+  EndAt& operator=(const EndAt&) = delete;
+  ~EndAt() { zxplat::files.seek = zxplat::system_files.seek; }
+
+ private:
+  static inline std::int64_t end;
+};
+
+TEST_F(zxbfile, a_position_beyond_31_bits_is_fatal) {
+  zxBFile file;
+  ASSERT_TRUE(file.open(name));
+  {
+    const EndAt last(0x7FFF'FFFF);
+    file.seek_end();
+    EXPECT_EQ(file.tell(), 0x7FFF'FFFF);
+  }
+  for (const std::int64_t end : {0x8000'0000LL, 0x1'0000'0000LL}) {
+    const EndAt beyond(end);
+    file.seek_end();
+    expect_failure_with_details([&](const BailDetail& d) { file.tell(d); },
+                                1013, "getpos: operation failed", path);
+    kit::with_failures_dropped([&] { EXPECT_EQ(file.tell(), -1); });
+  }
+}
+
+// ---- closing
+
+TEST_F(zxbfile, closing_writes_down_what_is_left) {
+  zxBFile file;
+  file.create(missing_name);
+  write(file, "abc");
+  EXPECT_EQ(read_file(missing), "");
+  EXPECT_TRUE(file.close());
+  EXPECT_EQ(read_file(missing), "abc");
+}
+
+TEST_F(zxbfile, a_failed_close_leaves_a_closed_object_without_a_name) {
+  for (const Call call : {Call::write, Call::close}) {
+    SCOPED_TRACE(kit::name_of(call));
+    zxBFile file;
+    file.create(missing_name);
+    write(file, "abc");
+    Faults faults;
+    faults.fail_all(call);
+    EXPECT_FALSE(file.close());
+    EXPECT_FALSE(file.is_open());
+    EXPECT_TRUE(file.name.is_empty());
+    EXPECT_EQ(faults.count(Call::close), 1);
+    EXPECT_TRUE(file.close());
+  }
+}
+
+// Everything lies in the statement: what the failure leaves behind would
+// count as lost otherwise.
+void create_and_fail_to_close(const std::string& path,
+                              const std::function<void(zxBFile&)>& close) {
+  alignas(zxBFile) std::byte room[sizeof(zxBFile)];
+  zxBFile* file = ::new (room) zxBFile;
+  file->create(path.c_str());
+  file->puts("abc");
+  Faults faults;
+  faults.fail_all(Call::close);
+  close(*file);
+}
+
+TEST_F(zxbfile, a_failed_close_with_a_detail_is_fatal_with_the_old_name) {
+  const std::string message = "close: " + quoted(missing) + " failed";
+  expect_failure_with_details(
+      [&](const BailDetail& d) {
+        create_and_fail_to_close(missing, [&](zxBFile& f) { f.close(d); });
+      },
+      1010, message, missing);
+  zxplat::files = zxplat::system_files;  // the faults were jumped over
+  EXPECT_EQ(read_file(missing), "abc");
+}
+
+TEST_F(zxbfile, a_destructor_that_cannot_close_is_fatal) {
+  expect_failure(
+      [&] {
+        create_and_fail_to_close(missing,
+                                 [](zxBFile& f) { std::destroy_at(&f); });
+      },
+      1010, "close: " + quoted(missing) + " failed", missing);
+  zxplat::files = zxplat::system_files;
+}
+
+TEST_F(zxbfile, a_destructor_closes) {
+  const Faults calls;
+  {
+    zxBFile file;
+    file.create(missing_name);
+    write(file, "abc");
+  }
+  EXPECT_EQ(calls.count(Call::close), 1);
+  EXPECT_EQ(read_file(missing), "abc");
+}
+
+TEST_F(zxbfile, a_dropped_failure_to_close_leaves_a_closed_object) {
+  kit::with_failures_dropped([&] {
+    zxBFile file;
+    file.create(missing_name);
+    write(file, "abc");
+    Faults faults;
+    faults.fail_all(Call::close);
+    file.close(no_detail);
+    EXPECT_FALSE(file.is_open());
+    EXPECT_TRUE(file.name.is_empty());
+    file.create(missing_name);
+    write(file, "def");
+  });  // the destructor fails as well
+  EXPECT_EQ(read_file(missing), "def");
+}
+
+TEST_F(zxbfile, an_object_can_be_used_again_and_again) {
+  zxBFile file;
+  for (int i = 0; i < 3; ++i) {
+    file.create(name);
+    file.puts("abc");
+    file.close(no_detail);
+    ASSERT_TRUE(file.open(name));
+    EXPECT_EQ(file.lines, 0);
+    EXPECT_EQ(read(file, 10), "abc");
+    EXPECT_TRUE(file.close());
+  }
+}
+
+TEST_F(zxbfile, a_full_device_is_told_at_the_close) {
+  const std::string device = kit::full_device();
+  if (device.empty()) GTEST_SKIP() << "the system has no full device";
+  zxBFile file;
+  file.create(device.c_str());
+  file.puts("abc");
+  EXPECT_FALSE(file.close());
+}
+
+}  // namespace

@@ -1,0 +1,1062 @@
+// zxsys2_test.cpp - operations on whole files by name: parts of names, the
+// two folders of the process, unique names, deleting, copying and moving in
+// each of their outcomes.
+// Tests zxlib/zxsys2.h and zxsys2.cpp.
+#include "zxsys2.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cstdint>
+#include <cstdlib>
+#include <filesystem>
+#include <functional>
+#include <string>
+#include <string_view>
+#include <system_error>
+#include <vector>
+
+#include "kit/cases.h"
+#include "kit/failure.h"
+#include "kit/faults.h"
+#include "kit/target.h"
+#include "kit/tempdir.h"
+#include "zxmainf.h"
+#include "zxplat.h"
+#include "zxsfmt.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using kit::Call;
+using kit::Faults;
+using kit::read_file;
+using kit::TempDir;
+using kit::write_file;
+using Names = std::vector<std::string>;
+
+std::string text_of(const zxStr& text) { return std::string(text.view()); }
+
+std::string quoted(const std::string& text) { return "'" + text + "'"; }
+
+// The diagnostic line of a failure, whose text it cuts.
+std::string line_of(int number, const std::string& text) {
+  const std::string n = std::to_string(number);
+  return "[" + n + "-" + n + "-0/E-0/E/" + text.substr(0, 12) + "/]";
+}
+
+// Names are handed to the statement as plain text: strings that it shares
+// with the test would count as lost when it is jumped out of.
+void expect_failure(const std::function<void()>& statement, int number,
+                    const std::string& message, const std::string& text) {
+  EXPECT_FAILURE(statement(), std::to_string(number) + ": " + message,
+                 line_of(number, text));
+}
+
+void expect_assertion_at(const std::function<void()>& statement,
+                         const std::string& position) {
+  expect_failure(statement, 1000, "bailed out: " + position + " ", position);
+}
+
+// The names in a folder, sorted.
+Names names_in(const std::string& folder) {
+  Names names;
+  for (const auto& entry : fs::directory_iterator(folder))
+    names.push_back(entry.path().filename().string());
+  std::sort(names.begin(), names.end());
+  return names;
+}
+
+// Time stands still at `now` milliseconds.
+class Ticks {
+ public:
+  explicit Ticks(std::uint32_t ticks) {
+    now = ticks;
+    zxplat::process.ticks = [] { return now; };
+  }
+  Ticks(const Ticks&) = delete;
+  Ticks& operator=(const Ticks&) = delete;
+  ~Ticks() { zxplat::process.ticks = zxplat::system_process.ticks; }
+
+ private:
+  static inline std::uint32_t now;
+};
+
+// Variables of the environment that name the temporary folder; they, and
+// the library's memory of them, are as before at the end.
+class TempVariables {
+ public:
+  explicit TempVariables(const std::string& value) {
+    for (const char* name : k_names) {
+      const char* old = std::getenv(name);
+      before.push_back(old != nullptr ? old : "");
+      kit::set_variable(name, value.c_str());
+    }
+  }
+  TempVariables(const TempVariables&) = delete;
+  TempVariables& operator=(const TempVariables&) = delete;
+  ~TempVariables() {
+    for (std::size_t i = 0; i < before.size(); ++i) {
+      kit::set_variable(k_names[i],
+                        before[i].empty() ? nullptr : before[i].c_str());
+    }
+    clear_temp_path();
+  }
+
+ private:
+  static constexpr const char* k_names[] = {"TMPDIR", "TMP", "TEMP"};
+  Names before;
+};
+
+// Another working folder until the end of the block.
+class WorkingIn {
+ public:
+  explicit WorkingIn(const std::string& folder) : before(fs::current_path()) {
+    fs::current_path(folder);
+  }
+  WorkingIn(const WorkingIn&) = delete;
+  WorkingIn& operator=(const WorkingIn&) = delete;
+  ~WorkingIn() { fs::current_path(before); }
+
+ private:
+  fs::path before;
+};
+
+void make_read_only(const std::string& path) {
+  fs::permissions(
+      path,
+      fs::perms::owner_write | fs::perms::group_write | fs::perms::others_write,
+      fs::perm_options::remove);
+}
+
+bool is_read_only(const std::string& path) {
+  return (fs::status(path).permissions() & fs::perms::owner_write) ==
+         fs::perms::none;
+}
+
+// ---- parts of names
+
+TEST(zxsys2, with_slash_puts_one_backslash_at_the_end) {
+  const struct {
+    const char* name;
+    const char* result;
+  } rows[] = {
+      {"", ""},        {"a", "a\\"},         {"a\\", "a\\"},
+      {"a/", "a\\"},   {"a\\b", "a\\b\\"},   {"a/b/", "a/b\\"},
+      {"\\", "\\"},    {"/", "\\"},          {"a\\\\", "a\\\\"},
+      {"a//", "a/\\"}, {"a\\/", "a\\\\"},    {".", ".\\"},
+      {"C:", "C:"},    {"z:", "z:"},         {"C:\\", "C:\\"},
+      {"C:/", "C:\\"}, {"C:x", "C:x\\"},     {"1:", "1:\\"},
+      {":", ":\\"},    {"::", "::\\"},       {"CC:", "CC:\\"},
+      {" ", " \\"},    {"\xE0:", "\xE0:\\"},
+  };
+  for (const auto& row : rows) {
+    const zxStr name = row.name;
+    EXPECT_EQ(text_of(with_slash(name)), row.result) << row.name;
+    EXPECT_EQ(text_of(name), row.name) << row.name;
+  }
+}
+
+TEST(zxsys2, a_name_falls_into_folder_and_file) {
+  const struct {
+    const char* name;
+    const char* folder;
+    const char* file;
+  } rows[] = {
+      {"", "", ""},
+      {"a", "", "a"},
+      {"a.b", "", "a.b"},
+      {"d\\a", "d\\", "a"},
+      {"d/a", "d/", "a"},
+      {"d\\e/f\\a.b", "d\\e/f\\", "a.b"},
+      {"d/e\\a", "d/e\\", "a"},
+      {"\\a", "\\", "a"},
+      {"/a", "/", "a"},
+      {"d\\", "d\\", ""},
+      {"d/", "d/", ""},
+      {"\\", "\\", ""},
+      {"C:", "C:", ""},
+      {"C:a", "C:", "a"},
+      {"c:\\a", "c:\\", "a"},
+      {"C:d\\a", "C:d\\", "a"},
+      {"a:b:c", "a:", "b:c"},
+      {"ab:c", "", "ab:c"},
+      {":a", "", ":a"},
+      {"1:a", "", "1:a"},  // a drive is a letter
+      {"d\\C:a", "d\\", "C:a"},
+  };
+  for (const auto& row : rows) {
+    EXPECT_EQ(text_of(dir_part(row.name)), row.folder) << row.name;
+    EXPECT_EQ(text_of(file_part(row.name)), row.file) << row.name;
+  }
+}
+
+TEST(zxsys2, a_nul_in_a_name_is_a_byte_like_any_other) {
+  const zxStr name("d\\a\0b", 5);
+  EXPECT_EQ(text_of(file_part(name)), std::string("a\0b", 3));
+  EXPECT_EQ(text_of(dir_part(zxStr("d\0\\a", 4))), std::string("d\0\\", 3));
+  EXPECT_EQ(text_of(with_slash(zxStr("d\0", 2))), std::string("d\0\\", 3));
+}
+
+// ---- the two folders of the process
+
+std::string in_library_form(std::string path) {
+  std::replace(path.begin(), path.end(), '/', '\\');
+  return path;
+}
+
+TEST(zxsys2, the_working_directory_ends_in_a_backslash) {
+  const TempDir folder;
+  const WorkingIn there(folder.path());
+  EXPECT_EQ(text_of(working_directory()),
+            in_library_form(fs::current_path().string()) + "\\");
+}
+
+TEST(zxsys2, the_working_directory_at_the_root_is_one_backslash_long) {
+  const WorkingIn there(fs::current_path().root_path().string());
+  EXPECT_EQ(text_of(working_directory()),
+            in_library_form(fs::current_path().root_path().string()));
+}
+
+TEST(zxsys2, a_working_directory_may_have_a_long_name) {
+  if (kit::on_windows()) GTEST_SKIP() << "names of folders are short here";
+  const TempDir folder;
+  fs::path deep = folder.path();
+  for (int i = 0; i < 6; ++i) deep /= std::string(200, 'd');
+  fs::create_directories(deep);
+  const WorkingIn there(deep.string());
+  EXPECT_EQ(text_of(working_directory()),
+            in_library_form(deep.string()) + "\\");
+}
+
+TEST(zxsys2, a_working_directory_that_is_gone_fails_an_assertion) {
+  if (kit::on_windows()) GTEST_SKIP() << "it cannot be deleted here";
+  const TempDir folder;
+  const std::string gone = folder.file("gone");
+  fs::create_directory(gone);
+  const WorkingIn there(gone);
+  fs::remove(gone);
+  expect_assertion_at([] { working_directory(); }, "zxsys2:398");
+  kit::with_failures_dropped(
+      [] { EXPECT_EQ(text_of(working_directory()), ""); });
+}
+
+TEST(zxsys2, the_temporary_directory_is_the_systems_with_a_backslash) {
+  const TempDir folder;
+  for (const char* ending : {"", "/", "\\"}) {
+    const TempVariables variables(folder.path() + ending);
+    clear_temp_path();
+    EXPECT_EQ(in_library_form(text_of(temp_path())),
+              in_library_form(folder.path()) + "\\");
+    EXPECT_EQ(text_of(temp_path()).back(), '\\');
+  }
+}
+
+TEST(zxsys2, the_temporary_directory_is_asked_for_once) {
+  const TempDir first;
+  const TempDir second;
+  const TempVariables outer(first.path());
+  clear_temp_path();
+  const std::string asked = text_of(temp_path());
+  const TempVariables inner(second.path());
+  EXPECT_EQ(text_of(temp_path()), asked);
+  clear_temp_path();
+  EXPECT_EQ(in_library_form(text_of(temp_path())),
+            in_library_form(second.path()) + "\\");
+}
+
+TEST(zxsys2, a_temporary_directory_may_have_a_long_name) {
+  if (kit::on_windows()) GTEST_SKIP() << "names of folders are short here";
+  const std::string value = "/" + std::string(3000, 't');
+  const TempVariables variables(value);
+  clear_temp_path();
+  EXPECT_EQ(text_of(temp_path()), "\\" + std::string(3000, 't') + "\\");
+}
+
+// ---- unique names
+
+// The number in a name "...tmpN.tmp" that `uniqfile` makes.
+std::uint32_t number_in(const zxStr& name) {
+  const std::string text = text_of(file_part(name));
+  EXPECT_EQ(text.substr(0, 3), "tmp");
+  return static_cast<std::uint32_t>(std::stoul(text.substr(3)));
+}
+
+// The number of names that were tried so far, modulo 99991.
+std::uint32_t names_tried(const TempDir& folder) {
+  const Ticks zero(0);
+  return number_in(uniqfile(folder.path().c_str(), nullptr));
+}
+
+std::string unique_name(const TempDir& folder, std::uint32_t number,
+                        const std::string& ending) {
+  return folder.path() + "\\tmp" + std::to_string(number) + ending;
+}
+
+ZX_CASE(zxsys2_first_names) {
+  init_zxlib_args(argc, argv);
+  for (const std::uint32_t ticks : {0U, 1U, 1000U}) {
+    const Ticks fake(ticks);
+    oprint("# ", uniqfile("", nullptr));
+  }
+  const Ticks last(0xFFFFFFFFU);
+  oprint("#", uniqfile("", nullptr));
+  return 0;
+}
+
+TEST(zxsys2, the_first_names_of_a_process_worked_out_by_hand) {
+  const TempDir folder;
+  kit::ProcessOptions options;
+  options.directory = folder.path();
+  // 0 + 1; 9876553 + 2 = 98 * 99991 + 77437; 1000 * 9876553, which is
+  // 1286618408 behind two turns of 2^32, + 3 = 12867 * 99991 + 34214;
+  // 2^32 - 9876553 + 4 = 4285090747 = 42854 * 99991 + 76433.
+  EXPECT_EQ(kit::run_case("zxsys2_first_names", {}, options).out,
+            "tmp1.tmp tmp77437.tmp tmp34214.tmp tmp76433.tmp");
+}
+
+TEST(zxsys2, the_number_comes_from_the_clock_and_a_counter_in_32_bits) {
+  const TempDir folder;
+  std::uint64_t tried = names_tried(folder);
+  for (const std::uint32_t ticks : {0U, 1U, 434U, 435U, 123'456'789U,
+                                    0x7FFFFFFFU, 0x80000000U, 0xFFFFFFFFU}) {
+    const Ticks fake(ticks);
+    ++tried;
+    const std::uint64_t sum = std::uint64_t{ticks} * 9'876'553 + tried;
+    const std::uint64_t number = (sum & 0xFFFFFFFF) % 99'991;
+    EXPECT_EQ(number_in(uniqfile(folder.path().c_str(), nullptr)), number)
+        << ticks;
+  }
+}
+
+TEST(zxsys2, a_unique_name_is_that_of_no_file_and_none_is_made) {
+  const TempDir folder;
+  const zxStr a = uniqfile(folder.path().c_str(), nullptr);
+  const zxStr b = uniqfile(folder.path().c_str(), nullptr);
+  EXPECT_FALSE(a == b);
+  EXPECT_TRUE(names_in(folder.path()).empty());
+}
+
+TEST(zxsys2, the_extension_decides_the_ending) {
+  const TempDir folder;
+  const struct {
+    const char* extension;
+    const char* ending;
+  } rows[] = {{nullptr, ".tmp"}, {"", ""},      {"csv", ".csv"},
+              {"a.b", ".a.b"},   {".x", "..x"}, {"x.", ".x"}};
+  std::uint32_t tried = names_tried(folder);
+  const Ticks zero(0);
+  for (const auto& row : rows) {
+    ++tried;
+    EXPECT_EQ(text_of(uniqfile(folder.path().c_str(), row.extension)),
+              unique_name(folder, tried, row.ending));
+  }
+}
+
+TEST(zxsys2, the_folder_of_a_unique_name_gets_its_separator) {
+  const TempDir folder;
+  std::uint32_t tried = names_tried(folder);
+  const Ticks zero(0);
+  for (const char* separator : {"", "\\", "/"}) {
+    const zxStr name = uniqfile((folder.path() + separator).c_str(), nullptr);
+    EXPECT_EQ(text_of(name), unique_name(folder, ++tried, ".tmp"));
+  }
+  const WorkingIn there(folder.path());
+  EXPECT_EQ(text_of(uniqfile("", nullptr)),
+            "tmp" + std::to_string(++tried) + ".tmp");
+}
+
+TEST(zxsys2, taken_names_are_passed_over) {
+  const TempDir folder;
+  const std::uint32_t tried = names_tried(folder);
+  for (std::uint32_t i = 1; i <= 29; ++i)
+    write_file(folder.file("tmp" + std::to_string(tried + i) + ".tmp"), "");
+  const Ticks zero(0);
+  EXPECT_EQ(text_of(uniqfile(folder.path().c_str(), nullptr)),
+            unique_name(folder, tried + 30, ".tmp"));
+}
+
+TEST(zxsys2, a_folder_takes_a_name_as_well) {
+  const TempDir folder;
+  const std::uint32_t tried = names_tried(folder);
+  fs::create_directory(folder.file("tmp" + std::to_string(tried + 1)));
+  const Ticks zero(0);
+  EXPECT_EQ(text_of(uniqfile(folder.path().c_str(), "")),
+            unique_name(folder, tried + 2, ""));
+}
+
+TEST(zxsys2, thirty_taken_names_are_fatal) {
+  const TempDir folder;
+  std::uint32_t tried = names_tried(folder);
+  for (std::uint32_t i = 1; i <= 90; ++i)
+    write_file(folder.file("tmp" + std::to_string(tried + i) + ".tmp"), "");
+  const Ticks zero(0);
+  tried += 30;
+  const std::string last = unique_name(folder, tried, ".tmp");
+  expect_failure([&] { uniqfile(folder.path().c_str(), nullptr); }, 1037,
+                 "uniqfile: failed to find on " + quoted(last), last);
+  tried += 30;
+  kit::with_failures_dropped([&] {
+    EXPECT_EQ(text_of(uniqfile(folder.path().c_str(), nullptr)),
+              unique_name(folder, tried, ".tmp"));
+  });
+}
+
+TEST(zxsys2, in_a_missing_folder_no_name_can_be_judged) {
+  const TempDir folder;
+  const std::uint32_t tried = names_tried(folder);
+  const Ticks zero(0);
+  const std::string missing = folder.path() + "\\none";
+  const std::string last =
+      missing + "\\tmp" + std::to_string(tried + 30) + ".csv";
+  expect_failure([&] { uniqfile(missing.c_str(), "csv"); }, 1037,
+                 "uniqfile: failed to find on " + quoted(last), last);
+}
+
+TEST(zxsys2, a_unique_temporary_name_is_in_the_temporary_directory) {
+  const TempDir folder;
+  const std::uint32_t tried = names_tried(folder);
+  const TempVariables variables(folder.path());
+  clear_temp_path();
+  const Ticks zero(0);
+  EXPECT_EQ(in_library_form(text_of(unique_temp_name("csv"))),
+            in_library_form(unique_name(folder, tried + 1, ".csv")));
+}
+
+// ---- temporary files
+
+// A folder that is the temporary directory, where time stands still.
+class TempFolder {
+ public:
+  TempFolder() { clear_temp_path(); }
+
+  // The name of the n-th temporary file from now on.
+  std::string name(std::uint32_t n) const {
+    return text_of(temp_path()) + "tmp" + std::to_string(tried + n) + ".csv";
+  }
+  std::string path() const { return folder.path(); }
+
+  // The same name without the folder.
+  std::string file(std::uint32_t n) const {
+    return "tmp" + std::to_string(tried + n) + ".csv";
+  }
+
+ private:
+  const TempDir folder;
+  const std::uint32_t tried = names_tried(folder);
+  const TempVariables variables{folder.path()};
+  const Ticks zero{0};
+};
+
+TEST(zxsys2, a_temporary_file_is_made_and_open) {
+  const TempFolder temp;
+  zxBFile file;
+  EXPECT_EQ(text_of(create_temp_file(file, "csv")), temp.name(1));
+  ASSERT_TRUE(file.is_open());
+  EXPECT_EQ(text_of(file.name), temp.name(1));
+  file.puts("text");
+  file.close(no_detail);
+  EXPECT_EQ(names_in(temp.path()), (Names{temp.file(1)}));
+}
+
+TEST(zxsys2, a_temporary_file_takes_no_name_that_is_taken_meanwhile) {
+  const TempFolder temp;
+  zxBFile file;
+  Faults faults;
+  faults.fail_nth(Call::open, 1, zxplat::k_err_exists_on_create);
+  EXPECT_EQ(text_of(create_temp_file(file, "csv")), temp.name(2));
+  EXPECT_TRUE(file.is_open());
+  EXPECT_EQ(names_in(temp.path()), (Names{temp.file(2)}));
+}
+
+TEST(zxsys2, a_temporary_file_never_goes_through_a_link) {
+  const TempFolder temp;
+  const TempDir elsewhere;
+  if (!kit::make_link(elsewhere.file("victim"),
+                      temp.path() + "/" + temp.file(1)))
+    GTEST_SKIP() << "a program cannot make links here";
+  zxBFile file;
+  EXPECT_EQ(text_of(create_temp_file(file, "csv")), temp.name(2));
+  EXPECT_TRUE(names_in(elsewhere.path()).empty());
+}
+
+TEST(zxsys2, a_temporary_file_that_cannot_be_made_is_fatal) {
+  const TempFolder temp;
+  zxBFile file;
+  Faults faults;
+  faults.fail_all(Call::open, zxplat::k_err_disk_full);
+  expect_failure(
+      [&] { create_temp_file(file, "csv"); }, 1004,
+      "create: Can't open file " + quoted(temp.name(1)) + " for writing",
+      temp.name(1));
+  kit::with_failures_dropped(
+      [&] { EXPECT_EQ(text_of(create_temp_file(file, "csv")), temp.name(2)); });
+  EXPECT_FALSE(file.is_open());
+  EXPECT_EQ(faults.count(Call::open), 2);
+}
+
+TEST(zxsys2, thirty_names_that_others_take_meanwhile_are_fatal) {
+  const TempFolder temp;
+  zxBFile file;
+  Faults faults;
+  faults.fail_all(Call::open, zxplat::k_err_exists_on_create);
+  expect_failure(
+      [&] { create_temp_file(file, "csv"); }, 1004,
+      "create: Can't open file " + quoted(temp.name(30)) + " for writing",
+      temp.name(30));
+  EXPECT_EQ(faults.count(Call::open), 30);
+}
+
+// ---- deleting
+
+// A folder with two files; names with the backslash, as programs join them.
+class Files {
+ public:
+  Files() {
+    write_file(from, k_from_bytes);
+    write_file(to, k_to_bytes);
+  }
+
+  static constexpr char k_from_bytes[] = "the new text";
+  static constexpr char k_to_bytes[] = "the old text, which is longer";
+
+  TempDir folder;
+  const std::string from = folder.path() + k_separator + "from";
+  const std::string to = folder.path() + k_separator + "to";
+  const std::string missing = folder.path() + k_separator + "none";
+  const std::string in_missing_folder = missing + k_separator + "file";
+
+ private:
+  // One that the standard library takes on both targets.
+  static constexpr char k_separator = '/';
+};
+
+TEST(zxsys2, deleting_in_three_ways_deletes) {
+  const struct {
+    const char* label;
+    std::function<void(const char*)> run;
+  } rows[] = {
+      {"try", [](const char* n) { EXPECT_TRUE(try_delete(n)); }},
+      {"delefile", [](const char* n) { delefile(n); }},
+      {"delfile", [](const char* n) { delfile(n); }},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.label);
+    const Files files;
+    row.run(files.from.c_str());
+    EXPECT_EQ(names_in(files.folder.path()), (Names{"to"}));
+  }
+}
+
+TEST(zxsys2, a_missing_file_is_deleted_already_but_for_delfile) {
+  const Files files;
+  EXPECT_TRUE(try_delete(files.missing.c_str()));
+  delefile(files.missing.c_str());
+  expect_failure([&] { delfile(files.missing.c_str()); }, 1026,
+                 "delfile: cant del " + quoted(files.missing), files.missing);
+}
+
+TEST(zxsys2, what_cannot_be_deleted_is_told) {
+  const Files files;
+  make_read_only(files.from);
+  for (const std::string& name :
+       {files.from, files.folder.path(), files.in_missing_folder}) {
+    SCOPED_TRACE(name);
+    EXPECT_FALSE(try_delete(name.c_str()));
+    expect_failure([&] { delefile(name.c_str()); }, 1027,
+                   "delefile: cant del " + quoted(name), name);
+    expect_failure([&] { delfile(name.c_str()); }, 1026,
+                   "delfile: cant del " + quoted(name), name);
+    kit::with_failures_dropped([&] {
+      delefile(name.c_str());
+      delfile(name.c_str());
+    });
+  }
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+// ---- copying
+
+void set_time(const std::string& path, int hours_ago) {
+  fs::last_write_time(
+      path, fs::file_time_type::clock::now() - std::chrono::hours(hours_ago));
+}
+
+TEST(zxsys2, a_copy_has_the_bytes_the_time_and_the_permissions) {
+  const Files files;
+  set_time(files.from, 1000);
+  fs::permissions(files.from, fs::perms::owner_read | fs::perms::owner_write |
+                                  fs::perms::others_read);
+  cpfile(files.from.c_str(), files.missing.c_str());
+  EXPECT_EQ(read_file(files.missing), Files::k_from_bytes);
+  EXPECT_EQ(fs::last_write_time(files.missing),
+            fs::last_write_time(files.from));
+  EXPECT_EQ(fs::status(files.missing).permissions(),
+            fs::status(files.from).permissions());
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "none", "to"}));
+}
+
+TEST(zxsys2, a_copy_of_what_may_not_be_written_may_not_be_either) {
+  const Files files;
+  make_read_only(files.from);
+  cpfile(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(read_file(files.to), Files::k_from_bytes);
+  EXPECT_TRUE(is_read_only(files.to));
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_copy_passes_over_a_name_that_is_taken_meanwhile) {
+  const Files files;
+  Faults faults;
+  faults.fail_nth(Call::open, 2, zxplat::k_err_exists_on_create);
+  cpfile(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(faults.count(Call::open), 3);
+  EXPECT_EQ(read_file(files.to), Files::k_from_bytes);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, copies_of_every_size_are_complete) {
+  const Files files;
+  for (const std::size_t size :
+       {0, 1, 49'151, 49'152, 49'153, 65'536, 98'304, 98'305, 1'000'000}) {
+    std::string bytes(size, '\0');
+    for (std::size_t i = 0; i < size; ++i)
+      bytes[i] = static_cast<char>((i + i / 255) & 0xFF);
+    write_file(files.from, bytes);
+    cpfile(files.from.c_str(), files.to.c_str());
+    EXPECT_TRUE(read_file(files.to) == bytes) << size;
+  }
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_file_may_be_copied_onto_itself) {
+  const Files files;
+  cpfile(files.from.c_str(), files.from.c_str());
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_copy_without_a_folder_goes_into_the_working_directory) {
+  const Files files;
+  const WorkingIn there(files.folder.path());
+  cpfile("from", "copy");
+  EXPECT_EQ(read_file("copy"), Files::k_from_bytes);
+  EXPECT_EQ(names_in("."), (Names{"copy", "from", "to"}));
+}
+
+TEST(zxsys2, a_missing_source_of_a_copy_is_fatal) {
+  const Files files;
+  const std::string message =
+      "open: Can't open file " + quoted(files.missing) + " for reading";
+  expect_failure([&] { cpfile(files.missing.c_str(), files.to.c_str()); }, 1002,
+                 message, files.missing);
+  kit::with_failures_dropped(
+      [&] { cpfile(files.missing.c_str(), files.to.c_str()); });
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_copy_into_a_missing_folder_finds_no_name) {
+  const Files files;
+  const std::uint32_t tried = names_tried(files.folder);
+  const Ticks zero(0);
+  const std::string last =
+      files.missing + "\\tmp" + std::to_string(tried + 30) + ".cpy";
+  expect_failure(
+      [&] { cpfile(files.from.c_str(), files.in_missing_folder.c_str()); },
+      1037, "uniqfile: failed to find on " + quoted(last), last);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_copy_onto_what_cannot_be_deleted_is_fatal) {
+  const Files files;
+  make_read_only(files.to);
+  for (const std::string& target : {files.to, files.folder.path()}) {
+    expect_failure([&] { cpfile(files.from.c_str(), target.c_str()); }, 1027,
+                   "delefile: cant del " + quoted(target), target);
+  }
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  // The copy is gone again.
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+// A step of a copy that fails: the call of the system, and what is told.
+// The name in the message is that of the source or of the temporary copy.
+struct CopyFault {
+  Call call;
+  int n;
+  int number;
+  const char* message;  // "%" stands for the name
+  bool names_source;
+};
+
+constexpr CopyFault k_copy_faults[] = {
+    {Call::open, 1, 1002, "open: Can't open file '%' for reading", true},
+    {Call::open, 2, 1004, "create: Can't open file '%' for writing", false},
+    {Call::read, 1, 1014, "read: '%' operation failed", true},
+    {Call::write, 1, 1016, "write: failed on '%'", false},
+    {Call::flush, 1, 1020, "flush: '%' operation failed", false},
+    {Call::close, 1, 1010, "close: '%' failed", true},
+    {Call::close, 2, 1010, "close: '%' failed", false},
+};
+
+std::string filled(std::string text, const std::string& argument) {
+  return text.replace(text.find('%'), 1, argument);
+}
+
+// Runs `copy` with each of the faults; each time `old` must keep its bytes.
+// The source is large enough to be written in its middle.
+void expect_copy_faults(const Files& files, const std::string& target,
+                        const std::function<void()>& copy) {
+  const std::string bytes(200'000, 'x');
+  write_file(files.from, bytes);
+  for (const CopyFault& fault : k_copy_faults) {
+    SCOPED_TRACE(testing::Message()
+                 << kit::name_of(fault.call) << ' ' << fault.n);
+    write_file(target, Files::k_to_bytes);
+    const std::uint32_t tried = names_tried(files.folder);
+    const Ticks zero(0);
+    const std::string copy_name =
+        text_of(with_slash(dir_part(target.c_str()))) + "tmp" +
+        std::to_string(tried + 1) + ".cpy";
+    const std::string& name = fault.names_source ? files.from : copy_name;
+    Faults faults;
+    faults.fail_nth(fault.call, fault.n, zxplat::k_err_disk_full);
+    expect_failure(copy, fault.number, filled(fault.message, name), name);
+    EXPECT_EQ(read_file(target), Files::k_to_bytes);
+    EXPECT_TRUE(read_file(files.from) == bytes);
+  }
+}
+
+TEST(zxsys2, a_copy_that_fails_half_way_leaves_the_old_target) {
+  const Files files;
+  expect_copy_faults(files, files.to,
+                     [&] { cpfile(files.from.c_str(), files.to.c_str()); });
+}
+
+TEST(zxsys2, behind_dropped_failures_an_incomplete_copy_replaces_nothing) {
+  const Files files;
+  const std::string bytes(200'000, 'x');
+  write_file(files.from, bytes);
+  for (const CopyFault& fault : k_copy_faults) {
+    if (fault.call == Call::close) continue;  // the bytes are there by then
+    SCOPED_TRACE(kit::name_of(fault.call));
+    Faults faults;
+    faults.fail_nth(fault.call, fault.n);
+    kit::with_failures_dropped(
+        [&] { cpfile(files.from.c_str(), files.to.c_str()); });
+    EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+    EXPECT_TRUE(read_file(files.from) == bytes);
+  }
+}
+
+TEST(zxsys2, a_copy_that_cannot_get_its_name_is_deleted) {
+  const Files files;
+  Faults faults;
+  faults.fail_nth(Call::rename, 1, zxplat::k_err_denied);
+  expect_failure([&] { cpfile(files.from.c_str(), files.to.c_str()); }, 1038,
+                 "cpfile: failed to rename tmp to " + quoted(files.to),
+                 files.to);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from"}));
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+TEST(zxsys2, the_reason_of_a_failed_rename_of_a_copy_outlives_its_deletion) {
+  const Files files;
+  Faults faults;
+  faults.fail_nth(Call::rename, 1, 4321);
+  faults.fail_nth(Call::remove, 2, 99);  // the target, the copy
+  kit::with_failures_dropped(
+      [&] { cpfile(files.from.c_str(), files.to.c_str()); });
+  EXPECT_EQ(zxplat::last_error(), 4321);
+}
+
+// ---- moving
+
+TEST(zxsys2, a_moved_file_has_its_new_name_alone) {
+  const Files files;
+  set_time(files.from, 1000);
+  const auto time = fs::last_write_time(files.from);
+  move_file(files.from.c_str(), files.missing.c_str());
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"none", "to"}));
+  EXPECT_EQ(read_file(files.missing), Files::k_from_bytes);
+  EXPECT_EQ(fs::last_write_time(files.missing), time);
+}
+
+TEST(zxsys2, a_moved_file_replaces_what_had_its_name) {
+  const Files files;
+  const Faults calls;
+  move_file(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"to"}));
+  EXPECT_EQ(read_file(files.to), Files::k_from_bytes);
+  EXPECT_EQ(calls.count(Call::rename), 1);
+  EXPECT_EQ(calls.count(Call::open), 0);
+}
+
+TEST(zxsys2, a_file_that_may_not_be_written_can_be_moved) {
+  const Files files;
+  make_read_only(files.from);
+  move_file(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"to"}));
+  EXPECT_TRUE(is_read_only(files.to));
+}
+
+TEST(zxsys2, a_file_is_moved_into_the_working_directory) {
+  const Files files;
+  const TempDir other;
+  const WorkingIn there(other.path());
+  move_file(files.from.c_str(), "here");
+  EXPECT_EQ(read_file("here"), Files::k_from_bytes);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"to"}));
+}
+
+void expect_same_file(const Files& files, const std::string& other) {
+  SCOPED_TRACE(other);
+  expect_assertion_at([&] { move_file(files.from.c_str(), other.c_str()); },
+                      "zxsys2:287");
+  kit::with_failures_dropped(
+      [&] { move_file(files.from.c_str(), other.c_str()); });
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+TEST(zxsys2, a_file_moved_onto_itself_fails_an_assertion_and_stays) {
+  const Files files;
+  expect_same_file(files, files.from);
+  // The same file by other spellings.
+  const std::string& folder = files.folder.path();
+  expect_same_file(files, folder + "\\from");
+  expect_same_file(files, folder + "\\.\\from");
+  expect_same_file(files, folder + "/./from");
+  expect_same_file(files, folder + "\\FROM");
+  expect_same_file(files, folder + "\\..\\" +
+                              fs::path(folder).filename().string() + "\\from");
+  const WorkingIn there(folder);
+  expect_same_file(files, "from");
+  expect_same_file(files, ".\\From");
+  EXPECT_EQ(names_in(folder), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_file_under_two_names_is_not_moved_onto_itself_either) {
+  const Files files;
+  const std::string twin = files.folder.file("twin");
+  std::error_code error;
+  fs::create_hard_link(files.from, twin, error);
+  if (error) GTEST_SKIP() << "there are no hard links: " << error.message();
+  expect_same_file(files, twin);
+  EXPECT_EQ(read_file(twin), Files::k_from_bytes);
+}
+
+TEST(zxsys2, names_that_are_the_same_text_fail_even_without_a_file) {
+  const Files files;
+  expect_assertion_at(
+      [&] { move_file(files.missing.c_str(), files.missing.c_str()); },
+      "zxsys2:287");
+}
+
+TEST(zxsys2, a_file_moved_onto_a_folder_fails_an_assertion) {
+  const Files files;
+  const std::string inner = files.folder.path() + "/inner";
+  fs::create_directory(inner);
+  for (const std::string& target :
+       {inner, inner + "\\", files.folder.path() + "\\INNER"}) {
+    expect_assertion_at([&] { move_file(files.from.c_str(), target.c_str()); },
+                        "zxsys2:288");
+    kit::with_failures_dropped(
+        [&] { move_file(files.from.c_str(), target.c_str()); });
+  }
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "inner", "to"}));
+  EXPECT_TRUE(names_in(inner).empty());
+}
+
+TEST(zxsys2, a_missing_source_of_a_move_is_fatal_and_the_target_stays) {
+  const Files files;
+  for (const std::string& from : {files.missing, files.in_missing_folder}) {
+    expect_failure([&] { move_file(from.c_str(), files.to.c_str()); }, 1002,
+                   "open: Can't open file " + quoted(from) + " for reading",
+                   from);
+    kit::with_failures_dropped(
+        [&] { move_file(from.c_str(), files.to.c_str()); });
+    EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+  }
+}
+
+TEST(zxsys2, a_move_into_a_missing_folder_is_fatal) {
+  const Files files;
+  const std::string& to = files.in_missing_folder;
+  expect_failure([&] { move_file(files.from.c_str(), to.c_str()); }, 1027,
+                 "delefile: cant del " + quoted(to), to);
+  kit::with_failures_dropped(
+      [&] { move_file(files.from.c_str(), to.c_str()); });
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_move_onto_what_cannot_be_deleted_is_fatal) {
+  const Files files;
+  make_read_only(files.to);
+  expect_failure([&] { move_file(files.from.c_str(), files.to.c_str()); }, 1027,
+                 "delefile: cant del " + quoted(files.to), files.to);
+  kit::with_failures_dropped(
+      [&] { move_file(files.from.c_str(), files.to.c_str()); });
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+}
+
+TEST(zxsys2, a_failed_rename_is_fatal_and_the_source_stays) {
+  for (const int error : {zxplat::k_err_denied, zxplat::k_err_sharing,
+                          zxplat::k_err_path_not_found}) {
+    const Files files;
+    const std::string both = files.from + " to " + files.to;
+    Faults faults;
+    faults.fail_all(Call::rename, error);
+    expect_failure([&] { move_file(files.from.c_str(), files.to.c_str()); },
+                   1036, "mvfile: rename fail on " + quoted(both), both);
+    kit::with_failures_dropped(
+        [&] { move_file(files.from.c_str(), files.to.c_str()); });
+    EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+    EXPECT_EQ(faults.count(Call::open), 0);
+  }
+}
+
+// Both answers of the system that ask for a copy.
+constexpr int k_errors_of_devices[] = {zxplat::k_err_not_found,
+                                       zxplat::k_err_other_device};
+
+TEST(zxsys2, a_rename_that_cannot_cross_becomes_a_copy) {
+  for (const int error : k_errors_of_devices) {
+    SCOPED_TRACE(error);
+    const Files files;
+    set_time(files.from, 1000);
+    const auto time = fs::last_write_time(files.from);
+    Faults faults;
+    faults.fail_nth(Call::rename, 1, error);
+    move_file(files.from.c_str(), files.to.c_str());
+    EXPECT_EQ(faults.count(Call::rename), 2);
+    EXPECT_EQ(names_in(files.folder.path()), (Names{"to"}));
+    EXPECT_EQ(read_file(files.to), Files::k_from_bytes);
+    EXPECT_EQ(fs::last_write_time(files.to), time);
+  }
+}
+
+TEST(zxsys2, a_copy_in_place_of_a_rename_that_gets_no_name_keeps_the_source) {
+  for (const int error : k_errors_of_devices) {
+    SCOPED_TRACE(error);
+    const Files files;
+    Faults faults;
+    faults.fail_all(Call::rename, error);
+    expect_failure([&] { move_file(files.from.c_str(), files.to.c_str()); },
+                   1038, "cpfile: failed to rename tmp to " + quoted(files.to),
+                   files.to);
+    EXPECT_EQ(names_in(files.folder.path()), (Names{"from"}));
+    kit::with_failures_dropped(
+        [&] { move_file(files.from.c_str(), files.to.c_str()); });
+    EXPECT_EQ(names_in(files.folder.path()), (Names{"from"}));
+    EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  }
+}
+
+TEST(zxsys2, a_source_that_stays_behind_its_copy_is_fatal) {
+  const Files files;
+  Faults faults;
+  faults.fail_nth(Call::rename, 1, zxplat::k_err_other_device);
+  faults.fail_nth(Call::remove, 3);  // target, target again, source
+  expect_failure([&] { move_file(files.from.c_str(), files.to.c_str()); }, 1026,
+                 "delfile: cant del " + quoted(files.from), files.from);
+  EXPECT_EQ(faults.count(Call::remove), 3);
+  EXPECT_EQ(read_file(files.to), Files::k_from_bytes);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+// A folder on another device, for one test.
+class OtherDevice {
+ public:
+  OtherDevice() : parent(kit::other_device_folder()) {
+    if (parent.empty()) return;
+    folder = parent + k_separator + "zxkit-" +
+             std::to_string(
+                 std::chrono::steady_clock::now().time_since_epoch().count());
+    fs::create_directory(folder);
+  }
+  OtherDevice(const OtherDevice&) = delete;
+  OtherDevice& operator=(const OtherDevice&) = delete;
+  ~OtherDevice() {
+    std::error_code ignored;
+    if (!folder.empty()) fs::remove_all(folder, ignored);
+  }
+
+  bool is_there() const { return !folder.empty(); }
+  std::string file(const std::string& name) const {
+    return folder + k_separator + name;
+  }
+  const std::string& path() const { return folder; }
+
+ private:
+  static constexpr char k_separator = '/';
+  std::string parent;
+  std::string folder;
+};
+
+TEST(zxsys2, a_file_is_moved_to_another_device) {
+  const OtherDevice device;
+  if (!device.is_there()) GTEST_SKIP() << "there is one device only";
+  const Files files;
+  set_time(files.from, 1000);
+  fs::permissions(files.from, fs::perms::owner_read | fs::perms::owner_write);
+  const auto time = fs::last_write_time(files.from);
+  const auto permissions = fs::status(files.from).permissions();
+  const std::string target = device.file("target");
+  move_file(files.from.c_str(), target.c_str());
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"to"}));
+  EXPECT_EQ(names_in(device.path()), (Names{"target"}));
+  EXPECT_EQ(read_file(target), Files::k_from_bytes);
+  EXPECT_EQ(fs::status(target).permissions(), permissions);
+  EXPECT_LT(std::chrono::abs(fs::last_write_time(target) - time),
+            std::chrono::seconds(1));
+  // Over an old file there, and back.
+  move_file(files.to.c_str(), target.c_str());
+  EXPECT_EQ(read_file(target), Files::k_to_bytes);
+  move_file(target.c_str(), files.from.c_str());
+  EXPECT_EQ(read_file(files.from), Files::k_to_bytes);
+  EXPECT_TRUE(names_in(device.path()).empty());
+}
+
+TEST(zxsys2, across_devices_the_old_target_outlives_every_failed_copy) {
+  const OtherDevice device;
+  if (!device.is_there()) GTEST_SKIP() << "there is one device only";
+  const Files files;
+  const std::string target = device.file("target");
+  expect_copy_faults(files, target,
+                     [&] { move_file(files.from.c_str(), target.c_str()); });
+}
+
+TEST(zxsys2, across_devices_an_undeletable_target_is_fatal_and_stays) {
+  const OtherDevice device;
+  if (!device.is_there()) GTEST_SKIP() << "there is one device only";
+  const Files files;
+  const std::string target = device.file("target");
+  write_file(target, Files::k_to_bytes);
+  make_read_only(target);
+  expect_failure([&] { move_file(files.from.c_str(), target.c_str()); }, 1027,
+                 "delefile: cant del " + quoted(target), target);
+  EXPECT_EQ(read_file(target), Files::k_to_bytes);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  fs::permissions(target, fs::perms::owner_write, fs::perm_options::add);
+}
+
+TEST(zxsys2, across_devices_a_missing_source_leaves_the_target) {
+  const OtherDevice device;
+  if (!device.is_there()) GTEST_SKIP() << "there is one device only";
+  const Files files;
+  const std::string target = device.file("target");
+  write_file(target, Files::k_to_bytes);
+  expect_failure(
+      [&] { move_file(files.missing.c_str(), target.c_str()); }, 1002,
+      "open: Can't open file " + quoted(files.missing) + " for reading",
+      files.missing);
+  EXPECT_EQ(read_file(target), Files::k_to_bytes);
+}
+
+}  // namespace
