@@ -34,8 +34,7 @@ std::int32_t four_bit_form(std::int32_t scaled, std::int32_t low_bits) {
 // The value times the scale, rounded half away from zero.  The callers'
 // limits keep it inside 32 bits.
 std::int32_t scaled_by(double value, double scale) {
-  return static_cast<std::int32_t>(value * scale +
-                                   std::copysign(0.5, value));
+  return static_cast<std::int32_t>(value * scale + std::copysign(0.5, value));
 }
 
 // The word for a value of 5000000 and more.
@@ -66,8 +65,8 @@ constexpr FineForm k_fine_forms[] = {
 std::int32_t fraction_word(double value) {
   const double size = std::fabs(value);
   for (const FineForm& form : k_fine_forms) {
-    const bool fits = size < form.limit ||
-                      (form.limit_included && size == form.limit);
+    const bool fits =
+        size < form.limit || (form.limit_included && size == form.limit);
     if (!fits) continue;
     const std::int32_t scaled = scaled_by(value, form.scale);
     if (!is_whole(scaled)) return four_bit_form(scaled, form.low_bits);
@@ -100,8 +99,8 @@ void HvlDecimal::set_double(double value) { bits = word_for(value); }
 void HvlDecimal::set_sixty_fourths(std::int32_t whole,
                                    std::int32_t sixty_fourths) {
   constexpr std::int64_t k_limit = 80000;
-  const bool one_sign = (whole <= 0 || sixty_fourths >= 0) &&
-                        (whole >= 0 || sixty_fourths <= 0);
+  const bool one_sign =
+      (whole <= 0 || sixty_fourths >= 0) && (whole >= 0 || sixty_fourths <= 0);
   if (!ZX_ASSERT(sixty_fourths >= -63 && sixty_fourths <= 63) ||
       !ZX_ASSERT(one_sign))
     return;
@@ -154,12 +153,17 @@ struct UnitForm {
 constexpr UnitForm unit_form(std::int32_t low_bits, bool whole) {
   if (low_bits % 2 == 0) return {1, k_unit};
   switch (low_bits) {
-    case k_ten_thousandths: return {4, 10000};
-    case k_millionths: return {4, 100};
-    case k_hundred_millionths: return {4, 1};
-    case k_thousands: return {4, std::uint64_t{1000} * k_unit};
+    case k_ten_thousandths:
+      return {4, 10000};
+    case k_millionths:
+      return {4, 100};
+    case k_hundred_millionths:
+      return {4, 1};
+    case k_thousands:
+      return {4, std::uint64_t{1000} * k_unit};
     // Whole hundredths are 100 times a number of sixty-fourths.
-    default: return {2, whole ? k_unit / 6400 : k_unit / 100};
+    default:
+      return {2, whole ? k_unit / 6400 : k_unit / 100};
   }
 }
 
@@ -186,8 +190,8 @@ std::uint64_t units_of(std::int32_t word) {
 // first in the lowest: halves of four, pairs of two, then single digits, all
 // parts of a step at once.
 inline std::uint64_t eight_digits(std::uint32_t number) {
-  const std::uint64_t fours =
-      number / 10000 | std::uint64_t{number % 10000} << 32;
+  const std::uint64_t fours = number / 10000 | std::uint64_t{number % 10000}
+                                                   << 32;
   const std::uint64_t hundreds = (fours * 10486 >> 20) & 0x7F0000007F;
   const std::uint64_t pairs = ((fours - 100 * hundreds) << 16) + hundreds;
   const std::uint64_t tens = (pairs * 103 >> 10) & 0x000F000F000F000F;
@@ -213,7 +217,8 @@ char* write_eight(char* out, std::uint32_t number) {
 
 // Writes a whole number below 10^12.
 char* write_whole(char* out, std::uint64_t number) {
-  if (number < k_unit) return write_eight(out, static_cast<std::uint32_t>(number));
+  if (number < k_unit)
+    return write_eight(out, static_cast<std::uint32_t>(number));
   out = write_eight(out, static_cast<std::uint32_t>(number / k_unit));
   put_eight(out, eight_digits(static_cast<std::uint32_t>(number % k_unit)));
   return out + 8;

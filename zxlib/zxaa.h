@@ -262,8 +262,8 @@ class zxAA {
     for (std::int32_t i = next_slot(hole); i != hole && !is_empty(table[i]);
          i = next_slot(i)) {
       const std::int32_t home = home_of(table[i].key);
-      const bool passes_hole = i > hole ? home <= hole || home > i
-                                        : home <= hole && home > i;
+      const bool passes_hole =
+          i > hole ? home <= hole || home > i : home <= hole && home > i;
       if (!passes_hole) continue;
       move_entry(table[hole], table[i]);
       hole = i;
@@ -292,8 +292,7 @@ class zxSA : public zxAA<zxStr, V> {
     const std::string_view text(key);
     auto* entry = Base::walk(crc16(text.data(), text.size()),
                              [&](const zxStr& k) { return k.view() == text; });
-    return entry == nullptr || Base::is_empty(*entry) ? nullptr
-                                                      : &entry->value;
+    return entry == nullptr || Base::is_empty(*entry) ? nullptr : &entry->value;
   }
   const V* find(const char* key) const {
     return const_cast<zxSA*>(this)->find(key);

@@ -14,9 +14,12 @@ constexpr std::int32_t k_max_name = 254;
 // The message that reports opening an object that is open already.
 std::int32_t already_open_error(OpenMode mode) {
   switch (mode) {
-    case OpenMode::read: return 1009;
-    case OpenMode::read_write: return 1005;
-    default: return 1003;
+    case OpenMode::read:
+      return 1009;
+    case OpenMode::read_write:
+      return 1005;
+    default:
+      return 1003;
   }
 }
 
@@ -46,9 +49,8 @@ bool zxBFile::open_as(const zxStr& file_name, OpenMode mode) {
     return false;
   }
   if (file_name.length() > k_max_name || file_name.is_empty()) return false;
-  zxStream* stream = file_name == "-"
-                         ? standard_stream(mode)
-                         : zxStream::open(file_name.view(), mode);
+  zxStream* stream = file_name == "-" ? standard_stream(mode)
+                                      : zxStream::open(file_name.view(), mode);
   if (stream == nullptr) return false;
   handle = stream;
   name = file_name;

@@ -47,8 +47,7 @@ class zxBFile {
   // name is never followed or cut.
   bool try_create_new(const zxStr& file_name);
   // The same; a failure is fatal (1004).
-  void create_new(const zxStr& file_name,
-                  const BailDetail& detail = no_detail);
+  void create_new(const zxStr& file_name, const BailDetail& detail = no_detail);
   // The same for a file that only its owner may read.
   bool try_create_private(const zxStr& file_name);
 

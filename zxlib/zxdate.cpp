@@ -11,8 +11,8 @@ constexpr std::int32_t k_last_year = 2057;
 constexpr std::int32_t k_days_of_four_years = 1461;
 
 // Days ahead of each month of a common year.
-constexpr std::int32_t k_days_before_month[12] = {
-    0, 31, 59, 90, 120, 151, 181, 212, 243, 273, 304, 334};
+constexpr std::int32_t k_days_before_month[12] = {0,   31,  59,  90,  120, 151,
+                                                  181, 212, 243, 273, 304, 334};
 
 constexpr bool is_leap(std::int32_t year) { return year % 4 == 0; }
 
@@ -39,8 +39,7 @@ constexpr CycleDay cycle_day(std::int32_t rest) {
   const bool leap = is_leap(k_first_year + year);
   std::int32_t month = 11;
   while (rest < month_start(month, leap)) --month;
-  return {static_cast<std::uint8_t>(year),
-          static_cast<std::uint8_t>(month + 1),
+  return {static_cast<std::uint8_t>(year), static_cast<std::uint8_t>(month + 1),
           static_cast<std::uint8_t>(rest - month_start(month, leap) + 1)};
 }
 

@@ -15,8 +15,8 @@ constexpr std::size_t k_buffer_size = 65536;
 constexpr std::size_t k_first_read_ahead = 4096;
 
 constinit zxStream standard_streams[] = {zxStream(zxplat::k_stdin_fd),
-                               zxStream(zxplat::k_stdout_fd),
-                               zxStream(zxplat::k_stderr_fd)};
+                                         zxStream(zxplat::k_stdout_fd),
+                                         zxStream(zxplat::k_stderr_fd)};
 
 }  // namespace
 
@@ -108,10 +108,15 @@ std::size_t zxStream::read(void* out, std::size_t size) {
 bool zxStream::give_back_unread() {
   if (next == end) return true;
   const std::int64_t unread = static_cast<std::int64_t>(end - next);
-  position = zxplat::files.seek(fd, -unread, zxplat::Whence::current);
+  const std::int64_t at =
+      zxplat::files.seek(fd, -unread, zxplat::Whence::current);
+  if (at < 0) {
+    read_failed = true;
+    return false;
+  }
+  position = at;
   next = end = 0;
-  if (position < 0) read_failed = true;
-  return position >= 0;
+  return true;
 }
 
 // ---- writing

@@ -25,7 +25,9 @@ class zxLe {
     return *this;
   }
 
-  constexpr operator T() const { return in_file_order(std::bit_cast<T>(*this)); }
+  constexpr operator T() const {
+    return in_file_order(std::bit_cast<T>(*this));
+  }
 
  private:
   constexpr void store(T value) {

@@ -44,9 +44,7 @@ extern zxQVA<zxStr> g_args;    // the arguments behind the program's name;
                                // init_opts() takes options off its front
 
 // Positional argument n, or the empty string.
-inline const zxStr& positional_arg(std::int32_t n) {
-  return g_args.get_or(n);
-}
+inline const zxStr& positional_arg(std::int32_t n) { return g_args.get_or(n); }
 
 // Starts the library: registers its exit handler, stores the values above
 // and binds the standard streams.  A second call is fatal.  An argument list

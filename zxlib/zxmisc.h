@@ -89,14 +89,14 @@ inline constexpr bool zx_relocatable = std::is_trivially_copyable_v<T>;
 
 // ---------------------------------------------------------- byte classes --
 
-inline constexpr unsigned k_class_space = 0x01;     // blank, 9 to 13
-inline constexpr unsigned k_class_digit = 0x02;     // 0 to 9
-inline constexpr unsigned k_class_upper = 0x04;     // A to Z
-inline constexpr unsigned k_class_lower = 0x08;     // a to z
-inline constexpr unsigned k_class_hebrew = 0x10;    // 224 to 250 (1255)
-inline constexpr unsigned k_class_control = 0x20;   // 0 to 31, 127
-inline constexpr unsigned k_class_punct = 0x40;     // ASCII punctuation
-inline constexpr unsigned k_class_hebdos = 0x80;    // 128 to 154 (862)
+inline constexpr unsigned k_class_space = 0x01;    // blank, 9 to 13
+inline constexpr unsigned k_class_digit = 0x02;    // 0 to 9
+inline constexpr unsigned k_class_upper = 0x04;    // A to Z
+inline constexpr unsigned k_class_lower = 0x08;    // a to z
+inline constexpr unsigned k_class_hebrew = 0x10;   // 224 to 250 (1255)
+inline constexpr unsigned k_class_control = 0x20;  // 0 to 31, 127
+inline constexpr unsigned k_class_punct = 0x40;    // ASCII punctuation
+inline constexpr unsigned k_class_hebdos = 0x80;   // 128 to 154 (862)
 inline constexpr unsigned k_class_latin = k_class_upper | k_class_lower;
 
 namespace zxmisc_detail {

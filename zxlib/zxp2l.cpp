@@ -2,6 +2,7 @@
 // Tests: tests/zxlib/zxp2l_test.cpp.
 #include "zxp2l.h"
 
+#include <climits>
 #include <cstring>
 #include <string_view>
 
@@ -61,13 +62,20 @@ bool is_separator(char byte) { return is<Letters::ansi>(byte, k_separator); }
 
 constexpr char mirrored_bracket(char byte) {
   switch (byte) {
-    case '(': return ')';
-    case ')': return '(';
-    case '[': return ']';
-    case ']': return '[';
-    case '{': return '}';
-    case '}': return '{';
-    default: return byte;
+    case '(':
+      return ')';
+    case ')':
+      return '(';
+    case '[':
+      return ']';
+    case ']':
+      return '[';
+    case '{':
+      return '}';
+    case '}':
+      return '{';
+    default:
+      return byte;
   }
 }
 
@@ -90,8 +98,7 @@ struct Run {
 };
 
 template <Letters letters>
-std::size_t find_kind(std::string_view text, std::size_t from,
-                      unsigned kinds) {
+std::size_t find_kind(std::string_view text, std::size_t from, unsigned kinds) {
   while (from < text.size() && !is<letters>(text[from], kinds)) ++from;
   return from;
 }
@@ -113,8 +120,8 @@ Run split_run(std::string_view text, bool base) {
   if (strong == text.size()) return {text.size(), base};
   const bool rtl = is<letters>(text[strong], k_rtl_strong);
   if (rtl != base && strong > 0) return {strong, base};
-  std::size_t end = find_kind<letters>(text, strong,
-                                       rtl ? k_ltr_strong : k_rtl_strong);
+  std::size_t end =
+      find_kind<letters>(text, strong, rtl ? k_ltr_strong : k_rtl_strong);
   if (rtl != base)
     end = up_to_kind<letters>(text.substr(0, end), k_strong | k_digit);
   return {end, rtl};
@@ -127,8 +134,7 @@ Run split_physical_run(std::string_view text, bool base) {
   Run run = split_run<letters>(text, base);
   if (run.rtl != base)
     run.length = up_to_kind<letters>(
-        text.substr(0, run.length),
-        run.rtl ? k_hebrew_letter : k_latin_letter);
+        text.substr(0, run.length), run.rtl ? k_hebrew_letter : k_latin_letter);
   return run;
 }
 
@@ -146,9 +152,8 @@ bool ends_number(std::string_view run, std::size_t i) {
 std::size_t number_start(std::string_view run, std::size_t i) {
   while (i > 0) {
     const char before = run[i - 1];
-    const bool joins =
-        is_digit(before) ||
-        (is_separator(before) && i > 1 && is_digit(run[i - 2]));
+    const bool joins = is_digit(before) ||
+                       (is_separator(before) && i > 1 && is_digit(run[i - 2]));
     if (!joins) break;
     --i;
   }
@@ -183,8 +188,8 @@ char* reverse_run(char* out, std::string_view run, bool mark) {
 // The first digit or Hebrew letter of a text, or NUL.  A digit there would
 // be read as a part of a Latin run that stands ahead of it.
 char leading_anchor(std::string_view text) {
-  const std::size_t i = find_kind<Letters::ansi>(
-      text, 0, k_digit | k_hebrew_letter);
+  const std::size_t i =
+      find_kind<Letters::ansi>(text, 0, k_digit | k_hebrew_letter);
   return i < text.size() ? text[i] : '\0';
 }
 
@@ -227,9 +232,7 @@ class Line {
   // for a line that grows at its front.
   bool leads_with_digit() const { return is_digit(anchor); }
 
-  zxStr take() const {
-    return {start, static_cast<std::int32_t>(end - start)};
-  }
+  zxStr take() const { return {start, static_cast<std::int32_t>(end - start)}; }
 
  private:
   void put_in_front(std::string_view piece) {
@@ -292,6 +295,11 @@ zxStr convert_lines(const zxStr& text, Convert convert) {
   return result.append(convert(zxStr(rest)));
 }
 
+// Results may take twice a text's length, which must be a length too.
+bool has_room_for_twice(const zxStr& text) {
+  return ZX_ASSERT(text.length() <= INT32_MAX / 2);
+}
+
 // Moves the bytes of one class by a distance.
 void shift_class(zxStr& text, unsigned class_bit, int distance) {
   for (std::int32_t i = 0; i < text.length(); ++i) {
@@ -303,7 +311,7 @@ void shift_class(zxStr& text, unsigned class_bit, int distance) {
 }  // namespace
 
 zxStr logical_from_phys(const zxStr& text, bool rtl) {
-  if (text.is_empty()) return {};
+  if (text.is_empty() || !has_room_for_twice(text)) return {};
   zxStr source = text;
   dos_to_ansi(source);
   Line line(zx_size(source.length()), rtl);
@@ -312,7 +320,7 @@ zxStr logical_from_phys(const zxStr& text, bool rtl) {
 }
 
 zxStr phys_from_logical(const zxStr& text, bool rtl) {
-  if (text.is_empty()) return {};
+  if (text.is_empty() || !has_room_for_twice(text)) return {};
   Line line(zx_size(text.length()), rtl);
   std::string_view source = text.view();
   while (!source.empty()) {
@@ -333,15 +341,13 @@ zxStr phys_from_logical(const zxStr& text, bool rtl) {
 }
 
 zxStr logical_from_phys_lines(const zxStr& text, bool rtl) {
-  return convert_lines(text, [rtl](const zxStr& line) {
-    return logical_from_phys(line, rtl);
-  });
+  return convert_lines(
+      text, [rtl](const zxStr& line) { return logical_from_phys(line, rtl); });
 }
 
 zxStr phys_from_logical_lines(const zxStr& text, bool rtl) {
-  return convert_lines(text, [rtl](const zxStr& line) {
-    return phys_from_logical(line, rtl);
-  });
+  return convert_lines(
+      text, [rtl](const zxStr& line) { return phys_from_logical(line, rtl); });
 }
 
 void dos_to_ansi(zxStr& text) {
@@ -352,23 +358,16 @@ void ansi_to_dos(zxStr& text) {
   shift_class(text, k_class_hebrew, -k_dos_distance);
 }
 
-// Every code point here lies between 0x80 and 0x7FF: two bytes.
 zxStr ansi_to_utf8(const zxStr& text) {
-  constexpr int k_alef_byte = 224;
-  constexpr int k_alef = 0x5D0;
-  constexpr int k_tav = 0x5EA;
+  if (!has_room_for_twice(text)) return {};
   zxStr result;
-  char* const start = result.buffer(zx_count(2 * zx_size(text.length())));
+  char* const start = result.buffer(2 * text.length());
   char* out = start;
   for (const char byte : text.view()) {
-    const int value = static_cast<unsigned char>(byte);
-    const int code = value - k_alef_byte + k_alef;
-    if (value < 0x80) {
-      *out++ = byte;
-    } else if (code <= k_tav) {
-      *out++ = static_cast<char>(0xC0 | code >> 6);
-      *out++ = static_cast<char>(0x80 | (code & 0x3F));
-    }
+    const auto unit =
+        zxLogicalExport::unit_of(static_cast<unsigned char>(byte));
+    std::memcpy(out, unit.bytes + 2 - unit.size, unit.size);
+    out += unit.size;
   }
   result.set_length(static_cast<std::int32_t>(out - start));
   return result;
@@ -387,8 +386,7 @@ char* zxLogicalExport::put_in_front(char* start, char byte) const {
   return start - unit.size;
 }
 
-char* zxLogicalExport::put_in_front(char* start,
-                                    std::string_view piece) const {
+char* zxLogicalExport::put_in_front(char* start, std::string_view piece) const {
   for (std::size_t i = piece.size(); i-- > 0;)
     start = put_in_front(start, piece[i]);
   return start;
@@ -406,8 +404,8 @@ std::size_t number_end(std::string_view run, std::size_t i) {
   if (!is_digit(run[end])) return i;
   do {
     while (end < size && is_digit(run[end])) ++end;
-  } while (end + 1 < size && is_separator(run[end]) &&
-           is_digit(run[end + 1]) && ++end);
+  } while (end + 1 < size && is_separator(run[end]) && is_digit(run[end + 1]) &&
+           ++end);
   if (end < size && run[end] == '%') ++end;
   return end;
 }
@@ -428,14 +426,13 @@ char* zxLogicalExport::reverse_in_front(char* start,
   return start;
 }
 
-char* zxLogicalExport::line_in_front(char* start,
-                                     std::string_view line) const {
+char* zxLogicalExport::line_in_front(char* start, std::string_view line) const {
   while (!line.empty()) {
     const Run run = split_physical_run<Letters::ansi_and_dos>(line, true);
     if (!ZX_ASSERT(run.length > 0)) break;
     const std::string_view piece = line.substr(0, run.length);
-    start = run.rtl ? reverse_in_front(start, piece)
-                    : put_in_front(start, piece);
+    start =
+        run.rtl ? reverse_in_front(start, piece) : put_in_front(start, piece);
     line.remove_prefix(run.length);
   }
   return start;

@@ -78,7 +78,12 @@ class zxLogicalExport {
   };
   using Units = std::array<Unit, 256>;
 
-  static constexpr Unit unit_of(int byte);
+  friend zxStr ansi_to_utf8(const zxStr& text);
+
+  static constexpr int to_ansi(int byte) {
+    return byte >= 128 && byte <= 154 ? byte + 96 : byte;
+  }
+  static constexpr Unit unit_of(int ansi_byte);
   char* put_in_front(char* start, char byte) const;
   char* put_in_front(char* start, std::string_view piece) const;
   char* reverse_in_front(char* start, std::string_view run) const;
@@ -87,13 +92,13 @@ class zxLogicalExport {
   Units units{};
 };
 
+// Code points from 128 bytes below alef up to tav all take two bytes.
 constexpr zxLogicalExport::Unit zxLogicalExport::unit_of(int byte) {
   constexpr int k_alef_byte = 224;
   constexpr int k_alef = 0x5D0;
   constexpr int k_tav = 0x5EA;
   if (byte < 128) return {{'\0', static_cast<char>(byte)}, 1};
-  const int from_dos = byte >= 128 && byte <= 154 ? 96 : 0;
-  const int code = byte + from_dos - k_alef_byte + k_alef;
+  const int code = byte - k_alef_byte + k_alef;
   if (code > k_tav) return {{}, 0};
   return {{static_cast<char>(0xC0 | code >> 6),
            static_cast<char>(0x80 | (code & 0x3F))},
@@ -102,7 +107,7 @@ constexpr zxLogicalExport::Unit zxLogicalExport::unit_of(int byte) {
 
 constexpr zxLogicalExport::zxLogicalExport(std::string_view dropped) {
   for (int byte = 0; byte < 256; ++byte)
-    units[static_cast<std::size_t>(byte)] = unit_of(byte);
+    units[static_cast<std::size_t>(byte)] = unit_of(to_ansi(byte));
   for (const char byte : dropped)
     units[static_cast<unsigned char>(byte)].size = 0;
 }

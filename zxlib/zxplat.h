@@ -69,9 +69,9 @@ inline constexpr Fd k_stdout_fd = 1;
 inline constexpr Fd k_stderr_fd = 2;
 
 enum class OpenMode {
-  read,        // existing file, reading
-  create,      // writing; made, or cut to nothing
-  create_new,  // writing; refused (80) if the name is taken, even by a link
+  read,            // existing file, reading
+  create,          // writing; made, or cut to nothing
+  create_new,      // writing; refused (80) if the name is taken, even by a link
   create_private,  // as create_new, for the owner's eyes alone
   read_write,      // existing file, both; refused without the right to write
   append,          // writing, always at the end; made if it is missing.  The

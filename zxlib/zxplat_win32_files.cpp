@@ -105,6 +105,9 @@ std::int64_t read_bytes(Fd fd, void* buffer, std::size_t size) {
   const Attempt attempt;
   const std::size_t most = std::min(size, k_most_bytes);
   const int count = ::_read(fd, buffer, static_cast<unsigned>(most));
+  // Some runtimes remember an end of file until the next seek; the file may
+  // grow before it is read again.
+  if (count == 0) ::_lseeki64(fd, 0, SEEK_CUR);
   return attempt.settle(std::int64_t{count}, count >= 0);
 }
 

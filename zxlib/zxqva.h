@@ -210,8 +210,7 @@ class zxQVA {
     }
     const std::int64_t wanted =
         std::int64_t{i} + (i < k_large ? k_small_step : i / 16);
-    reserve(wanted > INT32_MAX ? INT32_MAX
-                               : static_cast<std::int32_t>(wanted),
+    reserve(wanted > INT32_MAX ? INT32_MAX : static_cast<std::int32_t>(wanted),
             0);
     return i < capacity;
   }

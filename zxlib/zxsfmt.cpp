@@ -2,7 +2,6 @@
 // Tests: tests/zxlib/zxsfmt_test.cpp.
 #include "zxsfmt.h"
 
-#include <charconv>
 #include <cstring>
 
 namespace {
@@ -31,14 +30,13 @@ class Composer {
 bool is_mark(char byte) { return byte == '#' || byte == '%' || byte == '$'; }
 
 // The bytes up to the next that means something.
-std::size_t plain_run(const char* text) {
-  return std::strcspn(text, "#%$\n");
-}
+std::size_t plain_run(const char* text) { return std::strcspn(text, "#%$\n"); }
 
 void append_int(zxStr& out, std::int32_t number) {
-  char digits[12];
-  const auto end = std::to_chars(digits, digits + sizeof digits, number).ptr;
-  out.append(digits, static_cast<std::int32_t>(end - digits));
+  char room[12];
+  zxText digits(room);
+  digits.add_int(number);
+  out.append(room, zx_count(digits.length()));
 }
 
 template <class T>
@@ -48,13 +46,26 @@ const T& pointee(const zxFmtArg& arg) {
 
 void append_default_form(zxStr& out, const zxFmtArg& arg) {
   switch (arg.tag) {
-    case 'i': append_int(out, static_cast<std::int32_t>(arg.value)); break;
-    case 'c': out.append(static_cast<char>(arg.value)); break;
-    case 'z': out.append(&pointee<char>(arg)); break;
-    case 's': out.append(pointee<zxStr>(arg)); break;
-    case 'f': append_number(out, pointee<double>(arg)); break;
-    case 't': out.append(pointee<zxDate>(arg).to_text()); break;
-    default: ZX_ASSERT(false);
+    case 'i':
+      append_int(out, static_cast<std::int32_t>(arg.value));
+      break;
+    case 'c':
+      out.append(static_cast<char>(arg.value));
+      break;
+    case 'z':
+      out.append(reinterpret_cast<const char*>(arg.value));
+      break;
+    case 's':
+      out.append(pointee<zxStr>(arg));
+      break;
+    case 'f':
+      append_number(out, pointee<double>(arg));
+      break;
+    case 't':
+      out.append(pointee<zxDate>(arg).to_text());
+      break;
+    default:
+      ZX_ASSERT(false);
   }
 }
 
@@ -84,9 +95,12 @@ bool Composer::directive() {
     return true;
   }
   switch (*at) {
-    case '#': return placeholder();
-    case '%': return percent();
-    default: return false;
+    case '#':
+      return placeholder();
+    case '%':
+      return percent();
+    default:
+      return false;
   }
 }
 

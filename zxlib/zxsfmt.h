@@ -7,7 +7,8 @@
 //   line feed  carriage return and line feed; line feeds inside arguments
 //              stay as they are
 //
-// Any other byte stands for itself.  Default forms: whole numbers in
+// Any other byte stands for itself; a mark with anything else behind it is
+// an unknown directive.  Default forms: whole numbers in
 // decimal, texts and strings as they are, characters as that byte, dates as
 // above, doubles with up to 15 significant digits as in "12.5", "1e+015".
 //

@@ -26,11 +26,10 @@ struct NumberText {
   }
 };
 
-NumberText formatted(double number, std::chars_format format,
-                     int precision) {
+NumberText formatted(double number, std::chars_format format, int precision) {
   NumberText text;
-  const auto result = std::to_chars(text.bytes, text.bytes + k_room, number,
-                                    format, precision);
+  const auto result =
+      std::to_chars(text.bytes, text.bytes + k_room, number, format, precision);
   text.set_end(result.ptr);
   return text;
 }
@@ -41,8 +40,8 @@ NumberText formatted(double number, std::chars_format format,
 double nudged_off_tie(double number) {
   const NumberText longer =
       formatted(number, std::chars_format::scientific, k_digits);
-  const char* exponent = static_cast<const char*>(
-      std::memchr(longer.bytes, 'e', longer.length));
+  const char* exponent =
+      static_cast<const char*>(std::memchr(longer.bytes, 'e', longer.length));
   if (exponent == nullptr || exponent[-1] != '5') return number;
 
   // The 16 digits are the number itself, and not only near it, if none
@@ -84,8 +83,8 @@ void append_number(zxStr& out, double number) {
   if (std::isinf(number)) {
     text = formatted(number, std::chars_format::general, k_digits);
   } else {
-    text = formatted(nudged_off_tie(number), std::chars_format::general,
-                     k_digits);
+    text =
+        formatted(nudged_off_tie(number), std::chars_format::general, k_digits);
     widen_exponent(text);
   }
   out.append(text.bytes, static_cast<std::int32_t>(text.length));

@@ -33,8 +33,7 @@ std::int32_t sum_of(std::int32_t a, std::int32_t b) {
 void fill(zxStrRep* rep, const char* a, std::int32_t a_length, const char* b,
           std::int32_t b_length) {
   std::memmove(rep->data, a, zx_size(a_length));
-  if (b_length > 0)
-    std::memcpy(rep->data + a_length, b, zx_size(b_length));
+  if (b_length > 0) std::memcpy(rep->data + a_length, b, zx_size(b_length));
   rep->length = a_length + b_length;
   rep->data[rep->length] = '\0';
 }
@@ -278,8 +277,7 @@ zxStr& zxStr::append(char byte) {
 }
 
 zxStr& zxStr::append(const char* characters, std::int32_t size) {
-  if (!check() || !ZX_ASSERT(characters != nullptr && size >= 0))
-    return *this;
+  if (!check() || !ZX_ASSERT(characters != nullptr && size >= 0)) return *this;
   const std::int32_t old_length = rep->length;
   const std::int32_t sum = sum_of(old_length, size);
   if (!ZX_ASSERT(sum >= 0)) return *this;
@@ -338,9 +336,12 @@ std::string_view trimmed(std::string_view text) {
 // What a last letter multiplies by; 1 for any other byte.
 std::int32_t factor_of(char suffix) {
   switch (zx_lower(suffix)) {
-    case 'k': return 1000;
-    case 'm': return 1000000;
-    default: return 1;
+    case 'k':
+      return 1000;
+    case 'm':
+      return 1000000;
+    default:
+      return 1;
   }
 }
 

@@ -89,9 +89,7 @@ class zxStr {
   // The characters with a NUL behind them; valid until the string changes or
   // dies.
   const char* c_str() const { return rep->data; }
-  std::string_view view() const& {
-    return {rep->data, zx_size(rep->length)};
-  }
+  std::string_view view() const& { return {rep->data, zx_size(rep->length)}; }
   std::string_view view() const&& = delete;
 
   // Character i; an index outside 0 to length - 1 fails an assertion.
@@ -204,7 +202,6 @@ void bail_code(std::int32_t number, const zxStr& text,
 // first, from 0xFFFF on, no final inversion.  It is the hash of string keys
 // and reaches disk: it never changes.
 std::uint16_t crc16(const void* bytes, std::size_t size);
-std::uint16_t crc16_add(std::uint16_t crc, const void* bytes,
-                        std::size_t size);
+std::uint16_t crc16_add(std::uint16_t crc, const void* bytes, std::size_t size);
 
 #endif  // ZXSTR_H

@@ -2,8 +2,6 @@
 // Tests: tests/zxlib/zxsys2_test.cpp.
 #include "zxsys2.h"
 
-#include <charconv>
-
 #include "zxbfile.h"
 #include "zxplat.h"
 
@@ -56,10 +54,11 @@ zxStr candidate_name(const zxStr& directory, const char* extension) {
   ++state.names_made;
   const std::uint32_t number =
       (zxplat::process.ticks() * 9876553U + state.names_made) % 99991U;
-  char digits[12];
-  const auto end = std::to_chars(digits, digits + sizeof digits, number).ptr;
+  char room[12];
+  zxText digits(room);
+  digits.add_int(static_cast<std::int32_t>(number));
   zxStr name = with_slash(directory) + "tmp";
-  name.append(digits, static_cast<std::int32_t>(end - digits));
+  name.append(room);
   name.append('.').append(extension == nullptr ? "tmp" : extension);
   const std::int32_t last = name.length() - 1;
   if (name[last] == '.') name.set_length(last);
@@ -107,10 +106,11 @@ zxStr copy_beside(const zxStr& from, const zxStr& to) {
   if (!out.is_open()) return {};
   copy_rest(in, out);
   out.sync(no_detail);
-  const bool complete = !in.handle->error() && !out.handle->error();
+  const bool all_read = !in.handle->error();
   in.close(no_detail);
-  out.close(no_detail);
-  return complete ? name : zxStr();
+  if (out.close()) return all_read ? name : zxStr();
+  bail_code(1010, name);
+  return {};
 }
 
 bool crosses_devices(zxplat::RenameResult result) {
@@ -157,9 +157,7 @@ zxStr with_slash(const zxStr& directory) {
   return result;
 }
 
-zxStr dir_part(const zxStr& path) {
-  return {path.c_str(), dir_length(path)};
-}
+zxStr dir_part(const zxStr& path) { return {path.c_str(), dir_length(path)}; }
 
 zxStr file_part(const zxStr& path) {
   const std::int32_t start = dir_length(path);
@@ -193,8 +191,7 @@ zxStr unique_temp_name(const char* extension) {
 }
 
 zxStr create_temp_file(zxBFile& file, const char* extension) {
-  return create_unique(file, &zxBFile::try_create_new, temp_path(),
-                       extension);
+  return create_unique(file, &zxBFile::try_create_new, temp_path(), extension);
 }
 
 bool try_delete(const zxStr& name) {
@@ -213,14 +210,12 @@ void delfile(const zxStr& name) {
 void cpfile(const zxStr& from, const zxStr& to) { copy_file(from, to); }
 
 void move_file(const zxStr& from, const zxStr& to) {
-  const bool same =
-      from == to || zxplat::same_file(from.view(), to.view());
+  const bool same = from == to || zxplat::same_file(from.view(), to.view());
   if (!ZX_ASSERT_AT(!same, "zxsys2", 287)) return;
   const bool onto_folder =
       zxplat::kind_of(to.view()) == zxplat::NameKind::directory;
   if (!ZX_ASSERT_AT(!onto_folder, "zxsys2", 288)) return;
-  if (zxplat::kind_of(from.view()) == zxplat::NameKind::missing)
-    return bail_code(1002, from);
+  if (!zxplat::name_taken(from.view())) return bail_code(1002, from);
 
   // An old target must outlive a copy that may fail half way.
   if (!zxplat::on_one_device(from.view(), to.view()))

@@ -60,9 +60,9 @@ void delfile(const zxStr& name);
 void cpfile(const zxStr& from, const zxStr& to);
 
 // Renames a file, replacing `to`; across devices it is copied as by
-// cpfile(), with its messages, and deleted (1026).  One file under both names, or a directory as `to`, fails an
-// assertion.  Fatal if `from` is not there (1002), `to` cannot be deleted
-// (1027) or the rename fails (1036).
+// cpfile(), with its messages, and deleted (1026).  One file under both names,
+// or a directory as `to`, fails an assertion.  Fatal if `from` is not there
+// (1002), `to` cannot be deleted (1027) or the rename fails (1036).
 //
 // Across devices an existing `to` goes only when its successor is complete;
 // on one device it is deleted just ahead of the rename.

@@ -39,9 +39,9 @@ bool is_index(std::int32_t i) { return i >= 0 && i < table.entry_count; }
 // The NUL-terminated text at the start of some bytes, or all of them.
 std::string_view text_within(const char* bytes, std::size_t size) {
   const void* end = std::memchr(bytes, '\0', size);
-  return {bytes, end ? static_cast<std::size_t>(
-                           static_cast<const char*>(end) - bytes)
-                     : size};
+  return {bytes,
+          end ? static_cast<std::size_t>(static_cast<const char*>(end) - bytes)
+              : size};
 }
 
 // The text of the data head from `offset` on; a missing NUL lets it run on
@@ -92,8 +92,7 @@ int read_index(const zxStr& directory) {
   if (head.magic != VtxIndexHead::k_magic) return k_vtx_bad_index;
   if (!ZX_ASSERT(head.count >= 1)) return k_vtx_bad_index;
   const std::size_t size = zx_size(head.count) * sizeof(VtxIndexEntry);
-  table.entries =
-      static_cast<VtxIndexEntry*>(zx_realloc(table.entries, size));
+  table.entries = static_cast<VtxIndexEntry*>(zx_realloc(table.entries, size));
   return read_entries(index, head.count);
 }
 
@@ -213,9 +212,8 @@ int vtx_has_code(std::int32_t code) {
 
 int vtx_has_index(std::int32_t index) {
   if (!table.is_open) return k_vtx_not_open;
-  const bool has_record =
-      is_index(index) &&
-      table.entries[index].offset > VtxIndexEntry::k_no_record;
+  const bool has_record = is_index(index) && table.entries[index].offset >
+                                                 VtxIndexEntry::k_no_record;
   return has_record ? k_vtx_ok : k_vtx_no_record;
 }
 

@@ -51,9 +51,9 @@ static_assert(sizeof(VtxIndexEntry) == 24);
 // The head of the data file.  `id` and `version` read together as one
 // NUL-terminated text such as "R9QVTX101".
 struct VtxDataHead {
-  char id[6];              // "R9QVTX"
-  char version[3];         // three digits, at least 101
-  std::uint8_t end;        // the NUL of that text; 26 while closed
+  char id[6];        // "R9QVTX"
+  char version[3];   // three digits, at least 101
+  std::uint8_t end;  // the NUL of that text; 26 while closed
   std::uint8_t unused;
   zxLe<std::uint32_t> stamp;
   std::uint8_t rest[40];
@@ -124,10 +124,10 @@ void vtx_close();
 
 // ---- the table
 
-std::uint32_t vtx_stamp();    // of the data head
-std::int32_t vtx_version();   // of the data head, as a number
-zxDate vtx_date();            // of the first record
-std::int32_t vtx_count();     // entries of the index
+std::uint32_t vtx_stamp();   // of the data head
+std::int32_t vtx_version();  // of the data head, as a number
+zxDate vtx_date();           // of the first record
+std::int32_t vtx_count();    // entries of the index
 
 // ---- records: 0, 3 (no entry, or no record yet), 5 (short), 7
 
@@ -141,9 +141,9 @@ int vtx_has_index(std::int32_t index);
 
 // ---- entries
 
-zxStr vtx_name_by_code(std::int32_t code);         // empty if none
-zxStr vtx_name_by_index(std::int32_t index);       // empty out of range
-std::int32_t vtx_index_of_code(std::int32_t code); // the first, or -1
+zxStr vtx_name_by_code(std::int32_t code);           // empty if none
+zxStr vtx_name_by_index(std::int32_t index);         // empty out of range
+std::int32_t vtx_index_of_code(std::int32_t code);   // the first, or -1
 std::int32_t vtx_code_by_index(std::int32_t index);  // -1 out of range
 
 // ---- writing

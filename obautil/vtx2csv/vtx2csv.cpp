@@ -101,8 +101,7 @@ void Row::add_cell(const ColumnDef& column) {
   } else if (column.type == k_text) {
     add_text(record.text_field(i));
   } else if (column.type == k_date) {
-    if (ZX_ASSERT(i >= 0 && i < VtxRecord::k_dates))
-      add_date(record.dates[i]);
+    if (ZX_ASSERT(i >= 0 && i < VtxRecord::k_dates)) add_date(record.dates[i]);
   } else if (column.type == k_natype) {
     *at++ = type_letter(record.type);
   } else {
@@ -128,6 +127,8 @@ zxStr Row::finish() {
 }  // namespace
 
 zxStr clean_text_field(const zxStr& text) {
+  constexpr std::int32_t k_longest = 0x3FFFFFF0;
+  if (!ZX_ASSERT(text.length() <= k_longest)) return {};
   zxStr room;
   const std::size_t size = zxLogicalExport::room_for(zx_size(text.length()));
   return zxStr(k_text_cells.convert(room.buffer(zx_count(size)), text.view()));

@@ -10,6 +10,12 @@
 #include "kit/faults.h"
 #include "zxmainf.h"
 
+// As in the real entry: arguments come as they are.
+extern "C" {
+extern int _dowildcard;
+int _dowildcard = 0;
+}
+
 namespace {
 
 kit::Faults* faults;

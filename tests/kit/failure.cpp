@@ -109,9 +109,12 @@ Failure failure_of(const std::function<void()>& statement) {
 }
 
 void with_failures_dropped(const std::function<void()>& statement) {
-  bail_guard = true;
+  struct Guard {
+    Guard() { bail_guard = true; }
+    ~Guard() { bail_guard = false; }
+  };
+  const Guard guard;
   statement();
-  bail_guard = false;
 }
 
 testing::AssertionResult is_assertion_of(const Failure& failure,

@@ -45,18 +45,18 @@ testing::AssertionResult is_assertion_of(const Failure& failure,
 
 }  // namespace kit
 
-#define EXPECT_FAILURE(statement, expected_message, expected_line)     \
-  do {                                                                 \
-    const kit::Failure kit_failure =                                   \
-        kit::failure_of([&] { static_cast<void>(statement); });        \
-    EXPECT_TRUE(kit_failure.failed) << "came back: " #statement;       \
-    EXPECT_EQ(kit_failure.exit_code, 100);                             \
-    EXPECT_EQ(kit_failure.message, expected_message);                  \
-    EXPECT_EQ(kit_failure.line, expected_line);                        \
+#define EXPECT_FAILURE(statement, expected_message, expected_line) \
+  do {                                                             \
+    const kit::Failure kit_failure =                               \
+        kit::failure_of([&] { static_cast<void>(statement); });    \
+    EXPECT_TRUE(kit_failure.failed) << "came back: " #statement;   \
+    EXPECT_EQ(kit_failure.exit_code, 100);                         \
+    EXPECT_EQ(kit_failure.message, expected_message);              \
+    EXPECT_EQ(kit_failure.line, expected_line);                    \
   } while (false)
 
-#define EXPECT_ASSERTION(statement, module)                            \
-  EXPECT_TRUE(kit::is_assertion_of(                                    \
+#define EXPECT_ASSERTION(statement, module) \
+  EXPECT_TRUE(kit::is_assertion_of(         \
       kit::failure_of([&] { static_cast<void>(statement); }), module))
 
 #endif  // KIT_FAILURE_H

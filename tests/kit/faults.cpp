@@ -38,41 +38,48 @@ bool fails(Call call) {
 const zxplat::FileCalls& real() { return zxplat::system_files; }
 
 const zxplat::FileCalls k_failing = {
-    .open = [](std::string_view name, zxplat::OpenMode mode) {
-      return fails(Call::open) ? zxplat::k_no_fd : real().open(name, mode);
-    },
-    .read = [](zxplat::Fd fd, void* buffer, std::size_t size) {
-      return fails(Call::read) ? std::int64_t{-1}
-                               : real().read(fd, buffer, size);
-    },
-    .write = [](zxplat::Fd fd, const void* bytes, std::size_t size) {
-      return fails(Call::write)
-                 ? std::int64_t{-1}
-                 : real().write(fd, bytes, std::min(size, write_limit));
-    },
-    .seek = [](zxplat::Fd fd, std::int64_t offset, zxplat::Whence whence) {
-      return fails(Call::seek) ? std::int64_t{-1}
-                               : real().seek(fd, offset, whence);
-    },
-    .flush = [](zxplat::Fd fd) {
-      return !fails(Call::flush) && real().flush(fd);
-    },
-    .size = [](zxplat::Fd fd) {
-      return fails(Call::size) ? std::int64_t{-1} : real().size(fd);
-    },
-    .close = [](zxplat::Fd fd) {
-      const bool closed = real().close(fd);
-      return !fails(Call::close) && closed;
-    },
-    .rename = [](std::string_view from, std::string_view to) {
-      if (!fails(Call::rename)) return real().rename(from, to);
-      return zxplat::last_error() == zxplat::k_err_other_device
-                 ? zxplat::RenameResult::other_device
-                 : zxplat::RenameResult::failed;
-    },
-    .remove = [](std::string_view name) {
-      return !fails(Call::remove) && real().remove(name);
-    },
+    .open =
+        [](std::string_view name, zxplat::OpenMode mode) {
+          return fails(Call::open) ? zxplat::k_no_fd : real().open(name, mode);
+        },
+    .read =
+        [](zxplat::Fd fd, void* buffer, std::size_t size) {
+          return fails(Call::read) ? std::int64_t{-1}
+                                   : real().read(fd, buffer, size);
+        },
+    .write =
+        [](zxplat::Fd fd, const void* bytes, std::size_t size) {
+          return fails(Call::write)
+                     ? std::int64_t{-1}
+                     : real().write(fd, bytes, std::min(size, write_limit));
+        },
+    .seek =
+        [](zxplat::Fd fd, std::int64_t offset, zxplat::Whence whence) {
+          return fails(Call::seek) ? std::int64_t{-1}
+                                   : real().seek(fd, offset, whence);
+        },
+    .flush =
+        [](zxplat::Fd fd) { return !fails(Call::flush) && real().flush(fd); },
+    .size =
+        [](zxplat::Fd fd) {
+          return fails(Call::size) ? std::int64_t{-1} : real().size(fd);
+        },
+    .close =
+        [](zxplat::Fd fd) {
+          const bool closed = real().close(fd);
+          return !fails(Call::close) && closed;
+        },
+    .rename =
+        [](std::string_view from, std::string_view to) {
+          if (!fails(Call::rename)) return real().rename(from, to);
+          return zxplat::last_error() == zxplat::k_err_other_device
+                     ? zxplat::RenameResult::other_device
+                     : zxplat::RenameResult::failed;
+        },
+    .remove =
+        [](std::string_view name) {
+          return !fails(Call::remove) && real().remove(name);
+        },
 };
 
 }  // namespace
@@ -110,7 +117,7 @@ bool Faults::parse(const std::string& wish) {
   int n = 0;
   int error = zxplat::k_err_io;
   char colon = ':';
-  if (!std::getline(in, name, ':') || !(in >> n)) return false;
+  if (!std::getline(in, name, ':') || !(in >> n) || n < 1) return false;
   if (in >> colon && !(in >> error)) return false;
   const auto* found = std::find(k_names.begin(), k_names.end(), name);
   if (found == k_names.end()) return false;

@@ -231,7 +231,9 @@ class Run {
   bool has_ended() {
     int status;
     kill_when_late();
-    if (waitpid(pid, &status, WNOHANG) != pid) return false;
+    const pid_t ended = waitpid(pid, &status, WNOHANG);
+    if (ended == -1) throw std::runtime_error("lost the process");
+    if (ended != pid) return false;
     result.exit_code =
         WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
     return true;
