@@ -136,22 +136,28 @@ bool HvlDecimal::is_sixty_fourths() const {
 
 // ---- text
 //
-// The text is made without a branch that depends on the number, but for the
-// rare ones: tables of numbers mix forms and lengths so that a processor
-// could not foresee them.
+// Beside the test for the integer form, which a column of a table keeps from
+// record to record, no branch depends on the number, but for rare ones: a
+// processor could not foresee how the digits of numbers fall.
 
 namespace {
 
 constexpr std::uint32_t k_unit = 100000000;  // 10^8, the finest scale
 
-// How a word turns into units of 10^-8: shift, then multiply.
+// The size of a number apart from its sign.
+std::uint32_t size_of(std::int32_t number) {
+  const auto bits = static_cast<std::uint32_t>(number);
+  return number < 0 ? 0U - bits : bits;
+}
+
+// How a word that is no integer turns into units of 10^-8: shift, then
+// multiply.
 struct UnitForm {
   std::uint8_t shift;
   std::uint64_t factor;
 };
 
 constexpr UnitForm unit_form(std::int32_t low_bits, bool whole) {
-  if (low_bits % 2 == 0) return {1, k_unit};
   switch (low_bits) {
     case k_ten_thousandths:
       return {4, 10000};
@@ -167,23 +173,20 @@ constexpr UnitForm unit_form(std::int32_t low_bits, bool whole) {
   }
 }
 
-// By the four low bits, and 16 more if word >> 2 is a multiple of 100.
+// By bits 1 to 3 of the word, and 8 more if word >> 2 is a multiple of 100.
 constexpr auto make_unit_forms() {
-  std::array<UnitForm, 32> forms{};
-  for (int i = 0; i < 32; ++i)
-    forms[static_cast<std::size_t>(i)] = unit_form(i % 16, i >= 16);
+  std::array<UnitForm, 16> forms{};
+  for (int i = 0; i < 16; ++i)
+    forms[static_cast<std::size_t>(i)] = unit_form(i % 8 * 2 + 1, i >= 8);
   return forms;
 }
 constexpr auto k_unit_forms = make_unit_forms();
 
 // The size of a number in units of 10^-8; at most 1.35e19, for thousands.
 std::uint64_t units_of(std::int32_t word) {
-  const int index = (word & 15) + 16 * is_whole(word >> 2);
+  const int index = (word >> 1 & 7) + 8 * is_whole(word >> 2);
   const UnitForm& form = k_unit_forms[static_cast<std::size_t>(index)];
-  const std::int32_t shifted = word >> form.shift;
-  const auto bits = static_cast<std::uint32_t>(shifted);
-  const std::uint32_t size = shifted < 0 ? 0U - bits : bits;
-  return size * form.factor;
+  return size_of(word >> form.shift) * form.factor;
 }
 
 // The eight decimal digits of a number below 10^8, one in each byte, the
@@ -248,15 +251,28 @@ char* write_exponent_form(char* out, std::uint32_t units) {
   return end + 5;
 }
 
-}  // namespace
-
-char* HvlDecimal::write_text(char* out) const {
-  constexpr std::uint64_t k_plain_from = k_unit / 10000;
-  const std::uint64_t units = units_of(word());
+char* write_sign(char* out, bool negative) {
   out[0] = '-';
-  out += word() < 0 && units != 0;
+  return out + negative;
+}
+
+char* write_integer(char* out, std::int32_t number) {
+  return write_whole(write_sign(out, number < 0), size_of(number));
+}
+
+char* write_scaled(char* out, std::int32_t word) {
+  constexpr std::uint64_t k_plain_from = k_unit / 10000;
+  const std::uint64_t units = units_of(word);
+  out = write_sign(out, word < 0 && units != 0);
   if (units < k_plain_from && units != 0) [[unlikely]]
     return write_exponent_form(out, static_cast<std::uint32_t>(units));
   out = write_whole(out, units / k_unit);
   return write_fraction(out, static_cast<std::uint32_t>(units % k_unit));
+}
+
+}  // namespace
+
+char* HvlDecimal::write_text(char* out) const {
+  const std::int32_t w = word();
+  return is_integer_form(w) ? write_integer(out, w >> 1) : write_scaled(out, w);
 }
