@@ -65,9 +65,8 @@ void write_header_row(zxBFile& out,
                       std::span<const ColumnDef> columns = g_columns);
 
 // Writes the line of a record.  A column of unknown type is fatal, and so are
-// an index outside the record's fields,
-// a date outside the calendar and a text whose direction marks cannot be
-// right (assertions).
+// an index outside the record's fields, a date outside the calendar and a
+// text whose direction marks cannot be right (assertions).
 void write_record_row(const VtxRecord& record, zxBFile& out,
                       std::span<const ColumnDef> columns = g_columns);
 
