@@ -310,13 +310,8 @@ class zxSA : public zxAA<zxStr, V> {
   }
 
   // The value; a key that is not there: message 2203 with the key.
-  V& at(const char* key) {
-    V* value = find(key);
-    if (value != nullptr) return *value;
-    bail_code(2203, key);
-    return zx_scratch_value<V>();
-  }
-  V& at(const zxStr& key) {
+  template <class Key>
+  V& at(const Key& key) {
     V* value = find(key);
     if (value != nullptr) return *value;
     bail_code(2203, key);

@@ -46,9 +46,9 @@ class zxBFile {
   // As try_create() for a name that must be free: a file or a link of that
   // name is never followed or cut.
   bool try_create_new(const zxStr& file_name);
-  // The same; a failure is fatal (1004).
+  // As try_create_new(); a failure is fatal (1004).
   void create_new(const zxStr& file_name, const BailDetail& detail = no_detail);
-  // The same for a file that only its owner may read.
+  // As try_create_new(), for a file that only its owner may read.
   bool try_create_private(const zxStr& file_name);
 
   // ---- closing.  A closed object is a success.  Whatever the result, the

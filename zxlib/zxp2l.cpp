@@ -402,10 +402,12 @@ std::size_t number_end(std::string_view run, std::size_t i) {
   std::size_t end = i;
   if (run[i] == '$' && i > 0 && i + 1 < size) ++end;
   if (!is_digit(run[end])) return i;
-  do {
+  for (;; ++end) {
     while (end < size && is_digit(run[end])) ++end;
-  } while (end + 1 < size && is_separator(run[end]) && is_digit(run[end + 1]) &&
-           ++end);
+    const bool joins =
+        end + 1 < size && is_separator(run[end]) && is_digit(run[end + 1]);
+    if (!joins) break;
+  }
   if (end < size && run[end] == '%') ++end;
   return end;
 }

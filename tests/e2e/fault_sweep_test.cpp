@@ -149,7 +149,7 @@ std::string in_library_form(std::string path) {
 class fault_sweep : public testing::Test {
  protected:
   void SetUp() override {
-    if (program_folder().empty()) GTEST_SKIP() << k_no_programs;
+    if (!has_programs()) GTEST_SKIP() << k_no_programs;
     make_large_table(place);
     data = kit::read_file(place.in_table("D4WVTX.BIN"));
   }

@@ -4,13 +4,13 @@
 #define TOOL_RUN_H
 
 #include <cstdint>
-#include <cstdlib>
 #include <filesystem>
 #include <string>
 #include <string_view>
 #include <utility>
 #include <vector>
 
+#include "kit/cases.h"
 #include "kit/process.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
@@ -18,12 +18,6 @@
 
 namespace tool_run {
 
-// Where the programs lie; empty if nobody says so, and then the tests are
-// skipped.
-inline std::string program_folder() {
-  const char* folder = std::getenv("ZX_BIN_DIR");
-  return folder == nullptr ? "" : folder;
-}
 inline constexpr char k_no_programs[] =
     "ZX_BIN_DIR does not name the folder of the built programs";
 
@@ -32,9 +26,8 @@ inline constexpr char k_no_programs[] =
 inline constexpr char k_tool[] = "vtx2csv";
 inline constexpr char k_quick_tool[] = "vtx2csv_faults";
 
-inline std::string path_of(const std::string& program) {
-  return program_folder() + "/" + program + (kit::on_windows() ? ".exe" : "");
-}
+// True if the programs can be found; otherwise the tests are skipped.
+inline bool has_programs() { return !kit::built_program(k_tool).empty(); }
 
 // ---- what a run must make
 
@@ -93,8 +86,8 @@ inline std::string normal_screen(std::string screen) {
 inline std::string failure_screen(const std::string& program,
                                   const std::string& message,
                                   const std::string& line) {
-  return "\r\n" + path_of(program) + " 1.01a Fatal Error " + message + " " +
-         line + "\r\n";
+  return "\r\n" + kit::built_program(program) + " 1.01a Fatal Error " +
+         message + " " + line + "\r\n";
 }
 
 // ---- a place for runs
@@ -163,7 +156,7 @@ class Place {
   static kit::ProcessResult run(const std::string& program,
                                 const std::vector<std::string>& arguments,
                                 const kit::ProcessOptions& options) {
-    std::vector<std::string> command = {path_of(program)};
+    std::vector<std::string> command = {kit::built_program(program)};
     command.insert(command.end(), arguments.begin(), arguments.end());
     return kit::run_process(command, options);
   }

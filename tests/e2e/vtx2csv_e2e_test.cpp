@@ -29,7 +29,7 @@ constexpr char k_old[] = "the file of yesterday";
 class vtx2csv_e2e : public testing::Test {
  protected:
   void SetUp() override {
-    if (program_folder().empty()) GTEST_SKIP() << k_no_programs;
+    if (!has_programs()) GTEST_SKIP() << k_no_programs;
     place.make_table(small_table());
   }
 
@@ -76,9 +76,9 @@ class vtx2csv_e2e : public testing::Test {
                                const std::string& before) {
     EXPECT_EQ(result.exit_code, 100);
     const std::string screen = normal_screen(result.out);
-    const std::string start = before + "\r\n" + path_of(k_quick_tool) +
-                              " 1.01a Fatal Error 1000: bailed out: " + module +
-                              ":";
+    const std::string start =
+        before + "\r\n" + kit::built_program(k_quick_tool) +
+        " 1.01a Fatal Error 1000: bailed out: " + module + ":";
     EXPECT_TRUE(screen.starts_with(start)) << screen;
     EXPECT_TRUE(screen.ends_with("]\r\n")) << screen;
   }
@@ -368,7 +368,7 @@ TEST_F(vtx2csv_e2e, without_a_temporary_folder_no_name_is_free) {
   fs::create_directory(place.temp());
   EXPECT_EQ(result.exit_code, 100);
   EXPECT_TRUE(result.out.starts_with(
-      "start converting to r9qvtx.csv\r\n" + path_of(k_quick_tool) +
+      "start converting to r9qvtx.csv\r\n" + kit::built_program(k_quick_tool) +
       " 1.01a Fatal Error 1037: uniqfile: failed to "
       "find on '"))
       << result.out;

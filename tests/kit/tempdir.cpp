@@ -48,6 +48,13 @@ std::string TempDir::file(std::string_view name) const {
   return (fs::path(folder) / fs::path(name)).string();
 }
 
+WorkingIn::WorkingIn(const std::string& folder)
+    : before(fs::current_path().string()) {
+  fs::current_path(folder);
+}
+
+WorkingIn::~WorkingIn() { fs::current_path(before); }
+
 std::string read_file(const std::string& path) {
   std::ifstream in(path, std::ios::binary);
   if (!in) throw std::runtime_error("cannot open " + path);

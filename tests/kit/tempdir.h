@@ -28,6 +28,18 @@ class TempDir {
   std::string folder;
 };
 
+// Another working folder until the end of the block.
+class WorkingIn {
+ public:
+  explicit WorkingIn(const std::string& folder);
+  WorkingIn(const WorkingIn&) = delete;
+  WorkingIn& operator=(const WorkingIn&) = delete;
+  ~WorkingIn();
+
+ private:
+  std::string before;
+};
+
 // A file's bytes.  Throws std::runtime_error if it cannot be read.
 std::string read_file(const std::string& path);
 

@@ -21,11 +21,14 @@
 #include <utility>
 #include <vector>
 
+#include "kit/counted.h"
 #include "kit/failure.h"
 #include "zxstr.h"
 
 namespace {
 
+struct Here;
+using Counted = kit::Counted<Here>;
 using namespace std::string_literals;
 using namespace std::string_view_literals;
 
@@ -39,26 +42,7 @@ struct PlainKey {
 };
 int hashes_taken = 0;
 
-// Counts its living objects.  Its bytes may be moved.
-struct Counted {
-  int number = 77;
-
-  Counted() { ++alive; }
-  explicit Counted(int n) : number(n) { ++alive; }
-  Counted(const Counted& other) : number(other.number) { ++alive; }
-  Counted& operator=(const Counted& other) = default;
-  ~Counted() {
-    number = -1;
-    --alive;
-  }
-  static int alive;
-};
-int Counted::alive = 0;
-
 }  // namespace
-
-template <>
-inline constexpr bool zx_relocatable<Counted> = true;
 
 template <>
 struct zxKeyTraits<PlainKey> {

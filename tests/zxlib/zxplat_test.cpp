@@ -25,6 +25,7 @@ namespace {
 namespace fs = std::filesystem;
 
 using kit::TempDir;
+using kit::WorkingIn;
 using namespace std::string_view_literals;
 using zxplat::Fd;
 using zxplat::files;
@@ -82,20 +83,6 @@ class Open {
   }
 
   Fd fd;
-};
-
-// Another working directory until the end of the block.
-class WorkingIn {
- public:
-  explicit WorkingIn(const std::string& folder) : before(fs::current_path()) {
-    fs::current_path(folder);
-  }
-  WorkingIn(const WorkingIn&) = delete;
-  WorkingIn& operator=(const WorkingIn&) = delete;
-  ~WorkingIn() { fs::current_path(before); }
-
- private:
-  fs::path before;
 };
 
 void write_through(std::string_view name, OpenMode mode,

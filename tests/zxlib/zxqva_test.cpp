@@ -15,37 +15,18 @@
 #include <utility>
 #include <vector>
 
+#include "kit/counted.h"
 #include "kit/failure.h"
 #include "zxstr.h"
 
 namespace {
 
-// Counts its living objects.  Its bytes may be moved.
-struct Counted {
-  int number = 77;
-
-  Counted() { ++alive; }
-  explicit Counted(int n) : number(n) { ++alive; }
-  Counted(const Counted& other) : number(other.number) { ++alive; }
-  Counted& operator=(const Counted& other) = default;
-  ~Counted() {
-    number = -1;
-    --alive;
-  }
-  static int alive;
-};
-int Counted::alive = 0;
+struct Here;
+using Counted = kit::Counted<Here>;
 
 struct Bytes24 {
   char bytes[24] = {};
 };
-
-}  // namespace
-
-template <>
-inline constexpr bool zx_relocatable<Counted> = true;
-
-namespace {
 
 // ---------------------------------------------------------------- helpers --
 

@@ -34,6 +34,7 @@ using kit::Call;
 using kit::Faults;
 using kit::read_file;
 using kit::TempDir;
+using kit::WorkingIn;
 using kit::write_file;
 using Names = std::vector<std::string>;
 
@@ -108,20 +109,6 @@ class TempVariables {
  private:
   static constexpr const char* k_names[] = {"TMPDIR", "TMP", "TEMP"};
   Names before;
-};
-
-// Another working folder until the end of the block.
-class WorkingIn {
- public:
-  explicit WorkingIn(const std::string& folder) : before(fs::current_path()) {
-    fs::current_path(folder);
-  }
-  WorkingIn(const WorkingIn&) = delete;
-  WorkingIn& operator=(const WorkingIn&) = delete;
-  ~WorkingIn() { fs::current_path(before); }
-
- private:
-  fs::path before;
 };
 
 void make_read_only(const std::string& path) {
