@@ -2,46 +2,55 @@
 // Tests: tests/zxlib/zxatsys_test.cpp.
 #include "zxatsys.h"
 
-#include <charconv>
-#include <cstring>
-
 #include "zxatsys_impl.h"
 #include "zxplat.h"
+#include "zxstkdmp.h"
+#include "zxtext.h"
 
 namespace {
 
-// Long enough that no file name or text of common size is cut where the
-// message shows it whole; the screen adds the line behind it.
-constexpr std::size_t k_message_room = 16384;
-// Eight numbers or cut texts, brackets and separators.
-constexpr std::size_t k_line_room = 192;
-// What the screen shows of a program path and a version at most, so that the
-// message and the line always have their place.
-constexpr std::size_t k_shown_path = 4096;
-constexpr std::size_t k_shown_version = 256;
-// All of these and the words between.
-constexpr std::size_t k_screen_room =
-    k_shown_path + k_shown_version + k_message_room + k_line_room + 64;
-
-// A message and a line that are together shorter than this share one line
-// of the screen.
-constexpr std::size_t k_one_line = 65;
 // Free texts are cut to this in the message.
 constexpr std::size_t k_free_text = 140;
 // The cuts of the two texts in the diagnostic line.
 constexpr std::size_t k_line_text = 12;
 constexpr std::size_t k_line_detail = 18;
 
-char bail_message[k_message_room];
-char bail_line[k_line_room];
-char bail_screen[k_screen_room];
+char bail_message[k_bail_message_room];
+char bail_line[k_bail_line_room];
+
+struct EmergencyPair {
+  zxEmergency first;
+  zxEmergency second;
+};
+constinit EmergencyPair emergencies[k_max_emergencies] = {};
+constinit std::size_t emergency_count = 0;
 
 const char* no_text() { return ""; }
+void no_modules(const char*, const char*) {}
+
+// ---- what is reported
+
+// A text of the caller, which may stand in a buffer that an emergency
+// function or the hook uses as well.
+class KeptText {
+ public:
+  const char* keep(const char* text) {
+    if (text == nullptr) return nullptr;
+    zxText copy(room);
+    copy.add(text);
+    return room;
+  }
+
+ private:
+  char room[k_bail_message_room];
+};
+KeptText kept_text;
+KeptText kept_detail;
 
 struct Failure {
   std::int32_t number;
   const char* text;  // may be null
-  const BailDetail& detail;
+  BailDetail detail;
   int first_error;
   int second_error;
 };
@@ -49,6 +58,8 @@ struct Failure {
 bool is_set(const char* text) { return text != nullptr && *text != '\0'; }
 
 const char* or_empty(const char* text) { return text ? text : ""; }
+
+// ---- message and line
 
 // Adds a row of the message table with its place for the argument filled.
 // The row is never handed to a formatter: an argument is text, whatever it
@@ -77,6 +88,13 @@ void add_words(zxText& out, const Failure& failure) {
     out.add("0:!");
 }
 
+// A message whose words begin with "=" is quiet; a blank takes its place.
+bool take_quiet_mark(std::size_t words) {
+  if (bail_message[words] != '=') return false;
+  bail_message[words] = ' ';
+  return true;
+}
+
 void add_detail(zxText& out, const BailDetail& detail) {
   const bool with_text = is_set(detail.text);
   if (detail.number == 0 && !with_text) return;
@@ -87,18 +105,20 @@ void add_detail(zxText& out, const BailDetail& detail) {
   out.add(")");
 }
 
-std::string_view compose_message(const Failure& failure) {
-  zxText out(bail_message);
+// The message, in `out` on bail_message; true if it is a quiet one.
+bool compose_message(zxText& out, const Failure& failure) {
   if (failure.number != 0) {
     out.add_int(failure.number);
     out.add(": ");
   }
+  const std::size_t words = out.length();
   add_words(out, failure);
+  const bool quiet = take_quiet_mark(words);
   add_detail(out, failure.detail);
-  return out.view();
+  return quiet;
 }
 
-std::string_view compose_line(const Failure& failure) {
+void compose_line(const Failure& failure) {
   zxText out(bail_line);
   out.add("[");
   out.add_int(failure.number);
@@ -115,61 +135,56 @@ std::string_view compose_line(const Failure& failure) {
   out.add("/");
   out.add(or_empty(failure.detail.text), k_line_detail);
   out.add("]");
-  return out.view();
 }
 
-void print_screen(std::string_view message, std::string_view line) {
-  const bool one_line = message.size() + line.size() < k_one_line;
-  zxText out(bail_screen);
-  out.add("\r\n");
-  out.add(bail_hooks.program_path(), k_shown_path);
-  out.add(" ");
-  out.add(bail_hooks.program_version(), k_shown_version);
-  out.add(" Fatal Error ");
-  out.add(message);
-  out.add(one_line ? " " : "\r\n           ");
-  out.add(line);
-  bail_hooks.print(out.view());
+// ---- the core
+
+// True if a failure is being handled: another one is dropped.
+bool is_dropped() {
+  if (!bail_guard) return false;
+  if ((traits & k_trait_console) == 0)
+    zxplat::process.last_words("Cleanup Failure");
+  return true;
 }
 
-// Leaves the screen standing until the clock has moved on.
-void wait_for_reader() {
-  constexpr std::uint32_t k_step = 10;
-  const std::int64_t start = zxplat::process.clock();
-  while (zxplat::process.clock() - start < bail_wait_seconds)
-    zxplat::process.sleep(k_step);
+void report(const Failure& failure) {
+  const auto whole = std::span(bail_message);
+  zxText message(whole.first(whole.size() - k_bail_added_room));
+  const bool quiet = compose_message(message, failure);
+  compose_line(failure);
+  if (quiet) bail_line[0] = '\0';
+  if (bail_hook != nullptr) bail_hook(bail_message, bail_line);
+  bail_hooks.tell_modules(bail_message, bail_line);
+  zxText shown(whole, message.length());
+  show_failure(shown, bail_line);
 }
 
+// Each of the two system numbers has its own place in the line; they can
+// differ only if the system changes the value between the calls.
 void bail_core(std::int32_t number, const char* text,
                const BailDetail& detail) {
   const int first_error = zxplat::last_error();
   const int second_error = zxplat::last_error();
-  if (bail_guard) return;
+  if (is_dropped()) return;
   bail_guard = true;
-  const Failure failure{number, text, detail, first_error, second_error};
-  const std::string_view message = compose_message(failure);
-  const std::string_view line = compose_line(failure);
-  print_screen(message, line);
-  wait_for_reader();
-  bail_hooks.print("\r\n");
+  const Failure failure{
+      number, kept_text.keep(text),
+      BailDetail(detail.number, kept_detail.keep(detail.text)), first_error,
+      second_error};
+  run_emergency_first();
+  report(failure);
   zxplat::process.exit(k_exit_failure);
 }
 
 }  // namespace
 
 constinit bool bail_guard = false;
-constinit std::int64_t bail_wait_seconds = 2;
-constinit BailHooks bail_hooks = {no_text, no_text, bail_print_directly};
+constinit zxBailHook bail_hook = nullptr;
+constinit zxBailHook bail_hook_early = nullptr;
+constinit BailHooks bail_hooks = {
+    no_text, no_text, no_text, bail_print_directly, dump_stack, no_modules};
 
-void bail_print_directly(std::string_view text) {
-  zxplat::set_binary(zxplat::k_stdout_fd);  // start-up may not have come yet
-  while (!text.empty()) {
-    const std::int64_t done =
-        zxplat::files.write(zxplat::k_stdout_fd, text.data(), text.size());
-    if (done <= 0) return;
-    text.remove_prefix(static_cast<std::size_t>(done));
-  }
-}
+// ---- entries
 
 void bail_code(std::int32_t number) { bail_core(number, nullptr, no_detail); }
 
@@ -188,31 +203,39 @@ void bail_detail(std::int32_t number, const char* text,
 }
 
 void assert_fail(std::int32_t line, const char* file) {
-  // The position text of the failure that is being reported must stand.
-  if (bail_guard) return;
+  // The position of the failure that is being reported must stand.
+  if (is_dropped()) return;
   zx_pos = zxPos{file, line};
   bail_core(1000, pos_string(zx_pos), no_detail);
 }
 
-zxText::zxText(std::span<char> buffer, std::size_t length)
-    : room(buffer), used(length < buffer.size() ? length : buffer.size() - 1) {
-  room[used] = '\0';
+void fatal_exit(const char* text) {
+  zxplat::process.debug_break();
+  zxplat::process.last_words(text != nullptr ? text : "");
+  zxplat::process.exit_at_once(k_exit_failure);
 }
 
-void zxText::add(std::string_view text) {
-  const std::size_t left = room.size() - 1 - used;
-  const std::size_t size = text.size() < left ? text.size() : left;
-  if (size > 0) std::memcpy(room.data() + used, text.data(), size);
-  used += size;
-  room[used] = '\0';
+// ---- hooks and the emergency table
+
+zxBailHook set_bail_hook(zxBailHook hook, bool which) {
+  zxBailHook& slot = which ? bail_hook : bail_hook_early;
+  const zxBailHook old = slot;
+  slot = hook;
+  return old;
 }
 
-void zxText::add(std::string_view text, std::size_t at_most) {
-  add(text.substr(0, at_most));
+zxEmergency at_emergency(zxEmergency first, zxEmergency second) {
+  if (ZX_ASSERT(emergency_count < k_max_emergencies))
+    emergencies[emergency_count++] = {first, second};
+  return first;
 }
 
-void zxText::add_int(std::int32_t number) {
-  char digits[12];
-  const auto end = std::to_chars(digits, digits + sizeof digits, number).ptr;
-  add({digits, static_cast<std::size_t>(end - digits)});
+void run_emergency_first() {
+  for (std::size_t i = emergency_count; i > 0; --i)
+    if (emergencies[i - 1].first != nullptr) emergencies[i - 1].first();
+}
+
+void run_emergency_second() {
+  for (std::size_t i = 0; i < emergency_count; ++i)
+    if (emergencies[i].second != nullptr) emergencies[i].second();
 }

@@ -18,6 +18,9 @@ constinit zxStream standard_streams[] = {zxStream(zxplat::k_stdin_fd),
                                          zxStream(zxplat::k_stdout_fd),
                                          zxStream(zxplat::k_stderr_fd)};
 
+// The streams that open() made, the newest first.
+constinit zxStream* newest_stream = nullptr;
+
 }  // namespace
 
 zxStream& zx_standard_stream(zxplat::Fd descriptor) {
@@ -30,12 +33,44 @@ zxStream* zxStream::open(std::string_view name, zxplat::OpenMode mode) {
   auto* stream = ::new (zx_realloc(nullptr, sizeof(zxStream))) zxStream(fd);
   stream->appends = mode == zxplat::OpenMode::append;
   if (!stream->appends) stream->position = 0;
+  stream->join_open_streams();
   return stream;
+}
+
+void zxStream::join_open_streams() {
+  older = newest_stream;
+  if (older != nullptr) older->newer = this;
+  newest_stream = this;
+}
+
+void zxStream::leave_open_streams() {
+  (newer != nullptr ? newer->older : newest_stream) = older;
+  if (older != nullptr) older->newer = newer;
+}
+
+// True if the descriptor was given back before, or is now.
+bool zxStream::close_descriptor() {
+  const zxplat::Fd old = fd;
+  fd = zxplat::k_no_fd;
+  return old == zxplat::k_no_fd || zxplat::files.close(old);
+}
+
+void zxStream::close_all() {
+  for (zxStream* stream = newest_stream; stream != nullptr;
+       stream = stream->older) {
+    stream->flush();
+    stream->close_descriptor();
+    stream->state = State::idle;
+    stream->next = stream->end = 0;
+    stream->position = -1;
+    stream->write_failed = false;
+  }
 }
 
 bool zxStream::close(zxStream* stream) {
   const bool written = stream->flush() && !stream->write_failed;
-  const bool closed = zxplat::files.close(stream->fd);
+  const bool closed = stream->close_descriptor();
+  stream->leave_open_streams();
   if (stream->buffer != nullptr) zx_realloc(stream->buffer, 0);
   stream->~zxStream();
   zx_realloc(stream, 0);

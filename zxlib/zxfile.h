@@ -38,6 +38,12 @@ class zxStream {
   // at an earlier write.
   static bool close(zxStream* stream);
 
+  // Writes down and closes the files of all streams that open() made.  The
+  // streams stay, without a descriptor: what is asked of them fails, and
+  // close() is a success.  It is for a process that needs their descriptors
+  // for its last words.
+  static void close_all();
+
   // Reads up to `size` bytes; the count.  A short count sets eof() or
   // error().
   std::size_t read(void* out, std::size_t size);
@@ -72,6 +78,10 @@ class zxStream {
  private:
   enum class State : std::uint8_t { idle, reading, writing };
 
+  void join_open_streams();
+  void leave_open_streams();
+  bool close_descriptor();
+
   void take_buffer();
   void fill();
   bool begin_reading();
@@ -99,6 +109,10 @@ class zxStream {
 
   // The descriptor's position where it is known, else -1.
   std::int64_t position = -1;
+
+  // The neighbours in the list of the streams that open() made.
+  zxStream* newer = nullptr;
+  zxStream* older = nullptr;
 };
 
 // The streams of the three standard descriptors; they live as long as the

@@ -7,6 +7,7 @@
 #include "zxpkg.h"
 #include "zxplat.h"
 #include "zxsfmt.h"
+#include "zxstkdmp.h"
 #include "zxsys2.h"
 
 constinit zxStr program_path;
@@ -25,9 +26,10 @@ ZxPackage package_record = {"zx", "3.64b", "test w32  vc", 0, nullptr};
 [[maybe_unused]] const bool package_registered =
     (register_package(&package_record), true);
 
-// ---- what the failure core asks for
+// ---- what the failure core and the stack dump ask for
 
 const char* path_for_core() { return program_path.c_str(); }
+const char* name_for_core() { return program_name.c_str(); }
 const char* version_for_core() { return program_version.c_str(); }
 
 // Behind what was printed before, and past the stream's buffer: the heap
@@ -35,6 +37,23 @@ const char* version_for_core() { return program_version.c_str(); }
 void print_for_core(std::string_view text) {
   zx_standard_stream(zxplat::k_stdout_fd).flush();
   bail_print_directly(text);
+}
+
+const char* directory_for_dump() { return current_dir.c_str(); }
+
+void describe_for_dump(const zxFrameMarker& marker, zxText& out) {
+  const zxStr text = marker.describe();
+  out.add(text.view());
+}
+
+void fill_hooks() {
+  bail_hooks.program_path = path_for_core;
+  bail_hooks.program_name = name_for_core;
+  bail_hooks.program_version = version_for_core;
+  bail_hooks.print = print_for_core;
+  stack_dump_hooks.directory = directory_for_dump;
+  stack_dump_hooks.close_files = zxStream::close_all;
+  stack_dump_hooks.describe = describe_for_dump;
 }
 
 // ---- program values
@@ -77,6 +96,8 @@ void clear_at_exit() {
   g_stdin.close();
   g_stdout.close();
   g_stderr.close();
+  // The strings of a module that are destroyed still later.
+  if ((traits & k_trait_executable) == 0) zx_realloc = zx_realloc_after_cleanup;
 }
 
 }  // namespace
@@ -86,7 +107,8 @@ void init_zxlib_args(int argc, const char* const* argv) {
   not_yet_started = false;
   zxplat::prepare_process();
   std::atexit(clear_at_exit);
-  bail_hooks = {path_for_core, version_for_core, print_for_core};
+  fill_hooks();
+  zx_is_started = true;
   set_program_values(argc > 0 && argv[0] != nullptr ? argv[0] : "");
   for (int i = 1; i < argc; ++i) g_args.append(argv[i]);
   bind_standard_streams();

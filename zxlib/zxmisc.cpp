@@ -2,11 +2,11 @@
 // Tests: tests/zxlib/zxmisc_test.cpp.
 #include "zxmisc.h"
 
-#include <cstdlib>
 #include <cstring>
 
 #include "zxatsys.h"
 #include "zxplat.h"
+#include "zxtext.h"
 
 constinit zxPos zx_pos;
 
@@ -35,21 +35,44 @@ std::size_t write_shown_name(const char* name) {
   return shown;
 }
 
-// Memory for strings is taken from the heap.  Exhaustion is the end of the
-// process, also while another failure is being handled, for no caller can
-// go on without the block.
-void* heap_slot(void* block, std::size_t size) {
-  void* result = zxplat::heap_realloc(block, size);
-  if (result == nullptr && size != 0) {
-    bail_code(2000);
-    std::_Exit(k_exit_failure);
-  }
-  return result;
+// One button "OK".
+constexpr std::uint32_t k_box_style = 0;
+
+// No caller can go on without the block, not even while another failure is
+// being handled.
+[[gnu::cold]] void fail_for_memory() {
+  bail_code(2000);
+  zxplat::process.exit_at_once(k_exit_failure);
+}
+
+[[gnu::cold]] void fail_for_early_use() {
+  zxplat::process.message_box("Using static string/array in a ZXL.",
+                              "fatal init error", k_box_style);
+  zxplat::process.exit(k_exit_early_allocation);
 }
 
 }  // namespace
 
-constinit zxReallocFunction zx_realloc = heap_slot;
+constinit bool zx_is_started = false;
+constinit zxReallocFunction zx_realloc = zx_heap_realloc;
+
+void* zx_heap_realloc(void* block, std::size_t size) {
+  if (!zx_is_started && (traits & k_trait_executable) == 0) [[unlikely]]
+    fail_for_early_use();
+  void* result = zxplat::heap_realloc(block, size);
+  if (result == nullptr && size != 0) [[unlikely]]
+    fail_for_memory();
+  return result;
+}
+
+void* zx_realloc_after_cleanup(void* block, std::size_t) {
+  if (block == nullptr) return nullptr;
+  zxplat::process.message_box(
+      "Using static string/array in a ZXL - realloc called after cleanup",
+      "fatal cleanup error", k_box_style);
+  zxplat::process.debug_break();
+  return nullptr;
+}
 
 const char* pos_string(zxPos& position) {
   if (position.file == nullptr) position.file = "?";

@@ -74,11 +74,26 @@ inline constexpr std::uint32_t k_trait_executable = 1U << 2;
 
 // The slot through which all memory of strings and containers is taken,
 // resized and given back: (null, size) allocates, (block, size) resizes,
-// (block, 0) frees.  The result is not tested by callers: the function that
-// stands here at first ends the process with message 2000 when the heap is
-// exhausted.
+// (block, 0) frees.  The result is not tested by callers.
+//
+// A module has a copy of the library of its own, yet its strings must come
+// from the heap of the program that loads it: the slot of the module is set
+// to the program's function when the module starts.
 using zxReallocFunction = void* (*)(void* block, std::size_t size);
 extern zxReallocFunction zx_realloc;
+
+// What stands in the slot at first: the heap.  Exhaustion ends the process
+// with message 2000.  In a module whose library has not been started yet, a
+// static object is asking too early: a box says so, and the process ends
+// with exit code 9.
+void* zx_heap_realloc(void* block, std::size_t size);
+
+// What stands in a module's slot behind the library's shutdown, when the
+// heap may be gone: it gives nothing (null), and for a block a box says so.
+void* zx_realloc_after_cleanup(void* block, std::size_t size);
+
+// Set when the library has been started.
+extern bool zx_is_started;
 
 // True if objects of type T may be moved by copying their bytes, the old
 // place being forgotten without a destructor.  Types with constructors of

@@ -167,6 +167,9 @@ struct ProcessCalls {
   // Ends the process through its exit handlers; comes back only in tests.
   void (*exit)(int code);
 
+  // The same without exit handlers.
+  void (*exit_at_once)(int code);
+
   // Seconds since 1970-01-01 00:00 UTC.
   std::int64_t (*clock)();
 
@@ -175,6 +178,22 @@ struct ProcessCalls {
 
   // Lets the given time pass.
   void (*sleep)(std::uint32_t milliseconds);
+
+  // Shows a message box and waits for the answer; `style` is a number of
+  // Windows.  If the environment variable ZX_BOX_OUT names a file or is "-"
+  // (standard error), the box is not shown: the caption, the style in
+  // hexadecimal and the text are added there, each with a line feed behind
+  // it.  A system without boxes writes them to standard error.
+  void (*message_box)(const char* text, const char* caption,
+                      std::uint32_t style);
+
+  // Says what a process has to say that cannot even fail.  It goes where
+  // message_box() goes, as the text alone; the system's own box ends the
+  // process.
+  void (*last_words)(const char* text);
+
+  // Stops in the debugger if one is attached.
+  void (*debug_break)();
 };
 
 extern const ProcessCalls system_process;
@@ -192,7 +211,30 @@ bool set_binary(Fd fd);
 // True if a person sits at the other end.
 bool is_terminal(Fd fd);
 
+// --------------------------------------------------------------- faults --
+
+// A hardware fault.  The sub-code tells apart what the signal has in common;
+// for arithmetic 129 is an invalid operation, 131 a division by zero, 132 an
+// overflow, 133 an underflow, 134 a lost digit of floating-point numbers.
+// The two addresses are those of the place of the fault, 0 if unknown.
+struct Fault {
+  int signal;  // 4 illegal instruction, 8 arithmetic, 11 bad address
+  int sub_code;
+  std::uintptr_t frame;
+  std::uintptr_t instruction;
+};
+
+// Has faults reported to `handler`, which runs on a stack of its own.  If it
+// comes back, the system's own action takes place: the end of the process.
+// The system's boxes for failing devices are switched off.
+using FaultHandler = void (*)(const Fault& fault);
+void catch_faults(FaultHandler handler);
+
 // --------------------------------------------------------------- memory --
+
+// Copies memory of this process; false if not all of it can be read.  The
+// stack's guard page counts as such and stays intact.
+bool read_memory(std::uintptr_t from, void* out, std::size_t size);
 
 // The heap: null and a size allocates, a block and a size resizes, a block
 // and 0 frees (null comes back).  Null on exhaustion; the old block stays.

@@ -11,6 +11,7 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "zxplat_impl.h"
 #include "zxplat_posix_impl.h"
 
 namespace zxplat {
@@ -28,6 +29,8 @@ constexpr std::int64_t k_nanoseconds_each = 1'000'000;  // in a millisecond
 // -- process and clocks --
 
 void end_process(int code) { std::exit(code); }
+
+void end_process_at_once(int code) { std::_Exit(code); }
 
 timespec now(clockid_t clock) {
   timespec time = {};
@@ -51,7 +54,21 @@ void pause_for(std::uint32_t milliseconds) {
   }
 }
 
-constexpr ProcessCalls k_calls = {end_process, wall_clock, uptime, pause_for};
+// There are no boxes here.
+void write_box(const char* text, const char* caption, std::uint32_t style) {
+  const common::BoxText words(text, caption, style);
+  if (!common::divert_box(words.view()))
+    common::write_to_standard_error(words.view());
+}
+
+void write_last_words(const char* text) {
+  if (!common::divert_box(text)) common::write_to_standard_error(text);
+}
+
+constexpr ProcessCalls k_calls = {end_process,      end_process_at_once,
+                                  wall_clock,       uptime,
+                                  pause_for,        write_box,
+                                  write_last_words, posix::break_into_debugger};
 
 bool is_open(Fd fd) { return ::fcntl(fd, F_GETFD) != -1; }
 

@@ -26,6 +26,9 @@ struct Path {
 // True for the name of the null device.
 bool is_null_device(std::string_view name);
 
+// True for a name of the printer, which this system has none of.
+bool is_printer(std::string_view name);
+
 // Turns a name into a path: slashes, and no drive.  False with the number
 // set if no file can have that name; the null device is none.
 bool to_path(std::string_view name, Path& path);
@@ -66,6 +69,9 @@ auto on_existing(Path& path, const Call& call) {
   }
   return call(static_cast<const char*>(path.text));
 }
+
+// Stops in the debugger if one is attached.
+void break_into_debugger();
 
 // Stores the number of a failed call.  Always false, for the caller to
 // return.

@@ -78,7 +78,7 @@ int refusal(std::string_view name) {
   if (name.empty()) return k_err_path_not_found;
   if (name.find('\0') != name.npos) return k_err_bad_name;
   if (name.size() > k_max_name) return k_err_bad_name;
-  if (is_null_device(name)) return k_err_not_found;
+  if (is_null_device(name) || is_printer(name)) return k_err_not_found;
   if (is_unc(name)) return k_err_path_not_found;
   if (has_drive(name) && fold(name[0]) != 'c') return k_err_path_not_found;
   return k_err_none;
@@ -159,6 +159,10 @@ bool is_folder(const Path& path) {
 }  // namespace
 
 bool is_null_device(std::string_view name) { return folds_alike(name, "nul"); }
+
+bool is_printer(std::string_view name) {
+  return folds_alike(name, "prn") || folds_alike(name, "lpt1");
+}
 
 bool to_path(std::string_view name, Path& path) {
   if (const int number = refusal(name)) return fail_with(number);

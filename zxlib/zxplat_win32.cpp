@@ -10,6 +10,7 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "zxplat_impl.h"
 #include "zxplat_win32_impl.h"
 
 namespace zxplat {
@@ -100,6 +101,8 @@ using win32::Attempt;
 
 void end_process(int code) { std::exit(code); }
 
+void end_process_at_once(int code) { std::_Exit(code); }
+
 // The system counts tenths of microseconds from 1601-01-01.
 constexpr std::int64_t k_per_second = 10'000'000;
 constexpr std::int64_t k_1970 = 11'644'473'600;  // in seconds
@@ -115,7 +118,20 @@ std::uint32_t uptime() { return ::GetTickCount(); }
 
 void pause_for(std::uint32_t milliseconds) { ::Sleep(milliseconds); }
 
-constexpr ProcessCalls k_calls = {end_process, wall_clock, uptime, pause_for};
+void show_box(const char* text, const char* caption, std::uint32_t style) {
+  const common::BoxText words(text, caption, style);
+  if (!common::divert_box(words.view()))
+    ::MessageBoxA(nullptr, text, caption, style);
+}
+
+void say_last_words(const char* text) {
+  if (!common::divert_box(text)) ::FatalAppExitA(0, text);
+}
+
+constexpr ProcessCalls k_calls = {end_process,    end_process_at_once,
+                                  wall_clock,     uptime,
+                                  pause_for,      show_box,
+                                  say_last_words, win32::break_into_debugger};
 
 // The runtime's answer for a standard stream without anything behind it is
 // either of two negative numbers.

@@ -47,6 +47,9 @@ bool is_null_device(std::string_view name);
 // that name; the null device is none.
 bool to_name(std::string_view name, Name& out);
 
+// Stops in the debugger if one is attached.
+void break_into_debugger();
+
 // Stores the number of a failed call.  Always false, for the caller to
 // return.
 bool fail_with(int number);

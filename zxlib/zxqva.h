@@ -9,6 +9,9 @@
 //     the array's invariant;
 //   - ref(i) behind the end grows the array up to i.
 //
+// Sorting: begin() and end() are plain pointers, which the standard's
+// algorithms take.
+//
 // References and pointers to elements last until the array grows, slides or
 // loses the element.  An argument of append() may be an element of the same
 // array.  After a failure that was dropped an operation leaves the array
@@ -57,6 +60,11 @@ class zxQVA {
   std::int32_t block_capacity() const { return capacity; }
   std::int32_t block_offset() const { return offset; }
 
+  T* begin() & { return first; }
+  T* end() & { return first + count; }
+  const T* begin() const& { return first; }
+  const T* end() const& { return first + count; }
+
   // Element i; outside 0 to length() - 1 an assertion fails.
   T& get(std::int32_t i) { return is_live(i) ? first[i] : scratch(); }
   const T& get(std::int32_t i) const {
@@ -85,15 +93,12 @@ class zxQVA {
   // ---- the end: an empty array fails an assertion in drop and pop
   void append(const T& value) {
     if (!check()) return;
-    if (offset + count < capacity) {
+    if (offset + count < capacity) [[likely]] {
       ::new (static_cast<void*>(first + count)) T(value);
       ++count;
-      return;
+    } else {
+      append_growing(value);
     }
-    T kept(value);  // the block may move under `value`
-    const std::int32_t i = count;
-    grow_to(i);
-    if (i < count) first[i] = std::move(kept);
   }
 
   void drop_last() {
@@ -104,23 +109,19 @@ class zxQVA {
   T pop_last() {
     if (!has_elements()) return T();
     T value(std::move(first[count - 1]));
-    drop_last();
+    first[--count].~T();
     return value;
   }
 
   // ---- the front
   void drop_first() {
-    if (!has_elements()) return;
-    first->~T();
-    --count;
-    ++offset;
-    ++first;
+    if (has_elements()) leave_first();
   }
 
   T pop_first() {
     if (!has_elements()) return T();
     T value(std::move(*first));
-    drop_first();
+    leave_first();
     return value;
   }
 
@@ -191,9 +192,16 @@ class zxQVA {
   static T& scratch() { return zx_scratch_value<T>(); }
 
   bool check() const {
-    return ZX_ASSERT(capacity >= 0 && count >= 0 && offset >= 0 &&
+    return ZX_ASSERT((capacity | count | offset) >= 0 &&
                      std::int64_t{offset} + count <= capacity &&
                      (capacity == 0 || first == base + offset));
+  }
+
+  void leave_first() {
+    first->~T();
+    --count;
+    ++offset;
+    ++first;
   }
 
   bool is_live(std::int32_t i) const {
@@ -201,6 +209,13 @@ class zxQVA {
   }
 
   bool has_elements() const { return check() && ZX_ASSERT(count > 0); }
+
+  // The value is copied first: the block may move under it.
+  [[gnu::noinline]] void append_growing(T value) {
+    const std::int32_t i = count;
+    grow_to(i);
+    if (i < count) first[i] = std::move(value);
+  }
 
   // Room for element i, by growth or by taking back the room in front.
   bool make_room_for(std::int32_t i) {

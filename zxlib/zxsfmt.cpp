@@ -4,6 +4,8 @@
 
 #include <cstring>
 
+#include "zxtext.h"
+
 namespace {
 
 // One pass over a format.

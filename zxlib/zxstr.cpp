@@ -3,8 +3,10 @@
 #include "zxstr.h"
 
 #include <array>
+#include <bit>
 #include <climits>
 #include <cstring>
+#include <utility>
 
 namespace {
 
@@ -51,11 +53,6 @@ constinit zxStrRep zx_empty_rep = {0, 0, 0, {'\0'}};
 
 // ---- representation
 
-void zxStr::release() {
-  if (rep->refs == 0) return;
-  if (--rep->refs == 0) zx_realloc(rep, 0);
-}
-
 bool zxStr::is_within(const char* place) const {
   const auto start = reinterpret_cast<std::uintptr_t>(rep->data);
   const auto at = reinterpret_cast<std::uintptr_t>(place);
@@ -95,22 +92,22 @@ void zxStr::clear() {
 
 // ---- making and assigning
 
-zxStr::zxStr(const char* text) : zxStr() {
-  if (!ZX_ASSERT(text != nullptr)) return;
-  build(text, zx_count(std::strlen(text)));
-}
+zxStr::zxStr(const char* text)
+    : zxStr(text, text != nullptr ? zx_count(std::strlen(text)) : 0) {}
 
 zxStr::zxStr(const char* characters, std::int32_t length) : zxStr() {
-  build(characters, length);
+  if (!ZX_ASSERT(characters != nullptr && length >= 0)) return;
+  rep = new_block(length);
+  fill(rep, characters, length, nullptr, 0);
 }
 
-zxStr::zxStr(char byte) : zxStr() { build(&byte, 1); }
+zxStr::zxStr(char byte) : zxStr(&byte, 1) {}
 
-zxStr::zxStr(std::string_view text) : zxStr() {
-  build(text.empty() ? "" : text.data(), zx_count(text.size()));
-}
+zxStr::zxStr(std::string_view text)
+    : zxStr(text.empty() ? "" : text.data(), zx_count(text.size())) {}
 
-zxStr::zxStr(const zxStr& other) : zxStr() { *this = other; }
+// What is empty or cannot be shared.
+void zxStr::copy_unshareable(const zxStr& other) { *this = other; }
 
 zxStr& zxStr::operator=(const zxStr& other) {
   if (!check() || !other.check() || rep == other.rep) return *this;
@@ -203,9 +200,44 @@ bool zxStr::operator==(const char* text) const {
 
 bool zxStr::operator==(char byte) const { return equals(&byte, 1); }
 
+std::strong_ordering zxStr::order(const char* text, std::int32_t size) const {
+  if (!check()) return std::strong_ordering::equal;
+  const std::int32_t common = rep->length < size ? rep->length : size;
+  const int bytes = std::memcmp(rep->data, text, zx_size(common));
+  return bytes != 0 ? bytes <=> 0 : rep->length <=> size;
+}
+
+std::strong_ordering zxStr::operator<=>(const char* text) const {
+  if (!ZX_ASSERT(text != nullptr)) return std::strong_ordering::equal;
+  return order(text, zx_count(std::strlen(text)));
+}
+
 void zxStr::copy_to(char* out, std::int32_t size) const {
   if (!check() || !ZX_ASSERT(out != nullptr && size > rep->length)) return;
   std::memcpy(out, rep->data, zx_size(rep->length) + 1);
+}
+
+// ---- the form with room inside
+
+void zxStr::fill_inner(const char* characters, std::int32_t length) {
+  fill(rep, characters, length, nullptr, 0);
+}
+
+zxIStr::zxIStr(const char* text) {
+  start_with(text, text != nullptr ? zx_count(std::strlen(text)) : 0);
+}
+
+zxIStr::zxIStr(const char* characters, std::int32_t length) {
+  start_with(characters, length);
+}
+
+void zxIStr::start_with(const char* characters, std::int32_t length) {
+  start_inside();
+  if (!ZX_ASSERT(characters != nullptr && length >= 0)) return;
+  if (length <= k_room)
+    fill_inner(characters, length);
+  else
+    build(characters, length);
 }
 
 // ---- sizing
@@ -258,21 +290,17 @@ void zxStr::sync_length() {
 
 // ---- appending
 
-zxStr& zxStr::append(char byte) {
-  if (!check()) return *this;
+zxStr& zxStr::append_growing(char byte) {
   const std::int32_t old_length = rep->length;
   if (rep->refs >= 2) {
     build(rep->data, old_length, &byte, 1);
     return *this;
   }
-  if (old_length >= rep->capacity) {
-    const std::int32_t wanted = sum_of(old_length, k_margin);
-    if (!ZX_ASSERT(wanted >= 0)) return *this;
-    make_room(wanted);
-  }
+  const std::int32_t wanted = sum_of(old_length, k_margin);
+  if (!ZX_ASSERT(wanted >= 0)) return *this;
+  make_room(wanted);
   rep->data[old_length] = byte;
-  rep->length = old_length + 1;
-  rep->data[rep->length] = '\0';
+  rep->data[++rep->length] = '\0';
   return *this;
 }
 
@@ -392,10 +420,25 @@ zxStr joined(const char* a, std::int32_t a_length, const char* b,
 
 }  // namespace
 
+// The block of `a` becomes the result's where it is its alone and has no room
+// to spare, since the result takes exactly what it needs.
+zxStr zx_joined(zxStr&& a, const char* b, std::int32_t b_length) {
+  const std::int32_t sum = sum_of(a.length(), b_length);
+  if (a.rep->refs != 1 || sum < a.rep->capacity || a.is_within(b))
+    return joined(a.c_str(), a.length(), b, b_length);
+  zxStr result;
+  std::swap(result.rep, a.rep);
+  if (result.rep->capacity != sum) result.resize_block(sum);
+  std::memcpy(result.rep->data + result.rep->length, b, zx_size(b_length));
+  result.rep->length = sum;
+  result.rep->data[sum] = '\0';
+  return result;
+}
+
 zxStr operator+(const zxStr& a, const zxStr& b) {
   if (!a.check() || !b.check()) return {};
-  if (a.is_empty()) return b;
-  if (b.is_empty()) return a;
+  if (a.length() == 0) return b;
+  if (b.length() == 0) return a;
   return joined(a.c_str(), a.length(), b.c_str(), b.length());
 }
 
@@ -405,15 +448,33 @@ zxStr operator+(const zxStr& a, const char* b) {
   return joined(a.c_str(), a.length(), b, zx_count(std::strlen(b)));
 }
 
+zxStr operator+(const zxStr& a, char b) {
+  if (!a.check()) return {};
+  return joined(a.c_str(), a.length(), &b, 1);
+}
+
+zxStr operator+(zxStr&& a, const zxStr& b) {
+  if (!a.check() || !b.check()) return {};
+  if (a.length() == 0) return b;
+  if (b.length() == 0) return a;
+  return zx_joined(static_cast<zxStr&&>(a), b.c_str(), b.length());
+}
+
+zxStr operator+(zxStr&& a, const char* b) {
+  if (!a.check()) return {};
+  if (!ZX_ASSERT(b != nullptr) || *b == '\0') return a;
+  return zx_joined(static_cast<zxStr&&>(a), b, zx_count(std::strlen(b)));
+}
+
+zxStr operator+(zxStr&& a, char b) {
+  if (!a.check()) return {};
+  return zx_joined(static_cast<zxStr&&>(a), &b, 1);
+}
+
 zxStr operator+(const char* a, const zxStr& b) {
   if (!b.check()) return {};
   if (!ZX_ASSERT(a != nullptr) || *a == '\0') return b;
   return joined(a, zx_count(std::strlen(a)), b.c_str(), b.length());
-}
-
-zxStr operator+(const zxStr& a, char b) {
-  if (!a.check()) return {};
-  return joined(a.c_str(), a.length(), &b, 1);
 }
 
 zxStr operator+(char a, const zxStr& b) {
@@ -426,32 +487,76 @@ void bail_code(std::int32_t number, const zxStr& text,
   bail_code(number, text.c_str(), detail);
 }
 
+void fatal_exit(const zxStr& text) { fatal_exit(text.c_str()); }
+
 // ---- checksum
 
 namespace {
 
-constexpr std::array<std::uint16_t, 256> make_crc16_table() {
-  std::array<std::uint16_t, 256> table{};
+constexpr std::uint16_t k_crc16_start = 0xFFFF;
+constexpr std::size_t k_slice = 8;  // bytes taken at once
+
+// Table k gives what a byte does to the sum when k more bytes follow it.
+using Crc16Tables = std::array<std::array<std::uint16_t, 256>, k_slice>;
+
+constexpr Crc16Tables make_crc16_tables() {
+  Crc16Tables tables{};
   for (unsigned i = 0; i < 256; ++i) {
     unsigned crc = i << 8;
     for (int bit = 0; bit < 8; ++bit)
       crc = (crc & 0x8000U) ? (crc << 1) ^ 0x1021U : crc << 1;
-    table[i] = static_cast<std::uint16_t>(crc);
+    tables[0][i] = static_cast<std::uint16_t>(crc);
   }
-  return table;
+  for (std::size_t k = 1; k < k_slice; ++k)
+    for (std::size_t i = 0; i < 256; ++i) {
+      const unsigned crc = tables[k - 1][i];
+      tables[k][i] =
+          static_cast<std::uint16_t>((crc << 8) ^ tables[0][crc >> 8]);
+    }
+  return tables;
 }
 
-constexpr auto k_crc16_table = make_crc16_table();
-constexpr std::uint16_t k_crc16_start = 0xFFFF;
+constexpr Crc16Tables k_crc16_tables = make_crc16_tables();
+
+std::uint16_t add_byte(std::uint16_t crc, unsigned char byte) {
+  return static_cast<std::uint16_t>((crc << 8) ^
+                                    k_crc16_tables[0][(crc >> 8) ^ byte]);
+}
+
+// The sum of eight bytes of which the first is the highest.  The sum so far
+// has been mixed into the first two; zero bytes ahead of those count for
+// nothing.
+std::uint16_t sum_of_slice(std::uint64_t bytes) {
+  unsigned crc = 0;
+  for (std::size_t k = 0; k < k_slice; ++k)
+    crc ^= k_crc16_tables[k][bytes >> (8 * k) & 0xFF];
+  return static_cast<std::uint16_t>(crc);
+}
+
+std::uint64_t load_slice(const unsigned char* bytes) {
+  std::uint64_t value;
+  std::memcpy(&value, bytes, sizeof value);
+  if constexpr (std::endian::native == std::endian::little)
+    value = __builtin_bswap64(value);
+  return value;
+}
 
 }  // namespace
 
 std::uint16_t crc16_add(std::uint16_t crc, const void* bytes,
                         std::size_t size) {
   const auto* byte = static_cast<const unsigned char*>(bytes);
-  for (; size != 0; --size, ++byte)
-    crc = static_cast<std::uint16_t>((crc << 8) ^
-                                     k_crc16_table[(crc >> 8) ^ *byte]);
+  const bool has_slice = size >= k_slice;
+  for (; size >= k_slice; size -= k_slice, byte += k_slice)
+    crc = sum_of_slice(load_slice(byte) ^ std::uint64_t{crc} << 48);
+  if (size >= 2 && has_slice) {
+    // The bytes left, and ahead of them some that are summed up already.
+    const std::size_t bits = 8 * size;
+    const std::uint64_t left =
+        load_slice(byte + size - k_slice) & ((std::uint64_t{1} << bits) - 1);
+    return sum_of_slice(left ^ std::uint64_t{crc} << (bits - 16));
+  }
+  for (; size != 0; --size, ++byte) crc = add_byte(crc, *byte);
   return crc;
 }
 

@@ -1,5 +1,6 @@
 // zxstr.h - zxStr, the library's string: a byte text with shared
-// representation and copy on write.
+// representation and copy on write; zxIStr, its form with room inside the
+// object; the checksum of 16 bits.
 //
 // Differences from std::string:
 //   - copying and passing by value costs a count, not a copy; the characters
@@ -23,8 +24,10 @@
 #ifndef ZXSTR_H
 #define ZXSTR_H
 
+#include <compare>
 #include <cstddef>
 #include <cstdint>
+#include <new>
 #include <string_view>
 
 #include "zxatsys.h"
@@ -38,8 +41,9 @@
 //   | capacity  | refs  | length  | length characters   | NUL | ...
 //   +-----------+-------+---------+---------------------+-----+
 //
-// refs is the number of strings that share the block; 0 marks a block that
-// is not counted and that nobody frees: the shared empty one.
+// refs is the number of strings that share the block.  One holder writes to
+// it in place, several unshare first.  0 marks a block that is not counted
+// and that nobody frees: the shared empty one, and the room inside a zxIStr.
 // Invariant: 0 <= length <= capacity, refs >= 0, a NUL at data[length].
 struct zxStrRep {
   std::int32_t capacity;
@@ -63,8 +67,13 @@ class zxStr {
   zxStr(const char* characters, std::int32_t length);
   explicit zxStr(char byte);
   explicit zxStr(std::string_view text);
-  zxStr(const zxStr& other);
-  zxStr(zxStr&& other) noexcept : zxStr() {
+  zxStr(const zxStr& other) : rep(&zx_empty_rep) {
+    if (other.check() && other.rep->refs > 0 && other.rep->length > 0)
+      share(other);
+    else
+      copy_unshareable(other);
+  }
+  zxStr(zxStr&& other) noexcept : rep(&zx_empty_rep) {
     *this = static_cast<zxStr&&>(other);
   }
   ~zxStr() { release(); }
@@ -91,6 +100,12 @@ class zxStr {
   const char* c_str() const { return rep->data; }
   std::string_view view() const& { return {rep->data, zx_size(rep->length)}; }
   std::string_view view() const&& = delete;
+  operator std::string_view() const& { return view(); }
+  operator std::string_view() const&& = delete;
+  const char* begin() const& { return rep->data; }
+  const char* end() const& { return rep->data + rep->length; }
+  const char* begin() const&& = delete;
+  const char* end() const&& = delete;
 
   // Character i; an index outside 0 to length - 1 fails an assertion.
   char operator[](std::int32_t i) const;
@@ -102,16 +117,24 @@ class zxStr {
   // Checks the representation's invariant, as nearly every operation does
   // first; a broken one fails an assertion.
   bool check() const {
-    return ZX_ASSERT(rep->length >= 0 && rep->length <= rep->capacity &&
-                     rep->refs >= 0 && rep->data[rep->length] == '\0');
+    return ZX_ASSERT((rep->capacity | rep->refs) >= 0 &&
+                     zx_size(rep->length) <= zx_size(rep->capacity) &&
+                     rep->data[rep->length] == '\0');
   }
 
-  // ---- comparing, by length and bytes
+  // ---- comparing: equal are texts of the same length and bytes; the order
+  // is that of the first byte that differs, as an unsigned number, and a text
+  // comes ahead of its continuations.  Null text fails an assertion.
   friend bool operator==(const zxStr& a, const zxStr& b) {
     return b.check() && a.equals(b.c_str(), b.length());
   }
   bool operator==(const char* text) const;
   bool operator==(char byte) const;
+  friend std::strong_ordering operator<=>(const zxStr& a, const zxStr& b) {
+    return b.check() ? a.order(b.rep->data, b.rep->length)
+                     : std::strong_ordering::equal;
+  }
+  std::strong_ordering operator<=>(const char* text) const;
 
   // ---- sizing
   // Makes room for n characters; never gives room back.  Negative n fails an
@@ -134,7 +157,14 @@ class zxStr {
   // ---- appending: in place with room for 64 more when the room is used up;
   // a shared string gets a representation of exactly the new length.  The
   // appended text may be a part of this string.
-  zxStr& append(char byte);
+  zxStr& append(char byte) {
+    if (!check()) return *this;
+    if (rep->refs >= 2 || rep->length >= rep->capacity)
+      return append_growing(byte);
+    rep->data[rep->length] = byte;
+    rep->data[++rep->length] = '\0';
+    return *this;
+  }
   zxStr& append(const char* text);
   zxStr& append(const char* characters, std::int32_t length);
   zxStr& append(const zxStr& other);
@@ -167,9 +197,27 @@ class zxStr {
   // The address that tells which strings share.
   const zxStrRep* representation() const { return rep; }
 
+ protected:
+  // Takes to a representation inside an object; this string is as the default
+  // constructor left it.
+  void use_inner(zxStrRep* inner) { rep = inner; }
+  // Makes an empty string hold characters that fit its own room.
+  void fill_inner(const char* characters, std::int32_t length);
+
  private:
+  friend zxStr zx_joined(zxStr&& a, const char* b, std::int32_t b_length);
+
   bool equals(const char* text, std::int32_t size) const;
-  void release();
+  std::strong_ordering order(const char* text, std::int32_t size) const;
+  void share(const zxStr& other) {
+    rep = other.rep;
+    ++rep->refs;
+  }
+  void copy_unshareable(const zxStr& other);
+  void release() {
+    if (rep->refs != 0 && --rep->refs == 0) zx_realloc(rep, 0);
+  }
+  zxStr& append_growing(char byte);
   bool is_within(const char* place) const;
   void take_exactly(std::int32_t n);
   void resize_block(std::int32_t n);
@@ -185,18 +233,64 @@ static_assert(sizeof(zxStr) == sizeof(void*));
 template <>
 inline constexpr bool zx_relocatable<zxStr> = true;
 
+// A string with room for 100 characters inside the object, for short-lived
+// work: texts within that length cost no allocation.  The inner room is
+// never shared: a zxStr made or assigned from it copies the characters.
+//
+// The text leaves the room when it outgrows it, and when text or a byte is
+// assigned (that rebuilds, as for every string); from then on the object is
+// an ordinary string.  Constructors, assignment from strings of up to 100
+// characters, appended bytes up to a length of 100 and appended texts up to a
+// length of 99 stay inside.
+class zxIStr : public zxStr {
+ public:
+  static constexpr std::int32_t k_room = 100;
+
+  zxIStr() { start_inside(); }
+  zxIStr(const char* text);
+  zxIStr(const char* characters, std::int32_t length);
+  zxIStr(const zxStr& other) {
+    start_inside();
+    zxStr::operator=(other);
+  }
+  zxIStr(const zxIStr& other) : zxIStr(static_cast<const zxStr&>(other)) {}
+  zxIStr(zxIStr&& other) noexcept : zxIStr(static_cast<const zxStr&>(other)) {}
+  ~zxIStr() = default;
+
+  zxIStr& operator=(const zxIStr& other) {
+    zxStr::operator=(other);
+    return *this;
+  }
+  zxIStr& operator=(zxIStr&& other) noexcept {
+    zxStr::operator=(static_cast<zxStr&&>(other));
+    return *this;
+  }
+  using zxStr::operator=;
+
+ private:
+  void start_inside() { use_inner(::new (room) zxStrRep{k_room, 0, 0, {}}); }
+  void start_with(const char* characters, std::int32_t length);
+
+  alignas(zxStrRep) unsigned char room[offsetof(zxStrRep, data) + k_room + 1];
+};
+
 // Concatenation: a new string of exactly the two lengths.  If one side is
 // empty the result shares the other where that is a string; the byte forms
 // never share.
+// A left side that is given up (a + b + c) gives its block to the result.
 zxStr operator+(const zxStr& a, const zxStr& b);
 zxStr operator+(const zxStr& a, const char* b);
-zxStr operator+(const char* a, const zxStr& b);
 zxStr operator+(const zxStr& a, char b);
+zxStr operator+(zxStr&& a, const zxStr& b);
+zxStr operator+(zxStr&& a, const char* b);
+zxStr operator+(zxStr&& a, char b);
+zxStr operator+(const char* a, const zxStr& b);
 zxStr operator+(char a, const zxStr& b);
 
-// The failure entry for texts held in a string.
+// The failure entries for texts held in a string.
 void bail_code(std::int32_t number, const zxStr& text,
                const BailDetail& detail = no_detail);
+void fatal_exit(const zxStr& text);
 
 // The library's checksum of 16 bits: polynomial 0x1021, the highest bit
 // first, from 0xFFFF on, no final inversion.  It is the hash of string keys

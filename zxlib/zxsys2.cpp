@@ -4,6 +4,7 @@
 
 #include "zxbfile.h"
 #include "zxplat.h"
+#include "zxtext.h"
 
 namespace {
 

@@ -153,7 +153,7 @@ TEST(mkvtx_e2e, an_error_in_the_text_writes_nothing) {
   EXPECT_NE(result.out.find(" 1.00 Fatal Error t.txt(4): '1..5' is no number"),
             std::string::npos)
       << result.out;
-  EXPECT_EQ(files_in(folder.path()), (Names{"D4WVTX.BIN", "t.txt"}));
+  EXPECT_EQ(files_in(folder.path()), (Names{"D4WVTX.BIN", "MKVTX.dmp", "t.txt"}));
   EXPECT_EQ(kit::read_file(folder.file("D4WVTX.BIN")), "old");
 }
 
@@ -163,7 +163,7 @@ TEST(mkvtx_e2e, a_text_that_is_not_there_is_an_error) {
   EXPECT_EQ(result.exit_code, 100);
   EXPECT_NE(result.out.find(" Fatal Error 1002: "), std::string::npos)
       << result.out;
-  EXPECT_EQ(files_in(folder.path()), Names());
+  EXPECT_EQ(files_in(folder.path()), Names{"MKVTX.dmp"});
 }
 
 TEST(mkvtx_e2e, a_directory_that_is_not_there_is_an_error) {
@@ -171,7 +171,7 @@ TEST(mkvtx_e2e, a_directory_that_is_not_there_is_an_error) {
   kit::write_file(folder.file("t.txt"), k_good);
   const auto result = run({"mkvtx", "t.txt", "none"}, folder);
   EXPECT_EQ(result.exit_code, 100);
-  EXPECT_EQ(files_in(folder.path()), Names{"t.txt"});
+  EXPECT_EQ(files_in(folder.path()), (Names{"MKVTX.dmp", "t.txt"}));
 }
 
 // The last move fails, when all is written and the data file has its name.
@@ -182,7 +182,7 @@ TEST(mkvtx_e2e, a_move_that_fails_leaves_no_temporary_file) {
   const auto result = run({"mkvtx", "t.txt"}, folder);
   EXPECT_EQ(result.exit_code, 100);
   EXPECT_EQ(files_in(folder.path()),
-            (Names{"D4WVTX.BIN", "D4WVTX.IDX", "t.txt"}));
+            (Names{"D4WVTX.BIN", "D4WVTX.IDX", "MKVTX.dmp", "t.txt"}));
 }
 
 // ---- the examples of the pages

@@ -23,6 +23,7 @@ namespace {
 std::jmp_buf way_out;
 int exit_code_seen = 0;
 std::string printed;
+std::vector<std::string> dumped;
 
 void leave(int code) {
   exit_code_seen = code;
@@ -31,16 +32,25 @@ void leave(int code) {
 
 void catch_print(std::string_view text) { printed += text; }
 
+void catch_dump(std::uint32_t check, const char* text) {
+  EXPECT_EQ(check, 0x1234u);
+  dumped.emplace_back(text);
+}
+
 // Puts the seams in place and takes them out again.  What a statement that
 // is jumped out of had allocated is lost, and no leak of the library.
 class Seams {
  public:
   Seams() {
-    bail_hooks = {[] { return k_shown_path; }, [] { return k_shown_version; },
-                  catch_print};
+    bail_hooks.program_path = [] { return k_shown_path; };
+    bail_hooks.program_name = [] { return k_shown_name; };
+    bail_hooks.program_version = [] { return k_shown_version; };
+    bail_hooks.print = catch_print;
+    bail_hooks.dump = catch_dump;
     bail_wait_seconds = 0;
     zxplat::process.exit = leave;
     printed.clear();
+    dumped.clear();
     exit_code_seen = 0;
     __lsan_disable();
   }
@@ -104,6 +114,7 @@ Failure failure_of(const std::function<void()>& statement) {
   failure.failed = !comes_back(statement);
   failure.exit_code = exit_code_seen;
   failure.screen = printed;
+  failure.dumps = dumped;
   take_apart(failure);
   return failure;
 }

@@ -16,6 +16,7 @@
 
 #include <functional>
 #include <string>
+#include <vector>
 
 namespace kit {
 
@@ -26,10 +27,13 @@ struct Failure {
   std::string message;  // the part behind "Fatal Error "
   std::string line;     // the line in square brackets, with both numbers of
                         // the system replaced by "E"
+  std::vector<std::string> dumps;  // what the stack dumps were told, each of
+                                   // which is left out
 };
 
-// The program path and version that the screen shows in these runs.
+// The program's path, name and version in these runs.
 inline constexpr char k_shown_path[] = "prog";
+inline constexpr char k_shown_name[] = "PROG";
 inline constexpr char k_shown_version[] = "v1";
 
 // Runs a statement up to its end, its failure or its process exit.

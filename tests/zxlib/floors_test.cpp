@@ -30,17 +30,18 @@ constexpr double k_ground = 0;
 constexpr double k_programs = 8;
 const std::map<std::string, double> k_floors = {
     {"zxplat", k_platform}, {"zxmisc", 0},   {"zxatsys", 0},
-    {"zxstkdmp", 0},        {"zxle", 0},     {"zxstr", 1},
-    {"zxqva", 1},           {"zxaa", 1},     {"zxfile", 2},
-    {"zxbfile", 2},         {"zxsys2", 2},   {"zxnextf", 2},
-    {"zxisfile", 2},        {"zxistr", 2},   {"zxdate", 2},
-    {"zxdate2", 2},         {"zxtime", 2},   {"zxsfmt", 3},
-    {"zxregexc", 3},        {"zxregexe", 3}, {"zxstrm", 3},
-    {"zxstrm2", 3},         {"zxp2l", 3},    {"zxstr2", 3},
-    {"zxvar", 3.5},         {"zxmainf", 4},  {"zxpkg", 4},
-    {"zxusage", 4},         {"zxlogf", 5},   {"zxconf", 5},
-    {"zxpack", 5},          {"zxlang", 5},   {"zxexprv3", 6},
-    {"zxvarobj", 6},        {"zxcea", 6},    {"zxzxl", 7},
+    {"zxstkdmp", 0},        {"zxle", 0},     {"zxtext", 0},
+    {"zxstr", 1},           {"zxqva", 1},    {"zxaa", 1},
+    {"zxfile", 2},          {"zxbfile", 2},  {"zxsys2", 2},
+    {"zxnextf", 2},         {"zxisfile", 2}, {"zxistr", 2},
+    {"zxdate", 2},          {"zxdate2", 2},  {"zxtime", 2},
+    {"zxsfmt", 3},          {"zxregexc", 3}, {"zxregexe", 3},
+    {"zxstrm", 3},          {"zxstrm2", 3},  {"zxp2l", 3},
+    {"zxstr2", 3},          {"zxvar", 3.5},  {"zxmainf", 4},
+    {"zxpkg", 4},           {"zxusage", 4},  {"zxlogf", 5},
+    {"zxconf", 5},          {"zxpack", 5},   {"zxlang", 5},
+    {"zxexprv3", 6},        {"zxvarobj", 6}, {"zxcea", 6},
+    {"zxzxl", 7},
 };
 
 // All others in angle brackets are headers of a system, or no part of the

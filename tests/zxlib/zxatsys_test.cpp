@@ -485,15 +485,22 @@ TEST(zxatsys, texts_of_any_length_are_shown_in_bounds) {
 
 // ------------------------------------------ order, clock, guard, by seams --
 
-// Puts recorders in the place of print, clock, sleep and process exit, which
-// comes back here.  Time passes by a millisecond with each look at the clock
-// and by what is slept.
+// Puts recorders in the place of print, dump, boxes, debugger, clock, sleep
+// and process exit, which comes back here.  Time passes by a millisecond with
+// each look at the clock and by what is slept.
 class Recorder {
  public:
   explicit Recorder(std::int64_t start_ms = 0) : now_ms(start_ms) {
     self = this;
-    bail_hooks = {[] { return "path"; }, [] { return "vers"; }, print};
+    bail_hooks.program_path = [] { return "path"; };
+    bail_hooks.program_name = [] { return "NAME"; };
+    bail_hooks.program_version = [] { return "vers"; };
+    bail_hooks.print = print;
+    bail_hooks.dump = dump;
     zxplat::process.exit = leave;
+    zxplat::process.message_box = message_box;
+    zxplat::process.last_words = last_words;
+    zxplat::process.debug_break = debug_break;
     zxplat::process.clock = clock;
     zxplat::process.sleep = sleep;
   }
@@ -520,6 +527,18 @@ class Recorder {
     self->note("print " + std::string(text));
     if (self->at_print) self->at_print();
   }
+  static void dump(std::uint32_t check, const char* message) {
+    EXPECT_EQ(check, 0x1234U);
+    self->note("dump " + std::string(message));
+  }
+  static void message_box(const char* text, const char* caption,
+                          std::uint32_t style) {
+    self->note("box " + std::to_string(style) + " " + caption + ": " + text);
+  }
+  static void last_words(const char* text) {
+    self->note("last words " + std::string(text));
+  }
+  static void debug_break() { self->note("break"); }
   static void leave(int code) {
     self->note("exit " + std::to_string(code));
     if (self->at_exit) self->at_exit();
@@ -544,6 +563,7 @@ std::vector<std::string> events_of_message_12() {
   return {
       "print \r\npath vers Fatal Error 1012: seek: operation failed "
       "[1012-1012-0/0-0/0//]",
+      "dump 1012: seek: operation failed [1012-1012-0/0-0/0//]", "break",
       "print \r\n", "exit 100"};
 }
 
@@ -557,7 +577,8 @@ TEST(zxatsys, a_failure_is_printed_stands_two_seconds_and_ends_the_process) {
     ASSERT_EQ(recorder.events, events_of_message_12());
     const std::int64_t start = (start_ms + 1) / 1000;  // at the first look
     EXPECT_EQ(recorder.event_seconds,
-              (std::vector{start_ms / 1000, start + 2, start + 2}));
+              (std::vector{start_ms / 1000, start_ms / 1000, start_ms / 1000,
+                           start + 2, start + 2}));
     EXPECT_TRUE(recorder.slept) << "a wait that burns the processor";
   }
 }
@@ -568,7 +589,7 @@ TEST(zxatsys, the_wait_is_two_seconds_unless_a_test_shortens_it) {
   bail_wait_seconds = 0;
   bail_code(1012);
   bail_wait_seconds = 2;
-  EXPECT_EQ(recorder.event_seconds, (std::vector<std::int64_t>(3, 1000)));
+  EXPECT_EQ(recorder.event_seconds, (std::vector<std::int64_t>(5, 1000)));
 }
 
 TEST(zxatsys, a_failure_while_one_is_shown_is_dropped) {
@@ -604,7 +625,7 @@ TEST(zxatsys, the_guard_stays_set_behind_a_failure) {
   EXPECT_TRUE(bail_guard);
   bail_code(1013);
   assert_fail(1, "later");
-  EXPECT_EQ(recorder.events.size(), 3U);
+  EXPECT_EQ(recorder.events.size(), 5U);
   EXPECT_TRUE(bail_guard);
 }
 
@@ -629,12 +650,12 @@ TEST(zxatsys, paths_and_versions_of_any_length_are_shown_in_bounds) {
   bail_hooks.program_version = [] { return path.c_str(); };
   zxplat::set_last_error(0);
   bail_code(1012);
-  ASSERT_EQ(recorder.events.size(), 3U);
+  ASSERT_EQ(recorder.events.size(), 5U);
   EXPECT_TRUE(recorder.events[0].starts_with("print \r\npppppppp"));
   EXPECT_TRUE(recorder.events[0].ends_with(
       " Fatal Error 1012: seek: operation failed [1012-1012-0/0-0/0//]"));
-  EXPECT_EQ(recorder.events[1], "print \r\n");
-  EXPECT_EQ(recorder.events[2], "exit 100");
+  EXPECT_EQ(recorder.events[3], "print \r\n");
+  EXPECT_EQ(recorder.events[4], "exit 100");
 }
 
 // ------------------------------------------------------------- assertions --
@@ -684,104 +705,6 @@ TEST(zxatsys, a_dropped_assertion_gives_false) {
     EXPECT_FALSE(ZX_ASSERT_AT(false, "zxsys2", 575));
     EXPECT_TRUE(ZX_ASSERT(true));
   });
-}
-
-// ----------------------------------------------------------- bounded text --
-
-// A buffer of which only the part in the middle may be written to.
-struct Fenced {
-  char before[8];
-  char room[8];
-  char behind[8];
-
-  Fenced() { std::fill_n(before, sizeof *this, '#'); }
-  bool is_intact() const {
-    return std::string_view(before, 8) == "########" &&
-           std::string_view(behind, 8) == "########";
-  }
-};
-
-TEST(zxatsys, text_that_does_not_fit_is_cut) {
-  const struct {
-    std::size_t size;
-    const char* pieces[3];
-    const char* text;
-  } rows[] = {
-      {1, {"", "", ""}, ""},
-      {1, {"a", "bc", ""}, ""},
-      {2, {"a", "bc", ""}, "a"},
-      {2, {"abc", "", ""}, "a"},
-      {8, {"abc", "def", ""}, "abcdef"},
-      {8, {"abc", "def", "g"}, "abcdefg"},
-      {8, {"abc", "def", "gh"}, "abcdefg"},
-      {8, {"abcdefg", "h", "i"}, "abcdefg"},
-      {8, {"abcdefgh", "i", ""}, "abcdefg"},
-  };
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.text);
-    Fenced fenced;
-    zxText text(std::span(fenced.room, row.size));
-    EXPECT_EQ(text.view(), "");
-    for (const char* piece : row.pieces) text.add(piece);
-    EXPECT_EQ(text.view(), row.text);
-    EXPECT_EQ(text.length(), std::string_view(row.text).size());
-    EXPECT_STREQ(fenced.room, row.text);
-    EXPECT_TRUE(fenced.is_intact());
-  }
-}
-
-TEST(zxatsys, text_begins_behind_what_stays_of_the_buffer) {
-  const struct {
-    std::size_t length;
-    const char* text;
-  } rows[] = {
-      {0, "xy"},      {1, "axy"},     {5, "abcdexy"}, {6, "abcdefx"},
-      {7, "abcdefg"}, {8, "abcdefg"}, {9, "abcdefg"}, {SIZE_MAX, "abcdefg"},
-  };
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.length);
-    Fenced fenced;
-    std::copy_n("abcdefgh", 8, fenced.room);
-    zxText text(fenced.room, row.length);
-    text.add("xy");
-    EXPECT_EQ(text.view(), row.text);
-    EXPECT_STREQ(fenced.room, row.text);
-    EXPECT_TRUE(fenced.is_intact());
-  }
-}
-
-TEST(zxatsys, text_can_be_cut_to_a_number_of_bytes) {
-  char room[32];
-  zxText text(room);
-  text.add("abcdef", 3);
-  text.add("ghi", 3);
-  text.add("jk", 3);
-  text.add("lost", 0);
-  EXPECT_EQ(text.view(), "abcghijk");
-}
-
-TEST(zxatsys, text_takes_numbers) {
-  char room[64];
-  zxText text(room);
-  for (const std::int32_t number : {0, -1, 42, INT32_MAX, INT32_MIN}) {
-    text.add_int(number);
-    text.add(" ");
-  }
-  EXPECT_EQ(text.view(), "0 -1 42 2147483647 -2147483648 ");
-  Fenced fenced;
-  zxText cut(fenced.room);
-  cut.add_int(INT32_MIN);
-  EXPECT_EQ(cut.view(), "-214748");
-  EXPECT_TRUE(fenced.is_intact());
-}
-
-TEST(zxatsys, text_takes_nul_bytes_and_views_of_nothing) {
-  char room[16];
-  zxText text(room);
-  text.add(std::string_view());
-  text.add("a\0b"sv);
-  text.add(std::string_view(), 5);
-  EXPECT_EQ(text.view(), "a\0b"sv);
 }
 
 // --------------------------------------------------------- the real thing --

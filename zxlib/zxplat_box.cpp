@@ -1,0 +1,68 @@
+// zxplat_box.cpp - message boxes that are written instead of shown.
+// Tested by tests/zxlib/zxplat_test.cpp.
+
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+
+#include "zxplat.h"
+#include "zxplat_impl.h"
+
+namespace zxplat::common {
+namespace {
+
+void write_all(Fd fd, std::string_view text) {
+  while (!text.empty()) {
+    const std::int64_t done = files.write(fd, text.data(), text.size());
+    if (done <= 0) return;
+    text.remove_prefix(static_cast<std::size_t>(done));
+  }
+}
+
+// "0x" and at least four digits, as styles are usually written.
+std::string_view in_hexadecimal(std::uint32_t number, char (&room)[10]) {
+  char* at = std::end(room);
+  for (int digits = 0; digits < 4 || number != 0; ++digits, number >>= 4)
+    *--at = "0123456789abcdef"[number & 0xF];
+  *--at = 'x';
+  *--at = '0';
+  return {at, static_cast<std::size_t>(std::end(room) - at)};
+}
+
+}  // namespace
+
+BoxText::BoxText(const char* text, const char* caption, std::uint32_t style) {
+  char style_room[10];
+  for (const std::string_view piece :
+       {std::string_view(caption), in_hexadecimal(style, style_room),
+        std::string_view(text)}) {
+    add(piece);
+    add("\n");
+  }
+}
+
+void BoxText::add(std::string_view piece) {
+  const std::size_t size = std::min(piece.size(), sizeof room - used);
+  std::memcpy(room + used, piece.data(), size);
+  used += size;
+}
+
+void write_to_standard_error(std::string_view text) {
+  write_all(k_stderr_fd, text);
+}
+
+bool divert_box(std::string_view text) {
+  const char* place = std::getenv("ZX_BOX_OUT");
+  if (place == nullptr || *place == '\0') return false;
+  if (std::string_view(place) == "-") {
+    write_to_standard_error(text);
+    return true;
+  }
+  const Fd fd = files.open(place, OpenMode::append);
+  if (fd == k_no_fd) return false;
+  write_all(fd, text);
+  files.close(fd);
+  return true;
+}
+
+}  // namespace zxplat::common
