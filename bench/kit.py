@@ -12,10 +12,19 @@ Whole processes are measured like this:
     run_rounds([ours, peer], 9, check)
     row = compared("tool, s", ours, peer, firm=0.3)
 
+Functions are measured by a program with Google Benchmark, whose benchmarks
+are named WHAT/SIDE or WHAT/SIDE/SIZE, SIDE being "ours" or "peer":
+
+    program = GoogleBenchmark("bench_x", bench, 9)
+    row = program.compared("copy of 30 bytes, ns", "copy/30", "std::string",
+                           firm=0.2)
+
 All paths are relative to the project's root, which is the current folder.
 """
 
+import json
 import os
+import re
 import shutil
 import statistics
 import subprocess
@@ -24,6 +33,7 @@ from dataclasses import dataclass
 
 OUTPUT = "build/bench"
 PROGRAMS = "build/native/bin"
+BENCH_PROGRAMS = "build/bench-native/bin"
 
 
 class Failure(Exception):
@@ -145,3 +155,106 @@ def compile_c(source, program):
     done = subprocess.run(["cc", "-O2", "-o", program, source], check=False)
     if done.returncode != 0:
         raise Failure("%s does not compile" % source)
+
+
+# -------------------------------------------------------------- functions
+
+# If set, only those rows are measured in whose WHAT or WHAT/SIZE this pattern
+# is found; with a minus ahead of it, only those in which it isn't.
+FILTER_VARIABLE = "BENCH_FILTER"
+
+NANOSECONDS = {"ns": 1.0, "us": 1e3, "ms": 1e6, "s": 1e9}
+
+
+class GoogleBenchmark:
+    """A program with the benchmarks of both sides of its rows.
+
+    Each row has a process of its own: how the heap gets large blocks from
+    the system, and when it gives them back, hangs on what was freed before.
+    In it the repetitions of both sides come in random order, so that what
+    slows the machine for a while does not meet one side alone."""
+
+    PACKAGES = {"libbenchmark-dev": "/usr/include/benchmark/benchmark.h"}
+
+    def __init__(self, name, bench, repetitions, seconds=0.1):
+        self.path = BENCH_PROGRAMS + "/" + name
+        self.folder = bench.folder
+        self.repetitions, self.seconds = repetitions, seconds
+        bench.notes.append(
+            "medians of the processor time of %d repetitions of %g s or more"
+            % (repetitions, seconds))
+
+    def compared(self, name, what, peer, firm=None, aim=None, needs=None):
+        """The row of the benchmarks WHAT/ours and WHAT/peer, or for a `what`
+        with a size in it of WHAT/ours/SIZE and WHAT/peer/SIZE. `needs` are
+        the peer's packages, as PACKAGES of a group: without them the row is
+        skipped."""
+        for package, file in {**self.PACKAGES, **(needs or {})}.items():
+            if not is_there(file):
+                return skipped(name, peer, package, firm, aim)
+        if not is_wanted(what):
+            return Row(name, None, peer, "left out", None, firm, aim)
+        sides = [with_side(what, side) for side in ("ours", "peer")]
+        figures = self.measure(sides, what.replace("/", "_"))
+        ours, theirs = [figures[side] for side in sides]
+        return Row(name, ours, peer, theirs, ours / theirs, firm, aim)
+
+    def measure(self, names, file_name):
+        """{name: nanoseconds per operation}"""
+        if not is_there(self.path):
+            raise Failure("%s is not there; ./dev bench builds it" % self.path)
+        output = "%s/%s.json" % (self.folder, file_name)
+        done = subprocess.run(self.command(names, output), check=False,
+                              text=True, stdout=subprocess.PIPE,
+                              stderr=subprocess.STDOUT)
+        if done.returncode != 0:
+            raise Failure("%s failed: exit code %d\n%s" % (
+                self.path, done.returncode, done.stdout))
+        figures = medians(runs_of(output))
+        for name in names:
+            if name not in figures:
+                raise Failure("%s has no benchmark %s" % (self.path, name))
+        return figures
+
+    def command(self, names, output):
+        return [self.path,
+                "--benchmark_filter=^(%s)(/iterations:[0-9]+)?$"
+                % "|".join(names),
+                "--benchmark_repetitions=%d" % self.repetitions,
+                "--benchmark_min_time=%g" % self.seconds,
+                "--benchmark_enable_random_interleaving=true",
+                "--benchmark_out_format=json",
+                "--benchmark_out=" + output]
+
+
+def is_wanted(what):
+    pattern = os.environ.get(FILTER_VARIABLE, "")
+    if pattern.startswith("-"):
+        return not re.search(pattern[1:], what)
+    return bool(re.search(pattern, what))
+
+
+def with_side(what, side):
+    stem, slash, size = what.partition("/")
+    return stem + "/" + side + slash + size
+
+
+def runs_of(report):
+    """An empty list if no benchmark ran: then the report is an empty file."""
+    with open(report, encoding="utf-8") as file:
+        text = file.read()
+    return json.loads(text)["benchmarks"] if text else []
+
+
+def medians(runs):
+    """{benchmark: nanoseconds per operation}, of a report's repetitions."""
+    figures = {}
+    for run in runs:
+        if run.get("error_occurred"):
+            raise Failure("%s: %s" % (run["name"], run["error_message"]))
+        if run["run_type"] == "iteration":
+            name = run["run_name"].partition("/iterations:")[0]
+            time = run["cpu_time"] * NANOSECONDS[run["time_unit"]]
+            figures.setdefault(name, []).append(
+                time / run.get("operations", 1))
+    return {name: statistics.median(times) for name, times in figures.items()}

@@ -2,6 +2,7 @@
 // Tests: tests/zxlib/zxmisc_test.cpp.
 #include "zxmisc.h"
 
+#include <cstdlib>
 #include <cstring>
 
 #include "zxatsys.h"
@@ -41,6 +42,7 @@ constexpr std::uint32_t k_box_style = 0;
 // No caller can go on without the block, not even while another failure is
 // being handled.
 [[gnu::cold]] void fail_for_memory() {
+  zxplat::set_last_error(zxplat::k_err_no_memory);
   bail_code(2000);
   zxplat::process.exit_at_once(k_exit_failure);
 }
@@ -57,10 +59,14 @@ constinit bool zx_is_started = false;
 constinit zxReallocFunction zx_realloc = zx_heap_realloc;
 
 void* zx_heap_realloc(void* block, std::size_t size) {
+  if (size == 0) {
+    std::free(block);
+    return nullptr;
+  }
   if (!zx_is_started && (traits & k_trait_executable) == 0) [[unlikely]]
     fail_for_early_use();
-  void* result = zxplat::heap_realloc(block, size);
-  if (result == nullptr && size != 0) [[unlikely]]
+  void* result = block ? std::realloc(block, size) : std::malloc(size);
+  if (result == nullptr) [[unlikely]]
     fail_for_memory();
   return result;
 }

@@ -172,4 +172,10 @@ constexpr std::size_t zx_size(std::int32_t count) {
   return static_cast<std::size_t>(count);
 }
 
+// The same for sums that must not overflow.  The detour over an unsigned
+// number saves the extension of the sign, which is slow behind a store.
+constexpr std::int64_t zx_wide(std::int32_t count) {
+  return static_cast<std::int64_t>(static_cast<std::uint32_t>(count));
+}
+
 #endif  // ZXMISC_H

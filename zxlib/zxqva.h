@@ -73,7 +73,7 @@ class zxQVA {
 
   // Element i, or the shared empty value when there is none.
   const T& get_or(std::int32_t i) const {
-    return check() && i >= 0 && i < count ? first[i] : zx_empty_value<T>;
+    return check() && zx_wide(i) < count ? first[i] : zx_empty_value<T>;
   }
 
   // Element i for writing; the array grows to hold it.  A negative index
@@ -92,13 +92,12 @@ class zxQVA {
 
   // ---- the end: an empty array fails an assertion in drop and pop
   void append(const T& value) {
-    if (!check()) return;
-    if (offset + count < capacity) [[likely]] {
-      ::new (static_cast<void*>(first + count)) T(value);
-      ++count;
-    } else {
-      append_growing(value);
-    }
+    // Kept aside, since the element that is stored could be a count as well.
+    const std::int32_t n = count;
+    if (!has_room_behind(n)) [[unlikely]]
+      return append_growing(value);
+    ::new (static_cast<void*>(first + zx_wide(n))) T(value);
+    count = n + 1;
   }
 
   void drop_last() {
@@ -191,10 +190,18 @@ class zxQVA {
 
   static T& scratch() { return zx_scratch_value<T>(); }
 
-  bool check() const {
-    return ZX_ASSERT((capacity | count | offset) >= 0 &&
-                     std::int64_t{offset} + count <= capacity &&
-                     (capacity == 0 || first == base + offset));
+  // The invariant.  A negative number counts as one beyond every capacity.
+  bool is_sound() const {
+    return zx_wide(offset) + zx_wide(count) <= capacity &&
+           (capacity == 0 || first == base + zx_wide(offset));
+  }
+  bool check() const { return ZX_ASSERT(is_sound()); }
+
+  // The invariant of an array of n elements, and room for one more.
+  bool has_room_behind(std::int32_t n) const {
+    if (zx_wide(offset) + zx_wide(n) >= capacity) [[unlikely]]
+      return false;
+    return __builtin_expect(first == base + zx_wide(offset), true);
   }
 
   void leave_first() {
@@ -205,13 +212,14 @@ class zxQVA {
   }
 
   bool is_live(std::int32_t i) const {
-    return check() && ZX_ASSERT(i >= 0 && i < count);
+    return check() && ZX_ASSERT(zx_wide(i) < count);
   }
 
   bool has_elements() const { return check() && ZX_ASSERT(count > 0); }
 
   // The value is copied first: the block may move under it.
   [[gnu::noinline]] void append_growing(T value) {
+    if (!check()) return;
     const std::int32_t i = count;
     grow_to(i);
     if (i < count) first[i] = std::move(value);

@@ -6,7 +6,6 @@
 #include <bit>
 #include <climits>
 #include <cstring>
-#include <utility>
 
 namespace {
 
@@ -92,13 +91,19 @@ void zxStr::clear() {
 
 // ---- making and assigning
 
-zxStr::zxStr(const char* text)
-    : zxStr(text, text != nullptr ? zx_count(std::strlen(text)) : 0) {}
-
-zxStr::zxStr(const char* characters, std::int32_t length) : zxStr() {
+// The first block of a string.
+inline void zxStr::start(const char* characters, std::int32_t length) {
   if (!ZX_ASSERT(characters != nullptr && length >= 0)) return;
   rep = new_block(length);
   fill(rep, characters, length, nullptr, 0);
+}
+
+zxStr::zxStr(const char* text) : zxStr() {
+  start(text, text != nullptr ? zx_count(std::strlen(text)) : 0);
+}
+
+zxStr::zxStr(const char* characters, std::int32_t length) : zxStr() {
+  start(characters, length);
 }
 
 zxStr::zxStr(char byte) : zxStr(&byte, 1) {}
@@ -291,6 +296,7 @@ void zxStr::sync_length() {
 // ---- appending
 
 zxStr& zxStr::append_growing(char byte) {
+  if (!check()) return *this;
   const std::int32_t old_length = rep->length;
   if (rep->refs >= 2) {
     build(rep->data, old_length, &byte, 1);
@@ -409,29 +415,13 @@ std::int32_t zxStr::to_int() const {
 
 // ---- concatenation
 
-namespace {
-
-zxStr joined(const char* a, std::int32_t a_length, const char* b,
-             std::int32_t b_length) {
+zxStr zxStr::joined(const char* a, std::int32_t a_length, const char* b,
+                    std::int32_t b_length) {
   zxStr result;
-  result.build(a, a_length, b, b_length);
-  return result;
-}
-
-}  // namespace
-
-// The block of `a` becomes the result's where it is its alone and has no room
-// to spare, since the result takes exactly what it needs.
-zxStr zx_joined(zxStr&& a, const char* b, std::int32_t b_length) {
-  const std::int32_t sum = sum_of(a.length(), b_length);
-  if (a.rep->refs != 1 || sum < a.rep->capacity || a.is_within(b))
-    return joined(a.c_str(), a.length(), b, b_length);
-  zxStr result;
-  std::swap(result.rep, a.rep);
-  if (result.rep->capacity != sum) result.resize_block(sum);
-  std::memcpy(result.rep->data + result.rep->length, b, zx_size(b_length));
-  result.rep->length = sum;
-  result.rep->data[sum] = '\0';
+  const std::int32_t sum = sum_of(a_length, b_length);
+  if (!ZX_ASSERT((a_length | b_length | sum) >= 0)) return result;
+  result.rep = new_block(sum);
+  fill(result.rep, a, a_length, b, b_length);
   return result;
 }
 
@@ -439,47 +429,29 @@ zxStr operator+(const zxStr& a, const zxStr& b) {
   if (!a.check() || !b.check()) return {};
   if (a.length() == 0) return b;
   if (b.length() == 0) return a;
-  return joined(a.c_str(), a.length(), b.c_str(), b.length());
+  return zxStr::joined(a.c_str(), a.length(), b.c_str(), b.length());
 }
 
 zxStr operator+(const zxStr& a, const char* b) {
   if (!a.check()) return {};
   if (!ZX_ASSERT(b != nullptr) || *b == '\0') return a;
-  return joined(a.c_str(), a.length(), b, zx_count(std::strlen(b)));
-}
-
-zxStr operator+(const zxStr& a, char b) {
-  if (!a.check()) return {};
-  return joined(a.c_str(), a.length(), &b, 1);
-}
-
-zxStr operator+(zxStr&& a, const zxStr& b) {
-  if (!a.check() || !b.check()) return {};
-  if (a.length() == 0) return b;
-  if (b.length() == 0) return a;
-  return zx_joined(static_cast<zxStr&&>(a), b.c_str(), b.length());
-}
-
-zxStr operator+(zxStr&& a, const char* b) {
-  if (!a.check()) return {};
-  if (!ZX_ASSERT(b != nullptr) || *b == '\0') return a;
-  return zx_joined(static_cast<zxStr&&>(a), b, zx_count(std::strlen(b)));
-}
-
-zxStr operator+(zxStr&& a, char b) {
-  if (!a.check()) return {};
-  return zx_joined(static_cast<zxStr&&>(a), &b, 1);
+  return zxStr::joined(a.c_str(), a.length(), b, zx_count(std::strlen(b)));
 }
 
 zxStr operator+(const char* a, const zxStr& b) {
   if (!b.check()) return {};
   if (!ZX_ASSERT(a != nullptr) || *a == '\0') return b;
-  return joined(a, zx_count(std::strlen(a)), b.c_str(), b.length());
+  return zxStr::joined(a, zx_count(std::strlen(a)), b.c_str(), b.length());
+}
+
+zxStr operator+(const zxStr& a, char b) {
+  if (!a.check()) return {};
+  return zxStr::joined(a.c_str(), a.length(), &b, 1);
 }
 
 zxStr operator+(char a, const zxStr& b) {
   if (!b.check()) return {};
-  return joined(&a, 1, b.c_str(), b.length());
+  return zxStr::joined(&a, 1, b.c_str(), b.length());
 }
 
 void bail_code(std::int32_t number, const zxStr& text,

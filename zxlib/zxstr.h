@@ -116,11 +116,7 @@ class zxStr {
 
   // Checks the representation's invariant, as nearly every operation does
   // first; a broken one fails an assertion.
-  bool check() const {
-    return ZX_ASSERT((rep->capacity | rep->refs) >= 0 &&
-                     zx_size(rep->length) <= zx_size(rep->capacity) &&
-                     rep->data[rep->length] == '\0');
-  }
+  bool check() const { return ZX_ASSERT(is_sound(*rep)); }
 
   // ---- comparing: equal are texts of the same length and bytes; the order
   // is that of the first byte that differs, as an unsigned number, and a text
@@ -158,11 +154,14 @@ class zxStr {
   // a shared string gets a representation of exactly the new length.  The
   // appended text may be a part of this string.
   zxStr& append(char byte) {
-    if (!check()) return *this;
-    if (rep->refs >= 2 || rep->length >= rep->capacity)
+    zxStrRep& r = *rep;
+    const std::int32_t n = r.length;
+    if (!is_sound(r) || r.refs >= 2 || n >= r.capacity) [[unlikely]]
       return append_growing(byte);
-    rep->data[rep->length] = byte;
-    rep->data[++rep->length] = '\0';
+    char* end = r.data + zx_wide(n);
+    end[0] = byte;
+    end[1] = '\0';
+    r.length = n + 1;
     return *this;
   }
   zxStr& append(const char* text);
@@ -205,14 +204,26 @@ class zxStr {
   void fill_inner(const char* characters, std::int32_t length);
 
  private:
-  friend zxStr zx_joined(zxStr&& a, const char* b, std::int32_t b_length);
+  friend zxStr operator+(const zxStr& a, const zxStr& b);
+  friend zxStr operator+(const zxStr& a, const char* b);
+  friend zxStr operator+(const char* a, const zxStr& b);
+  friend zxStr operator+(const zxStr& a, char b);
+  friend zxStr operator+(char a, const zxStr& b);
 
+  static zxStr joined(const char* a, std::int32_t a_length, const char* b,
+                      std::int32_t b_length);
+  // A negative length counts as one beyond every capacity.
+  static bool is_sound(const zxStrRep& r) {
+    return (r.capacity | r.refs) >= 0 && zx_wide(r.length) <= r.capacity &&
+           r.data[zx_wide(r.length)] == '\0';
+  }
   bool equals(const char* text, std::int32_t size) const;
   std::strong_ordering order(const char* text, std::int32_t size) const;
   void share(const zxStr& other) {
     rep = other.rep;
     ++rep->refs;
   }
+  void start(const char* characters, std::int32_t length);
   void copy_unshareable(const zxStr& other);
   void release() {
     if (rep->refs != 0 && --rep->refs == 0) zx_realloc(rep, 0);
@@ -277,13 +288,9 @@ class zxIStr : public zxStr {
 // Concatenation: a new string of exactly the two lengths.  If one side is
 // empty the result shares the other where that is a string; the byte forms
 // never share.
-// A left side that is given up (a + b + c) gives its block to the result.
 zxStr operator+(const zxStr& a, const zxStr& b);
 zxStr operator+(const zxStr& a, const char* b);
 zxStr operator+(const zxStr& a, char b);
-zxStr operator+(zxStr&& a, const zxStr& b);
-zxStr operator+(zxStr&& a, const char* b);
-zxStr operator+(zxStr&& a, char b);
 zxStr operator+(const char* a, const zxStr& b);
 zxStr operator+(char a, const zxStr& b);
 

@@ -1,5 +1,7 @@
 // zxatsys_test.cpp - tests of zxlib/zxatsys.h, zxatsys_impl.h, zxatsys.cpp and
-// zxatsys_messages.cpp: message, diagnostic line, process end.
+// zxatsys_messages.cpp: message, diagnostic line, process end.  Hooks, boxes
+// and emergencies are in zxatsys_road_test.cpp, faults in
+// zxatsys_faults_test.cpp, the printed report in zxatsys_report_test.cpp.
 
 #include "zxatsys.h"
 
@@ -19,11 +21,15 @@
 
 #include "kit/cases.h"
 #include "kit/failure.h"
+#include "kit/tempdir.h"
 #include "zxatsys_impl.h"
+#include "zxlib/failure_road.h"
 #include "zxplat.h"
+#include "zxsfmt.h"
 
 namespace {
 
+using failure_road::Recorder;
 using namespace std::string_literals;
 using namespace std::string_view_literals;
 
@@ -457,6 +463,68 @@ TEST(zxatsys, texts_of_ten_thousand_bytes_are_shown_whole) {
                 "[1010-1010-7/0-0/0/xxxxxxxxxxxx/dddddddddddddddddd]\r\n");
 }
 
+TEST(zxatsys, an_empty_format_is_an_empty_message) {
+  EXPECT_EQ(screen_of(0, [] { bailf(""); }),
+            "\r\nprog v1 Fatal Error  [0-0-0/0-0/0//]\r\n");
+}
+
+// The line is empty then, and what stands between it and the message is
+// there all the same.
+TEST(zxatsys, a_message_that_begins_with_an_equals_sign_has_no_line) {
+  const struct {
+    std::int32_t number;
+    const char* text;
+    BailDetail detail;
+    std::string message;
+  } rows[] = {
+      {1200, nullptr, {}, "1200:  user break"},
+      {1200, "unused", {}, "1200:  user break"},
+      {1200, nullptr, {7, "why"}, "1200:  user break (7: why)"},
+      {1200, nullptr, {-1}, "1200:  user break (-1)"},
+      {0, "=abc", {}, " abc"},
+      {0, "=", {}, " "},
+      {0, "==", {}, " ="},
+      {0, "=", {7}, "  (7)"},
+      {0, "=", {0, "=why"}, "  (=why)"},
+      {0, "=[0-0-0/0-0/0//]", {}, " [0-0-0/0-0/0//]"},
+      {9999, "=abc", {}, "9999:  abc"},
+      {-1, "=%s", {}, "-1:  %s"},
+      // A row that begins with its text.
+      {3100,
+       "=abc",
+       {},
+       "3100:  abc (\225\201\205\227) \204\214\201\210 "
+       "\204\200\226\216\220 \200\214"},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.message);
+    const kit::Failure failure =
+        kit::failure_of([&] { bail_code(row.number, row.text, row.detail); });
+    EXPECT_EQ(failure.exit_code, 100);
+    EXPECT_EQ(failure.screen,
+              "\r\nprog v1 Fatal Error " + row.message + " \r\n");
+    EXPECT_EQ(failure.dumps, std::vector{row.message + " "});
+  }
+}
+
+TEST(zxatsys, an_equals_sign_elsewhere_means_nothing) {
+  EXPECT_FAILURE(bail_code(0, " =abc"), " =abc", "[0-0-0/E-0/E/ =abc/]");
+  EXPECT_FAILURE(bail_code(0, nullptr, BailDetail(0, "=abc")), "0:! (=abc)",
+                 "[0-0-0/E-0/E//=abc]");
+  EXPECT_FAILURE(bail_code(9999, nullptr, BailDetail(0, "=abc")),
+                 "9999:  (=abc)", "[9999-9999-0/E-0/E//=abc]");
+  EXPECT_FAILURE(bail_code(2006, "=abc"), "2006: fmt err (=abc)",
+                 "[2006-2006-0/E-0/E/=abc/]");
+}
+
+TEST(zxatsys, an_empty_line_goes_behind_65_bytes_on_a_line_of_its_own) {
+  const std::string text(64, 'x');  // and a blank
+  EXPECT_EQ(screen_of(0, [&] { bail_code(0, ("=" + text.substr(1)).c_str()); }),
+            "\r\nprog v1 Fatal Error  " + text.substr(1) + " \r\n");
+  EXPECT_EQ(screen_of(0, [&] { bail_code(0, ("=" + text).c_str()); }),
+            "\r\nprog v1 Fatal Error  " + text + "\r\n           \r\n");
+}
+
 // However much of the message is lost, what is shown of it is right and the
 // line stands behind it.
 TEST(zxatsys, texts_of_any_length_are_shown_in_bounds) {
@@ -484,80 +552,6 @@ TEST(zxatsys, texts_of_any_length_are_shown_in_bounds) {
 }
 
 // ------------------------------------------ order, clock, guard, by seams --
-
-// Puts recorders in the place of print, dump, boxes, debugger, clock, sleep
-// and process exit, which comes back here.  Time passes by a millisecond with
-// each look at the clock and by what is slept.
-class Recorder {
- public:
-  explicit Recorder(std::int64_t start_ms = 0) : now_ms(start_ms) {
-    self = this;
-    bail_hooks.program_path = [] { return "path"; };
-    bail_hooks.program_name = [] { return "NAME"; };
-    bail_hooks.program_version = [] { return "vers"; };
-    bail_hooks.print = print;
-    bail_hooks.dump = dump;
-    zxplat::process.exit = leave;
-    zxplat::process.message_box = message_box;
-    zxplat::process.last_words = last_words;
-    zxplat::process.debug_break = debug_break;
-    zxplat::process.clock = clock;
-    zxplat::process.sleep = sleep;
-  }
-  ~Recorder() {
-    bail_hooks = old_hooks;
-    zxplat::process = old_process;
-    bail_guard = false;
-  }
-  Recorder(const Recorder&) = delete;
-  Recorder& operator=(const Recorder&) = delete;
-
-  std::vector<std::string> events;
-  std::vector<std::int64_t> event_seconds;
-  std::function<void()> at_print;
-  std::function<void()> at_exit;
-  bool slept = false;
-
- private:
-  void note(const std::string& event) {
-    events.push_back(event);
-    event_seconds.push_back(now_ms / 1000);
-  }
-  static void print(std::string_view text) {
-    self->note("print " + std::string(text));
-    if (self->at_print) self->at_print();
-  }
-  static void dump(std::uint32_t check, const char* message) {
-    EXPECT_EQ(check, 0x1234U);
-    self->note("dump " + std::string(message));
-  }
-  static void message_box(const char* text, const char* caption,
-                          std::uint32_t style) {
-    self->note("box " + std::to_string(style) + " " + caption + ": " + text);
-  }
-  static void last_words(const char* text) {
-    self->note("last words " + std::string(text));
-  }
-  static void debug_break() { self->note("break"); }
-  static void leave(int code) {
-    self->note("exit " + std::to_string(code));
-    if (self->at_exit) self->at_exit();
-  }
-  static std::int64_t clock() {
-    self->now_ms += 1;
-    return self->now_ms / 1000;
-  }
-  static void sleep(std::uint32_t milliseconds) {
-    self->now_ms += milliseconds;
-    self->slept = true;
-  }
-
-  static Recorder* self;
-  std::int64_t now_ms;
-  BailHooks old_hooks = bail_hooks;
-  zxplat::ProcessCalls old_process = zxplat::process;
-};
-Recorder* Recorder::self = nullptr;
 
 std::vector<std::string> events_of_message_12() {
   return {
@@ -722,7 +716,10 @@ bool fail_early() {
 
 TEST(zxatsys, a_failure_ahead_of_start_up_is_shown_and_ends_the_process) {
   const auto start = std::chrono::steady_clock::now();
-  const kit::ProcessResult result = kit::run_case(k_early_case);
+  const kit::TempDir folder;  // for the stack dump
+  kit::ProcessOptions options;
+  options.directory = folder.path();
+  const kit::ProcessResult result = kit::run_case(k_early_case, {}, options);
   const auto took = std::chrono::steady_clock::now() - start;
   EXPECT_FALSE(result.timed_out);
   EXPECT_EQ(result.exit_code, 100);
