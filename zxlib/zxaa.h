@@ -5,7 +5,8 @@
 // Entries lie inline in one block, without nodes or tombstones.  A new entry
 // takes the first free slot from its home slot on, which the key's hash
 // gives; iteration goes by slot, so its order follows the hash, and any growth
-// or removal changes it.
+// or removal changes it.  (How look-ups go without slots, and when the order
+// is worked out, is told in zxaa_impl.h.)
 //
 // Capacities go 64, 128 ... 1024 and on in steps of 1024; the table grows
 // when it is filled to four fifths.  ref() grows ahead of its insertion,
@@ -40,9 +41,9 @@
 #include "zxqva.h"
 #include "zxstr.h"
 
-// hash() decides the home slot, and with it the order of the entries.  A key
+// hash() decides the home slot, and with it the order of entries.  A key
 // type with a cheap hash of good quality can offer it as find_hash(), which
-// look-ups then use.
+// look-ups then use; and a comparison better than == as same().
 template <class K>
 struct zxKeyTraits;
 
@@ -56,6 +57,10 @@ struct zxKeyTraits<zxStr> {
   }
   static std::uint32_t find_hash(const zxStr& key) {
     return zxaa_impl::hash_of_bytes(key.c_str(), zx_size(key.length()));
+  }
+  static bool same(const zxStr& key, std::string_view text) {
+    return zx_size(key.length()) == text.size() &&
+           zxaa_impl::same_bytes(key.c_str(), text.data(), text.size());
   }
 };
 
@@ -129,7 +134,7 @@ class zxAA {
     grow(0);
     const Place place = place_of(key);
     if (place.entry != nullptr) return place.entry->value;
-    Entry* entry = take_slot(place, key);
+    Entry* entry = add_entry(place, key);
     if (entry == nullptr) return zx_scratch_value<V>();
     return *::new (static_cast<void*>(&entry->value)) V();
   }
@@ -143,7 +148,7 @@ class zxAA {
       place.entry->value = value;
       return;
     }
-    Entry* entry = take_slot(place, key);
+    Entry* entry = add_entry(place, key);
     if (entry == nullptr) return;
     ::new (static_cast<void*>(&entry->value)) V(value);
     grow(0);
@@ -154,21 +159,19 @@ class zxAA {
     if (!check_with(key)) return;
     const Place place = place_of(key);
     if (place.entry == nullptr) return bail_code(2204);
+    const auto number = static_cast<std::int32_t>(place.entry - table);
+    work_out_order();
+    header().order.remove(number);
     header().index.remove(place.cell);
-    place.entry->value.~V();
-    place.entry->key.~K();
+    destroy(*place.entry);
+    if (number != count - 1) move_last_to(number);
     --count;
-    close_gap(static_cast<std::int32_t>(place.entry - table));
   }
 
   // Empties the table and gives its block back.
   void clear() {
-    for (std::int32_t i = 0; i < capacity; ++i) {
-      if (is_empty(table[i])) continue;
-      table[i].value.~V();
-      table[i].key.~K();
-    }
-    if (table != nullptr) zx_realloc(block_of(table), 0);
+    for (std::int32_t i = 0; i < count; ++i) destroy(table[i]);
+    if (table != nullptr) zx_realloc(&header(), 0);
     table = nullptr;
     capacity = count = 0;
     mask = 0;
@@ -181,7 +184,7 @@ class zxAA {
     if (std::int64_t{count} + count / 4 < capacity) return;
     const std::int64_t size = next_size(wanted);
     if (size >= k_limit) return bail_code(2201);
-    rehash(static_cast<std::int32_t>(size));
+    resize(static_cast<std::int32_t>(size));
   }
 
   // ---- iteration over the entries, by slot
@@ -196,10 +199,12 @@ class zxAA {
   using iterator = Iterator<V>;
   using const_iterator = Iterator<const V>;
 
-  iterator begin() & { return {table, capacity, 0}; }
-  iterator end() & { return {table, capacity, capacity}; }
-  const_iterator begin() const& { return {table, capacity, 0}; }
-  const_iterator end() const& { return {table, capacity, capacity}; }
+  iterator begin() & { return {table, slots_in_order(), capacity, 0}; }
+  iterator end() & { return {table, nullptr, capacity, capacity}; }
+  const_iterator begin() const& {
+    return {table, slots_in_order(), capacity, 0};
+  }
+  const_iterator end() const& { return {table, nullptr, capacity, capacity}; }
 
  protected:
   using Traits = zxKeyTraits<K>;
@@ -221,9 +226,9 @@ class zxAA {
   template <class Matches>
   Place place_by(std::uint32_t hash, Matches matches) const {
     zxaa_impl::Cell* cell = header().index.find(
-        hash, [&](std::int32_t slot) { return matches(table[slot].key); });
-    if (cell != nullptr && cell->slot_above != 0) [[likely]]
-      return {&table[cell->slot_above - 1], cell, hash};
+        hash, [&](std::int32_t entry) { return matches(table[entry].key); });
+    if (cell != nullptr && cell->entry_above != 0) [[likely]]
+      return {&table[cell->entry_above - 1], cell, hash};
     if (cell == nullptr || count >= capacity) [[unlikely]] {
       bail_code(2206);
       cell = nullptr;
@@ -233,9 +238,7 @@ class zxAA {
 
  private:
   using Header = zxaa_impl::Header;
-  using Cell = zxaa_impl::Cell;
-  using Index = zxaa_impl::Index;
-  using SlotMap = zxaa_impl::SlotMap;
+  using Layout = zxaa_impl::Layout;
 
   static_assert(alignof(Entry) <= alignof(Header));
 
@@ -255,10 +258,6 @@ class zxAA {
     return check() && ZX_ASSERT(!Traits::is_null(key));
   }
 
-  static bool is_empty(const Entry& entry) {
-    return Traits::is_null(entry.key);
-  }
-
   static std::uint32_t find_hash(const K& key) {
     if constexpr (requires { Traits::find_hash(key); })
       return Traits::find_hash(key);
@@ -266,62 +265,78 @@ class zxAA {
       return zxaa_impl::mixed(Traits::hash(key), 0);
   }
 
-  // ---- the block
+  // ---- entries
 
-  static void* block_of(Entry* entries) {
-    return reinterpret_cast<char*>(entries) - sizeof(Header);
-  }
-  Header& header() const { return *static_cast<Header*>(block_of(table)); }
-
-  // The parts of the block in their order, each padded to eight bytes.
-  struct Layout {
-    std::uint64_t cells, homes, map, end;
-
-    explicit Layout(std::int32_t slots) {
-      const auto n = static_cast<std::uint64_t>(slots);
-      cells = sizeof(Header) + padded(n * sizeof(Entry));
-      homes = cells + Index::cell_count(slots) * sizeof(Cell);
-      map = homes + padded(n * sizeof(std::uint32_t));
-      end = map + SlotMap::word_count(slots) * sizeof(std::uint64_t);
-    }
-    static std::uint64_t padded(std::uint64_t bytes) {
-      return (bytes + 7) & ~std::uint64_t{7};
-    }
-  };
-
-  // ---- slots
-
-  std::int32_t home_of(std::uint32_t hash) const {
-    const auto home = mask != 0 ? hash & static_cast<std::uint32_t>(mask)
-                                : hash % static_cast<std::uint32_t>(capacity);
-    return static_cast<std::int32_t>(home);
-  }
+  Header& header() const { return reinterpret_cast<Header*>(table)[-1]; }
 
   Place place_of(const K& key) const {
     if (capacity == 0) return {};  // not worth hashing the key
-    return place_by(find_hash(key), [&](const K& k) { return k == key; });
+    return place_by(find_hash(key), [&](const K& k) {
+      if constexpr (requires { Traits::same(k, key); })
+        return Traits::same(k, key);
+      else
+        return k == key;
+    });
   }
 
   Entry* find_entry(const K& key) {
     return check_with(key) ? place_of(key).entry : nullptr;
   }
 
-  // Makes the key's entry, but for its value, in the first free slot from its
-  // home on; null, and nothing is made, if there is none.
-  Entry* take_slot(const Place& place, const K& key) {
+  // Makes the key's entry, but for its value; null, and nothing is made, if
+  // there is no slot for it.
+  Entry* add_entry(const Place& place, const K& key) {
     if (place.cell == nullptr) return nullptr;
-    const std::uint32_t hash = Traits::hash(key);
-    const std::int32_t slot = header().map.first_free(home_of(hash));
-    if (slot < 0) {
+    Header& h = header();
+    if (h.ordered && !h.order.add(count, Traits::hash(key))) {
       bail_code(2206);
       return nullptr;
     }
-    header().map.take(slot);
-    header().homes[slot] = hash;
-    *place.cell = {place.hash, slot + 1};
-    ::new (static_cast<void*>(&table[slot].key)) K(key);
-    ++count;
-    return &table[slot];
+    *place.cell = {place.hash, count + 1};
+    ::new (static_cast<void*>(&table[count].key)) K(key);
+    return &table[count++];
+  }
+
+  static void destroy(Entry& entry) {
+    entry.value.~V();
+    entry.key.~K();
+  }
+
+  // Closes the gap that a removal left among the entries.
+  void move_last_to(std::int32_t number) {
+    const std::int32_t last = count - 1;
+    header().index.renumber(find_hash(table[last].key), last, number);
+    header().order.renumber(last, number);
+    std::memcpy(static_cast<void*>(&table[number]),
+                static_cast<const void*>(&table[last]), sizeof(Entry));
+  }
+
+  // ---- the order of slots
+
+  const std::int32_t* slots_in_order() const {
+    if (capacity == 0) return nullptr;
+    work_out_order();
+    return header().order.slots();
+  }
+
+  // Goes through the growths again, and between them through the arrivals.
+  void work_out_order() const {
+    Header& h = header();
+    if (h.ordered) return;
+    h.ordered = true;
+    h.order.start(h.log[0].slots);
+    std::int32_t arrived = 0;
+    for (std::int32_t i = 1; i < h.growths; ++i) {
+      arrived = let_arrive(arrived, h.log[i].entries);
+      h.order.grow(h.log[i].slots);
+    }
+    let_arrive(arrived, count);
+  }
+
+  std::int32_t let_arrive(std::int32_t entry, std::int32_t end) const {
+    for (; entry < end; ++entry)
+      header().order.add(entry, Traits::hash(table[entry].key));
+    return entry;
   }
 
   // ---- growth
@@ -335,78 +350,46 @@ class zxAA {
     return size > k_step ? std::int64_t{capacity} + k_step : size;
   }
 
-  void rehash(std::int32_t size) {
-    const Layout layout(size);
-    if (layout.end > SIZE_MAX) return bail_code(2201);
-    Entry* const old_table = table;
-    const std::int32_t old_capacity = capacity;
-    take_block(layout, size);
-    if (old_table == nullptr) return;
-    Header& old = *static_cast<Header*>(block_of(old_table));
-    // In place of each home the new slot is noted, for the index.
-    for (std::int32_t i = 0; i < old_capacity; ++i)
-      if (!is_empty(old_table[i]))
-        old.homes[i] = move_in(old_table[i], old.homes[i]);
-    header().index.take_over(old.index, old.homes);
-    zx_realloc(&old, 0);
-  }
-
-  void take_block(const Layout& layout, std::int32_t size) {
-    const auto bytes = static_cast<std::size_t>(layout.end);
-    char* block = static_cast<char*>(zx_realloc(nullptr, bytes));
-    std::memset(block, 0, bytes);  // all keys null
-    auto at = [block](std::uint64_t offset) {
-      return static_cast<void*>(block + static_cast<std::size_t>(offset));
-    };
-    ::new (block)
-        Header{Index(static_cast<Cell*>(at(layout.cells)), size),
-               SlotMap(static_cast<std::uint64_t*>(at(layout.map)), size),
-               static_cast<std::uint32_t*>(at(layout.homes))};
-    table = static_cast<Entry*>(at(sizeof(Header)));
+  void resize(std::int32_t size) {
+    if (table == nullptr || size > header().room) {
+      if (!make_room(size)) return;
+    }
+    Header& h = header();
+    if (h.growths == Layout::log_room(h.room)) work_out_order();
+    if (h.ordered)
+      h.order.grow(size);
+    else
+      h.log[h.growths++] = {count, size};
     capacity = size;
     mask = (size & (size - 1)) == 0 ? size - 1 : 0;
   }
 
-  // Moves an entry of the old block in; its slot.
-  std::uint32_t move_in(const Entry& entry, std::uint32_t hash) {
-    const std::int32_t slot = header().map.first_free(home_of(hash));
-    header().map.take(slot);
-    header().homes[slot] = hash;
-    move_entry(table[slot], entry);
-    return static_cast<std::uint32_t>(slot);
-  }
-
-  static void move_entry(Entry& to, const Entry& from) {
-    std::memcpy(static_cast<void*>(&to), static_cast<const void*>(&from),
-                sizeof(Entry));
-  }
-
-  // ---- removal
-
-  std::int32_t next_slot(std::int32_t i) const {
-    return i + 1 == capacity ? 0 : i + 1;
-  }
-
-  // Moves later entries of the run into the hole that a removal left, as far
-  // as their walks from home would otherwise end at it.
-  void close_gap(std::int32_t hole) {
-    std::memset(static_cast<void*>(&table[hole]), 0, sizeof(Entry));
-    for (std::int32_t i = next_slot(hole); i != hole && !is_empty(table[i]);
-         i = next_slot(i)) {
-      const std::int32_t home = home_of(header().homes[i]);
-      const bool passes_hole =
-          i > hole ? home <= hole || home > i : home <= hole && home > i;
-      if (!passes_hole) continue;
-      header().index.move(find_hash(table[i].key), i, hole);
-      header().homes[hole] = header().homes[i];
-      move_entry(table[hole], table[i]);
-      std::memset(static_cast<void*>(&table[i]), 0, sizeof(Entry));
-      hole = i;
+  // Moves to a block with room for `size` slots, or for twice as many as so
+  // far: the steps by which tables grow are too small to move each time.
+  // False, and nothing is done, if there can be no such block (message 2201).
+  bool make_room(std::int32_t size) {
+    std::int64_t room = table != nullptr ? 2 * std::int64_t{header().room} : 0;
+    if (room < size || room >= k_limit) room = size;
+    Layout layout(static_cast<std::int32_t>(room), sizeof(Entry));
+    if (layout.bytes() > SIZE_MAX) layout = Layout(size, sizeof(Entry));
+    if (layout.bytes() > SIZE_MAX) {
+      bail_code(2201);
+      return false;
     }
-    header().map.free(hole);
+    Header* fresh = layout.make_header(
+        zx_realloc(nullptr, static_cast<std::size_t>(layout.bytes())));
+    if (table != nullptr) {
+      fresh->take_over(header());
+      std::memcpy(static_cast<void*>(fresh + 1),
+                  static_cast<const void*>(table),
+                  zx_size(count) * sizeof(Entry));
+      zx_realloc(&header(), 0);
+    }
+    table = reinterpret_cast<Entry*>(fresh + 1);
+    return true;
   }
 
-  Entry* table = nullptr;     // `capacity` entries; null if that is 0
+  Entry* table = nullptr;     // the entries; null if `capacity` is 0
   std::int32_t capacity = 0;  // slots
   std::int32_t count = 0;     // occupied slots
   std::int32_t mask = 0;      // capacity - 1 for a power of two, else 0
@@ -427,7 +410,10 @@ class zxAA<K, V>::Iterator {
 
   Iterator() = default;
 
-  reference operator*() const { return {table[at].key, table[at].value}; }
+  reference operator*() const {
+    Entry& entry = table[slots[at] - 1];
+    return {entry.key, entry.value};
+  }
 
   // The slot of the entry.
   std::int32_t slot() const { return at; }
@@ -448,15 +434,17 @@ class zxAA<K, V>::Iterator {
 
  private:
   friend zxAA;
-  Iterator(Entry* entries, std::int32_t slots, std::int32_t start)
-      : table(entries), end(slots), at(start) {
+  Iterator(Entry* entries, const std::int32_t* entries_above,
+           std::int32_t slot_count, std::int32_t start)
+      : table(entries), slots(entries_above), end(slot_count), at(start) {
     skip_empty();
   }
   void skip_empty() {
-    while (at < end && is_empty(table[at])) ++at;
+    while (at < end && slots[at] == 0) ++at;
   }
 
   Entry* table = nullptr;
+  const std::int32_t* slots = nullptr;  // by slot the entry plus one, or 0
   std::int32_t end = 0;
   std::int32_t at = 0;
 };
@@ -476,7 +464,7 @@ class zxSA : public zxAA<zxStr, V> {
     const std::string_view text(key);
     const auto place =
         Base::place_by(zxaa_impl::hash_of_bytes(text.data(), text.size()),
-                       [&](const zxStr& k) { return k.view() == text; });
+                       [&](const zxStr& k) { return Base::Traits::same(k, text); });
     return place.entry ? &place.entry->value : nullptr;
   }
   const V* find(const char* key) const {

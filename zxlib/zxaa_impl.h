@@ -1,14 +1,19 @@
-// zxaa_impl.h - what lies beside the entries of a hash table: how a look-up
-// finds its entry, and how an insertion finds its slot.
+// zxaa_impl.h - the parts of a hash table beside its entries.
 //
-// The slot of an entry is fixed by the checksum of its key, 16 bits for
-// strings, and walking from slot to slot would take ever longer in large
-// tables, where many keys share a home.  So
-//   - an index of cells, by a hash of 32 bits, tells the slot of a key;
-//   - a map of bits tells the first free slot behind a home.
-// All of it lies in the table's one block:
+// The entries lie one behind the other, in the order of their arrival.  An
+// index of cells, by a hash of 32 bits, finds the entry of a key.
 //
-//   | header | entries | cells | homes | map | summary |
+// Iteration goes by slot.  The slot of an entry follows from the checksum of
+// its key, of which strings have only 16 bits, and from all that happened to
+// the table before; walking from slot to slot to find a key would take ever
+// longer in large tables, and so would moving entries at each growth.  So the
+// order of slots is worked out when somebody first asks for it, by an
+// iteration or a removal: until then the table keeps a log of its growths,
+// which with the order of arrival tells all.  From then on it is kept.
+//
+// All of it lies in the table's one block, laid out for `room` slots:
+//
+//   | Header | entries | cells | hashes | slots | map, summary | log |
 //            ^ zxAA::table
 #ifndef ZXAA_IMPL_H
 #define ZXAA_IMPL_H
@@ -19,6 +24,8 @@
 #include <cstring>
 
 namespace zxaa_impl {
+
+// ------------------------------------------------------------- the hash --
 
 // Loads of fixed size from anywhere.
 inline std::uint64_t load8(const char* bytes) {
@@ -61,164 +68,184 @@ inline std::uint32_t hash_of_bytes(const char* bytes, std::size_t size) {
   return mixed(all, size);
 }
 
-// A map of slots with a summary, so that a run of any length is passed in a
-// few steps.
-class SlotMap {
- public:
-  SlotMap() = default;
-  // On zeroed memory of word_count(slots) words.
-  SlotMap(std::uint64_t* memory, std::int32_t slots)
-      : taken(memory), words(words_for(slots)), full(memory + words) {
-    if (slots % 64 != 0) taken[words - 1] = ~std::uint64_t{0} << slots % 64;
-    const std::size_t rest = words % 64;
-    if (rest != 0) full[words / 64] = ~std::uint64_t{0} << rest;
+// True if the bytes are the same.  Keys are short, so it does without a call.
+inline bool same_bytes(const char* a, const char* b, std::size_t size) {
+  if (size < 8) {
+    for (std::size_t i = 0; i < size; ++i)
+      if (a[i] != b[i]) return false;
+    return true;
   }
+  for (std::size_t at = 0; at + 8 < size; at += 8)
+    if (load8(a + at) != load8(b + at)) return false;
+  return load8(a + size - 8) == load8(b + size - 8);
+}
 
-  static std::size_t word_count(std::int32_t slots) {
-    const std::size_t words = words_for(slots);
-    return words + (words + 63) / 64;
-  }
-
-  void take(std::int32_t slot) {
-    const std::size_t word = word_of(slot);
-    taken[word] |= bit_of(slot);
-    if (~taken[word] == 0) full[word / 64] |= std::uint64_t{1} << word % 64;
-  }
-
-  void free(std::int32_t slot) {
-    const std::size_t word = word_of(slot);
-    taken[word] &= ~bit_of(slot);
-    full[word / 64] &= ~(std::uint64_t{1} << word % 64);
-  }
-
-  // The first free slot from `home` on, going on at slot 0 behind the last;
-  // -1 if there is none.
-  std::int32_t first_free(std::int32_t home) const {
-    const std::size_t word = word_of(home);
-    const std::uint64_t here = ~taken[word] & ~std::uint64_t{0} << home % 64;
-    if (here != 0) return slot_of(word, here);
-    const std::int32_t behind = first_free_from(word + 1);
-    return behind >= 0 ? behind : first_free_from(0);
-  }
-
- private:
-  static std::size_t words_for(std::int32_t slots) {
-    return (static_cast<std::size_t>(slots) + 63) / 64;
-  }
-  static std::size_t word_of(std::int32_t slot) {
-    return static_cast<std::size_t>(slot) / 64;
-  }
-  static std::uint64_t bit_of(std::int32_t slot) {
-    return std::uint64_t{1} << slot % 64;
-  }
-  static std::int32_t slot_of(std::size_t word, std::uint64_t free_bits) {
-    return static_cast<std::int32_t>(word * 64) + std::countr_zero(free_bits);
-  }
-
-  // The first free slot of the first word from `word` on that is not full;
-  // -1 if there is none.
-  std::int32_t first_free_from(std::size_t word) const {
-    std::uint64_t mask = ~std::uint64_t{0} << word % 64;
-    for (std::size_t i = word / 64; i * 64 < words; ++i) {
-      const std::uint64_t open = ~full[i] & mask;
-      mask = ~std::uint64_t{0};
-      if (open == 0) continue;
-      const std::size_t found =
-          i * 64 + static_cast<std::size_t>(std::countr_zero(open));
-      return slot_of(found, ~taken[found]);
-    }
-    return -1;
-  }
-
-  std::uint64_t* taken = nullptr;  // a bit for each slot, beyond the last set
-  std::size_t words = 0;
-  std::uint64_t* full = nullptr;  // a bit for each word: all of it is taken
-};
+// ------------------------------------------------------------- the index --
 
 // A place of the index.
 struct Cell {
   std::uint32_t hash;
-  std::int32_t slot_above;  // the slot plus one; 0 marks an empty cell
+  std::int32_t entry_above;  // the entry plus one; 0 marks an empty cell
 };
 
 // The cells: open addressing, filled to a half at most.
 class Index {
  public:
   Index() = default;
-  // On zeroed memory of cell_count(slots) cells.
-  Index(Cell* memory, std::int32_t slots)
-      : cells(memory),
-        mask(static_cast<std::uint32_t>(cell_count(slots) - 1)) {}
+  // On zeroed memory of cell_count(room) cells.
+  Index(Cell* memory, std::int32_t room)
+      : cells(memory), mask(static_cast<std::uint32_t>(cell_count(room) - 1)) {}
 
-  static std::uint64_t cell_count(std::int32_t slots) {
-    const auto count = static_cast<std::uint64_t>(slots);
+  static std::uint64_t cell_count(std::int32_t room) {
+    const auto count = static_cast<std::uint64_t>(room);
     return std::bit_ceil(count + count / 2);
   }
 
-  // The cell of the hash whose slot `matches`, else the empty one at which
+  // The cell of the hash whose entry `matches`, else the empty one at which
   // the walk ended; null if there is no end.
   template <class Matches>
   Cell* find(std::uint32_t hash, Matches matches) const {
     std::uint32_t i = hash & mask;
     for (std::uint32_t steps = 0; steps <= mask; ++steps, i = (i + 1) & mask) {
       Cell& cell = cells[i];
-      if (cell.slot_above == 0) return &cell;
-      if (cell.hash == hash && matches(cell.slot_above - 1)) return &cell;
+      if (cell.entry_above == 0) return &cell;
+      if (cell.hash == hash && matches(cell.entry_above - 1)) return &cell;
     }
     return nullptr;
   }
 
   // Stores an entry that is not there yet.
-  void add(std::uint32_t hash, std::int32_t slot) {
-    Cell* cell = find(hash, [](std::int32_t) { return false; });
-    if (cell != nullptr) *cell = {hash, slot + 1};
-  }
-
-  // Notes that the entry moved.
-  void move(std::uint32_t hash, std::int32_t from, std::int32_t to) {
-    Cell* cell = find(hash, [from](std::int32_t slot) { return slot == from; });
-    if (cell != nullptr && cell->slot_above != 0) cell->slot_above = to + 1;
-  }
-
+  void add(std::uint32_t hash, std::int32_t entry);
+  // Notes that the entry has another number.
+  void renumber(std::uint32_t hash, std::int32_t from, std::int32_t to);
   // Empties a cell and closes the gap that it leaves in its run.
-  void remove(Cell* cell) {
-    auto hole = static_cast<std::uint32_t>(cell - cells);
-    for (std::uint32_t i = (hole + 1) & mask; cells[i].slot_above != 0;
-         i = (i + 1) & mask) {
-      const std::uint32_t home = cells[i].hash & mask;
-      if (((i - home) & mask) < ((i - hole) & mask)) continue;
-      cells[hole] = cells[i];
-      hole = i;
-    }
-    cells[hole] = {};
-  }
-
-  // Takes over the entries of another index, each under the slot that
-  // `new_slot` has for it.
-  void take_over(const Index& other, const std::uint32_t* new_slot) {
-    for (std::uint32_t i = 0; i <= other.mask; ++i) {
-      const Cell& cell = other.cells[i];
-      if (cell.slot_above == 0) continue;
-      const auto slot =
-          static_cast<std::int32_t>(new_slot[cell.slot_above - 1]);
-      // In an index of the same size it has the same place.
-      if (mask == other.mask)
-        cells[i] = {cell.hash, slot + 1};
-      else
-        add(cell.hash, slot);
-    }
-  }
+  void remove(Cell* cell);
+  // Takes over all that another index holds; this one is empty.
+  void take_over(const Index& other);
 
  private:
   Cell* cells = nullptr;
   std::uint32_t mask = 0;
 };
 
+// ------------------------------------------------------ the order of slots --
+
+// A map of slots with a summary, so that a run of any length is passed in a
+// few steps.
+class SlotMap {
+ public:
+  SlotMap() = default;
+  // On zeroed memory of word_count(slots) words.
+  SlotMap(std::uint64_t* memory, std::int32_t slots);
+
+  static std::size_t word_count(std::int32_t slots);
+
+  void take(std::int32_t slot);
+  void free(std::int32_t slot);
+
+  // The first free slot from `home` on, going on at slot 0 behind the last;
+  // -1 if there is none.
+  std::int32_t first_free(std::int32_t home) const;
+
+ private:
+  std::int32_t first_free_from(std::size_t word) const;
+
+  std::uint64_t* taken = nullptr;  // a bit for each slot, beyond the last set
+  std::size_t words = 0;
+  std::uint64_t* full = nullptr;  // a bit for each word: all of it is taken
+};
+
+// Which entry lies in which slot.
+class SlotOrder {
+ public:
+  // The memory is that of a block with `room` slots.
+  struct Memory {
+    std::uint32_t* hashes;        // `room` of them
+    std::int32_t* entries_above;  // `room` of them
+    std::uint64_t* map;           // SlotMap::word_count(room) words
+  };
+
+  SlotOrder() = default;
+  explicit SlotOrder(const Memory& parts) : memory(parts) {}
+
+  // Begins with empty slots.
+  void start(std::int32_t slots);
+
+  // Puts the entry into the first free slot from its home on, which its hash
+  // tells; false if there is none.
+  bool add(std::int32_t entry, std::uint32_t hash);
+
+  // Changes the number of slots: the entries go to the first free slots from
+  // their homes on, in the order of the slots in which they lay.
+  void grow(std::int32_t slots);
+
+  // Empties the entry's slot.  Later entries of the run move into the hole,
+  // as far as their walks from home would otherwise end at it.
+  void remove(std::int32_t entry);
+
+  // Gives an entry another number, which is free.
+  void renumber(std::int32_t from, std::int32_t to);
+
+  // Takes over what another order with no more room holds.
+  void take_over(const SlotOrder& other);
+
+  // The entry in a slot plus one; 0 for none.
+  const std::int32_t* slots() const { return memory.entries_above; }
+
+ private:
+  std::int32_t home_of(std::uint32_t hash) const {
+    const auto home = mask != 0 ? hash & mask : hash % size;
+    return static_cast<std::int32_t>(home);
+  }
+  std::int32_t slot_of(std::int32_t entry) const;
+  std::int32_t next(std::int32_t slot) const {
+    return static_cast<std::uint32_t>(slot) + 1 == size ? 0 : slot + 1;
+  }
+  bool place(std::int32_t entry);
+
+  Memory memory = {};
+  std::uint32_t size = 0;
+  std::uint32_t mask = 0;  // size - 1 for a power of two, else 0
+  SlotMap map;
+};
+
+// ------------------------------------------------------------- the block --
+
+// A growth: what the number of entries was when the table got so many slots.
+struct Growth {
+  std::int32_t entries;
+  std::int32_t slots;
+};
+
 // What stands ahead of the entries.
 struct alignas(16) Header {
   Index index;
-  SlotMap map;
-  std::uint32_t* homes;  // the hash of each occupied slot's key
+  SlotOrder order;
+  std::int32_t room;     // slots for which the block is laid out
+  bool ordered;          // the order of slots is kept; else there is a log
+  std::int32_t growths;  // entries of the log
+  Growth* log;
+
+  // Takes over all that the header of a block with less room tells.
+  void take_over(const Header& other);
+};
+
+// The parts of a block for `room` slots with entries of the given size.
+class Layout {
+ public:
+  Layout(std::int32_t room, std::size_t entry_size);
+
+  // The bytes of the block; it may be more than there can be.
+  std::uint64_t bytes() const { return end; }
+
+  // Makes the header at the start of the memory, with an empty index.
+  Header* make_header(void* memory) const;
+
+  static std::int32_t log_room(std::int32_t room) { return room / 512 + 32; }
+
+ private:
+  std::int32_t room;
+  std::uint64_t cells, hashes, slots, map, log, end;
 };
 
 }  // namespace zxaa_impl

@@ -192,8 +192,10 @@ class zxQVA {
 
   // The invariant.  A negative number counts as one beyond every capacity.
   bool is_sound() const {
-    return zx_wide(offset) + zx_wide(count) <= capacity &&
-           (capacity == 0 || first == base + zx_wide(offset));
+    if (zx_wide(offset) + zx_wide(count) > capacity) [[unlikely]]
+      return false;
+    return __builtin_expect(first == base + zx_wide(offset), true) ||
+           capacity == 0;
   }
   bool check() const { return ZX_ASSERT(is_sound()); }
 

@@ -29,12 +29,39 @@ std::int32_t sum_of(std::int32_t a, std::int32_t b) {
   return sum > INT32_MAX ? -1 : static_cast<std::int32_t>(sum);
 }
 
+// Copies `size` bytes as two overlapping pieces.
+template <std::size_t piece>
+void copy_ends(char* to, const char* from, std::size_t size) {
+  char first[piece], last[piece];
+  std::memcpy(first, from, piece);
+  std::memcpy(last, from + size - piece, piece);
+  std::memcpy(to, first, piece);
+  std::memcpy(to + size - piece, last, piece);
+}
+
+// Copies text that is short most of the time, when a call would take as long
+// as the copying.  The two places may overlap.
+inline void copy_text(char* to, const char* from, std::size_t size) {
+  if (size > 32)
+    std::memmove(to, from, size);
+  else if (size >= 16)
+    copy_ends<16>(to, from, size);
+  else if (size >= 8)
+    copy_ends<8>(to, from, size);
+  else if (size >= 4)
+    copy_ends<4>(to, from, size);
+  else if (size >= 2)
+    copy_ends<2>(to, from, size);
+  else if (size == 1)
+    *to = *from;
+}
+
 // Sets the characters of a block that is large enough for both pieces; `a`
 // may lie within it.
 void fill(zxStrRep* rep, const char* a, std::int32_t a_length, const char* b,
           std::int32_t b_length) {
-  std::memmove(rep->data, a, zx_size(a_length));
-  if (b_length > 0) std::memcpy(rep->data + a_length, b, zx_size(b_length));
+  copy_text(rep->data, a, zx_size(a_length));
+  copy_text(rep->data + a_length, b, zx_size(b_length));
   rep->length = a_length + b_length;
   rep->data[rep->length] = '\0';
 }
@@ -327,7 +354,7 @@ zxStr& zxStr::append(const char* characters, std::int32_t size) {
     make_room(wanted);
     if (own_text) characters = rep->data + offset;
   }
-  std::memmove(rep->data + old_length, characters, zx_size(size));
+  copy_text(rep->data + old_length, characters, zx_size(size));
   rep->length = sum;
   rep->data[sum] = '\0';
   return *this;
@@ -466,10 +493,11 @@ void fatal_exit(const zxStr& text) { fatal_exit(text.c_str()); }
 namespace {
 
 constexpr std::uint16_t k_crc16_start = 0xFFFF;
-constexpr std::size_t k_slice = 8;  // bytes taken at once
+constexpr std::size_t k_slice = 8;    // bytes of a register
+constexpr std::size_t k_tables = 16;  // for two of them
 
 // Table k gives what a byte does to the sum when k more bytes follow it.
-using Crc16Tables = std::array<std::array<std::uint16_t, 256>, k_slice>;
+using Crc16Tables = std::array<std::array<std::uint16_t, 256>, k_tables>;
 
 constexpr Crc16Tables make_crc16_tables() {
   Crc16Tables tables{};
@@ -479,7 +507,7 @@ constexpr Crc16Tables make_crc16_tables() {
       crc = (crc & 0x8000U) ? (crc << 1) ^ 0x1021U : crc << 1;
     tables[0][i] = static_cast<std::uint16_t>(crc);
   }
-  for (std::size_t k = 1; k < k_slice; ++k)
+  for (std::size_t k = 1; k < k_tables; ++k)
     for (std::size_t i = 0; i < 256; ++i) {
       const unsigned crc = tables[k - 1][i];
       tables[k][i] =
@@ -495,14 +523,15 @@ std::uint16_t add_byte(std::uint16_t crc, unsigned char byte) {
                                     k_crc16_tables[0][(crc >> 8) ^ byte]);
 }
 
-// The sum of eight bytes of which the first is the highest.  The sum so far
-// has been mixed into the first two; zero bytes ahead of those count for
-// nothing.
-std::uint16_t sum_of_slice(std::uint64_t bytes) {
-  unsigned crc = 0;
-  for (std::size_t k = 0; k < k_slice; ++k)
-    crc ^= k_crc16_tables[k][bytes >> (8 * k) & 0xFF];
-  return static_cast<std::uint16_t>(crc);
+// What eight bytes, the first the highest, do to the sum when `behind` more
+// follow them.  Zero bytes do nothing.
+template <std::size_t behind>
+unsigned sum_of_slice(std::uint64_t bytes) {
+  const auto part = [bytes](std::size_t k) -> unsigned {
+    return k_crc16_tables[behind + k][bytes >> (8 * k) & 0xFF];
+  };
+  return part(0) ^ part(1) ^ part(2) ^ part(3) ^ part(4) ^ part(5) ^ part(6) ^
+         part(7);
 }
 
 std::uint64_t load_slice(const unsigned char* bytes) {
@@ -513,21 +542,30 @@ std::uint64_t load_slice(const unsigned char* bytes) {
   return value;
 }
 
+// The sum of 8 to 16 bytes, which are taken as 16 with zeros in front; the
+// sum so far goes into the first two that are not.  There is no branch on the
+// size, which nobody could predict.
+std::uint16_t add_last_bytes(std::uint16_t crc, const unsigned char* bytes,
+                             std::size_t size) {
+  const std::size_t half_gap = 4 * (2 * k_slice - size);  // in bits, halved
+  std::uint64_t high = load_slice(bytes) >> half_gap >> half_gap;
+  std::uint64_t low = load_slice(bytes + size - k_slice);
+  const std::uint64_t first = std::uint64_t{crc} << 48;
+  high ^= first >> half_gap >> half_gap;
+  if (size < k_slice + 2) low ^= first << (8 * (size - k_slice));
+  return static_cast<std::uint16_t>(sum_of_slice<k_slice>(high) ^
+                                    sum_of_slice<0>(low));
+}
+
 }  // namespace
 
 std::uint16_t crc16_add(std::uint16_t crc, const void* bytes,
                         std::size_t size) {
   const auto* byte = static_cast<const unsigned char*>(bytes);
-  const bool has_slice = size >= k_slice;
-  for (; size >= k_slice; size -= k_slice, byte += k_slice)
-    crc = sum_of_slice(load_slice(byte) ^ std::uint64_t{crc} << 48);
-  if (size >= 2 && has_slice) {
-    // The bytes left, and ahead of them some that are summed up already.
-    const std::size_t bits = 8 * size;
-    const std::uint64_t left =
-        load_slice(byte + size - k_slice) & ((std::uint64_t{1} << bits) - 1);
-    return sum_of_slice(left ^ std::uint64_t{crc} << (bits - 16));
-  }
+  for (; size > 2 * k_slice; size -= k_slice, byte += k_slice)
+    crc = static_cast<std::uint16_t>(
+        sum_of_slice<0>(load_slice(byte) ^ std::uint64_t{crc} << 48));
+  if (size >= k_slice) return add_last_bytes(crc, byte, size);
   for (; size != 0; --size, ++byte) crc = add_byte(crc, *byte);
   return crc;
 }

@@ -7,6 +7,7 @@
 #ifndef KIT_TARGET_H
 #define KIT_TARGET_H
 
+#include <cstddef>
 #include <string>
 
 namespace kit {
@@ -44,6 +45,29 @@ class FewFiles {
  private:
   unsigned long long before;
 };
+
+// Memory that can be read and written, whole pages of at least `size` bytes,
+// and behind its end a stretch that can be neither.
+class GuardedMemory {
+ public:
+  // Throws std::bad_alloc if there is none.
+  explicit GuardedMemory(std::size_t size);
+  GuardedMemory(const GuardedMemory&) = delete;
+  GuardedMemory& operator=(const GuardedMemory&) = delete;
+  ~GuardedMemory();
+
+  char* begin() const { return start; }
+  char* end() const { return start + size; }
+
+ private:
+  std::size_t size;
+  char* start;
+};
+
+// Makes invalid operations, divisions by zero, overflows and underflows of
+// floating-point numbers hardware faults from now on; false if that is not to
+// be had here.
+bool trap_float_errors();
 
 // Sets a variable of the environment as the library sees it; null removes
 // it.

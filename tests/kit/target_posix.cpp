@@ -1,12 +1,15 @@
 // target_posix.cpp - see target.h.
 
 #include <fcntl.h>
+#include <fenv.h>
+#include <sys/mman.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cstdlib>
 #include <filesystem>
+#include <new>
 
 #include "target.h"
 
@@ -60,6 +63,30 @@ FewFiles::~FewFiles() {
   getrlimit(RLIMIT_NOFILE, &limit);
   limit.rlim_cur = before;
   setrlimit(RLIMIT_NOFILE, &limit);
+}
+
+namespace {
+
+// A multiple of the size of a page.
+constexpr std::size_t k_pages = 65536;
+
+}  // namespace
+
+GuardedMemory::GuardedMemory(std::size_t wanted)
+    : size((wanted + k_pages - 1) / k_pages * k_pages) {
+  void* const found = mmap(nullptr, size + k_pages, PROT_NONE,
+                           MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  if (found == MAP_FAILED) throw std::bad_alloc();
+  start = static_cast<char*>(found);
+  if (mprotect(start, size, PROT_READ | PROT_WRITE) != 0)
+    throw std::bad_alloc();
+}
+
+GuardedMemory::~GuardedMemory() { munmap(start, size + k_pages); }
+
+bool trap_float_errors() {
+  return feenableexcept(FE_INVALID | FE_DIVBYZERO | FE_OVERFLOW |
+                        FE_UNDERFLOW) != -1;
 }
 
 void set_variable(const std::string& name, const char* value) {

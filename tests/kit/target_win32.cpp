@@ -1,10 +1,13 @@
 // target_win32.cpp - see target.h.
 
 #include <fcntl.h>
+#include <float.h>
 #include <io.h>
 #include <windows.h>
+#include <xmmintrin.h>
 
 #include <cstdlib>
+#include <new>
 
 #include "target.h"
 
@@ -37,6 +40,36 @@ Pipe make_pipe() {
 FewFiles::FewFiles(unsigned) : before(0) {}
 
 FewFiles::~FewFiles() { before = 0; }
+
+namespace {
+
+// A multiple of the size of a page.
+constexpr std::size_t k_pages = 65536;
+
+}  // namespace
+
+GuardedMemory::GuardedMemory(std::size_t wanted)
+    : size((wanted + k_pages - 1) / k_pages * k_pages),
+      start(static_cast<char*>(
+          VirtualAlloc(nullptr, size + k_pages, MEM_RESERVE, PAGE_NOACCESS))) {
+  if (start == nullptr ||
+      VirtualAlloc(start, size, MEM_COMMIT, PAGE_READWRITE) == nullptr)
+    throw std::bad_alloc();
+}
+
+GuardedMemory::~GuardedMemory() { VirtualFree(start, 0, MEM_RELEASE); }
+
+// Both units of the processor are told: the one that the compiler uses for
+// double numbers, and the older one that it uses for long double numbers.
+bool trap_float_errors() {
+  constexpr unsigned k_wanted =
+      _EM_INVALID | _EM_ZERODIVIDE | _EM_OVERFLOW | _EM_UNDERFLOW;
+  _controlfp(0, k_wanted);
+  _MM_SET_EXCEPTION_MASK(_MM_GET_EXCEPTION_MASK() &
+                         ~unsigned{_MM_MASK_INVALID | _MM_MASK_DIV_ZERO |
+                                   _MM_MASK_OVERFLOW | _MM_MASK_UNDERFLOW});
+  return true;
+}
 
 void set_variable(const std::string& name, const char* value) {
   // The runtime passes it on to the system, and removes what is empty.

@@ -134,22 +134,22 @@ inline std::string screen(const std::string& message, const std::string& line) {
 }
 
 // A case carried out in a folder of its own.
-struct Run {
+struct Outcome {
   kit::ProcessResult process;
   std::string dump;  // the stack dump file; empty if there is none
   std::string box;   // what went to message boxes
 };
 
 // The case's boxes go to a file.
-inline Run run(const std::string& name,
-               const std::vector<std::string>& arguments = {}) {
+inline Outcome outcome_of(const std::string& name,
+                          const std::vector<std::string>& arguments = {}) {
   const kit::TempDir folder;
   const std::string box = folder.file("box");
   const std::string dump = folder.file("P.dmp");
   kit::ProcessOptions options;
   options.directory = folder.path();
   options.variables = {{"ZX_BOX_OUT", box}};
-  Run result;
+  Outcome result;
   result.process = kit::run_case(name, arguments, options);
   if (std::filesystem::exists(box)) result.box = kit::read_file(box);
   if (std::filesystem::exists(dump)) result.dump = kit::read_file(dump);
