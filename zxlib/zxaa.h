@@ -462,9 +462,9 @@ class zxSA : public zxAA<zxStr, V> {
     if (!ZX_ASSERT(key != nullptr)) return nullptr;
     if (Base::slots() == 0) return nullptr;
     const std::string_view text(key);
-    const auto place =
-        Base::place_by(zxaa_impl::hash_of_bytes(text.data(), text.size()),
-                       [&](const zxStr& k) { return Base::Traits::same(k, text); });
+    const auto place = Base::place_by(
+        zxaa_impl::hash_of_bytes(text.data(), text.size()),
+        [&](const zxStr& k) { return Base::Traits::same(k, text); });
     return place.entry ? &place.entry->value : nullptr;
   }
   const V* find(const char* key) const {

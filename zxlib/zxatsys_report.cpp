@@ -27,15 +27,6 @@ zxplat::Fd open_printer() {
   return zxplat::k_no_fd;
 }
 
-void print(zxplat::Fd printer, std::string_view text) {
-  while (!text.empty()) {
-    const std::int64_t done =
-        zxplat::files.write(printer, text.data(), text.size());
-    if (done <= 0) return;
-    text.remove_prefix(static_cast<std::size_t>(done));
-  }
-}
-
 void print_head(zxplat::Fd printer, const char* message) {
   zxText head(report_head);
   head.add("\r\nFatal Error for ");
@@ -45,7 +36,7 @@ void print_head(zxplat::Fd printer, const char* message) {
   head.add(":\r\n           ");
   head.add(message != nullptr ? message : "", k_shown);
   head.add("\r\n");
-  print(printer, head.view());
+  zxplat::write_all(printer, head.view());
 }
 
 // The lines of a file, one after the other, each with its line feed.  A line
@@ -95,7 +86,7 @@ void print_lines(zxplat::Fd printer, zxplat::Fd dump) {
     const std::string_view line = lines.next();
     if (line.empty()) return;
     if (count >= k_first_heads_only && line.front() != '-') continue;
-    print(printer, line);
+    zxplat::write_all(printer, line);
     ++count;
   }
 }

@@ -91,12 +91,7 @@ constinit std::int64_t bail_wait_seconds = 2;
 
 void bail_print_directly(std::string_view text) {
   zxplat::set_binary(zxplat::k_stdout_fd);  // start-up may not have come yet
-  while (!text.empty()) {
-    const std::int64_t done =
-        zxplat::files.write(zxplat::k_stdout_fd, text.data(), text.size());
-    if (done <= 0) return;
-    text.remove_prefix(static_cast<std::size_t>(done));
-  }
+  zxplat::write_all(zxplat::k_stdout_fd, text);
 }
 
 void show_failure(zxText& message, const char* line) {

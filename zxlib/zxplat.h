@@ -126,6 +126,9 @@ struct FileCalls {
 extern const FileCalls system_files;
 extern FileCalls files;
 
+// Writes all of a text by files.write; false if the system refused bytes.
+bool write_all(Fd fd, std::string_view text);
+
 // What a name stands for.  Links are followed.
 enum class NameKind {
   missing,    // nothing, or not to be reached; the reason in last_error()

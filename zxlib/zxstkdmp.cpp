@@ -54,14 +54,9 @@ class DumpFile {
   }
 
   void flush() {
-    std::string_view rest(buffer, used);
+    const std::size_t size = used;
     used = 0;
-    while (!rest.empty()) {
-      const std::int64_t done =
-          zxplat::files.write(fd, rest.data(), rest.size());
-      if (done <= 0) return;
-      rest.remove_prefix(static_cast<std::size_t>(done));
-    }
+    zxplat::write_all(fd, {buffer, size});
   }
 
   void close() {

@@ -142,6 +142,7 @@ zxStr::zxStr(std::string_view text)
 void zxStr::copy_unshareable(const zxStr& other) { *this = other; }
 
 zxStr& zxStr::operator=(const zxStr& other) {
+  if (this == &other) return *this;
   if (!check() || !other.check() || rep == other.rep) return *this;
   if (other.rep->length == 0) {
     clear();

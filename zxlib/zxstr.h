@@ -269,7 +269,7 @@ class zxIStr : public zxStr {
   ~zxIStr() = default;
 
   zxIStr& operator=(const zxIStr& other) {
-    zxStr::operator=(other);
+    if (this != &other) zxStr::operator=(other);
     return *this;
   }
   zxIStr& operator=(zxIStr&& other) noexcept {

@@ -1,4 +1,5 @@
-// zxplat_box.cpp - message boxes that are written instead of shown.
+// zxplat_common.cpp - what both targets have in common: writing all of a
+// text, message boxes that are written instead of shown.
 // Tested by tests/zxlib/zxplat_test.cpp.
 
 #include <algorithm>
@@ -8,16 +9,21 @@
 #include "zxplat.h"
 #include "zxplat_impl.h"
 
-namespace zxplat::common {
-namespace {
+namespace zxplat {
 
-void write_all(Fd fd, std::string_view text) {
+bool write_all(Fd fd, std::string_view text) {
   while (!text.empty()) {
     const std::int64_t done = files.write(fd, text.data(), text.size());
-    if (done <= 0) return;
+    if (done <= 0) return false;
     text.remove_prefix(static_cast<std::size_t>(done));
   }
+  return true;
 }
+
+}  // namespace zxplat
+
+namespace zxplat::common {
+namespace {
 
 // "0x" and at least four digits, as styles are usually written.
 std::string_view in_hexadecimal(std::uint32_t number, char (&room)[10]) {
