@@ -39,9 +39,10 @@ class zxStream {
   static bool close(zxStream* stream);
 
   // Writes down and closes the files of all streams that open() made.  The
-  // streams stay, without a descriptor: what is asked of them fails, and
-  // close() is a success.  It is for a process that needs their descriptors
-  // for its last words.
+  // streams stay, without a descriptor: reading fails, and so does writing
+  // once the buffer is to be written down; close() is a success unless bytes
+  // were lost since.  It is for a process that needs their descriptors for
+  // its last words.
   static void close_all();
 
   // Reads up to `size` bytes; the count.  A short count sets eof() or

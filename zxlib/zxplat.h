@@ -228,7 +228,8 @@ struct Fault {
 };
 
 // Has faults reported to `handler`, which runs on a stack of its own.  If it
-// comes back, the system's own action takes place: the end of the process.
+// comes back from a fault, the system's own action takes place: the end of
+// the process.  A signal that the process sent itself is over then.
 // The system's boxes for failing devices are switched off.
 using FaultHandler = void (*)(const Fault& fault);
 void catch_faults(FaultHandler handler);
@@ -238,10 +239,6 @@ void catch_faults(FaultHandler handler);
 // Copies memory of this process; false if not all of it can be read.  The
 // stack's guard page counts as such and stays intact.
 bool read_memory(std::uintptr_t from, void* out, std::size_t size);
-
-// The heap: null and a size allocates, a block and a size resizes, a block
-// and 0 frees (null comes back).  Null on exhaustion; the old block stays.
-void* heap_realloc(void* block, std::size_t size);
 
 }  // namespace zxplat
 

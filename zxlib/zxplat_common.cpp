@@ -54,6 +54,7 @@ void BoxText::add(std::string_view piece) {
 }
 
 void write_to_standard_error(std::string_view text) {
+  set_binary(k_stderr_fd);  // start-up may not have come yet
   write_all(k_stderr_fd, text);
 }
 

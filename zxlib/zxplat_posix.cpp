@@ -1,4 +1,4 @@
-// zxplat_posix.cpp - errors, the process and its clocks, folders and memory,
+// zxplat_posix.cpp - errors, the process and its clocks, folders,
 // for POSIX systems.
 // Tested by tests/zxlib/zxplat_test.cpp.
 
@@ -18,7 +18,6 @@ namespace zxplat {
 namespace {
 
 using posix::fail;
-using posix::fail_with;
 using posix::retry;
 
 constinit int g_last_error = k_err_none;
@@ -138,16 +137,6 @@ std::size_t temp_directory(std::span<char> out) {
   copy_as_name(path, out.data());
   if (!is_closed) std::memcpy(out.data() + path.size(), "\\", 2);
   return length;
-}
-
-void* heap_realloc(void* block, std::size_t size) {
-  if (size == 0) {
-    std::free(block);
-    return nullptr;
-  }
-  void* result = std::realloc(block, size);
-  if (result == nullptr) fail_with(k_err_no_memory);
-  return result;
 }
 
 }  // namespace zxplat

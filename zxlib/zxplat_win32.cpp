@@ -1,5 +1,5 @@
-// zxplat_win32.cpp - errors, names, the process and its clocks, folders and
-// memory, for Windows.
+// zxplat_win32.cpp - errors, names, the process and its clocks, folders,
+// for Windows.
 // Tested by tests/zxlib/zxplat_test.cpp.
 
 #include <fcntl.h>
@@ -205,16 +205,6 @@ std::size_t temp_directory(std::span<char> out) {
   const Attempt attempt;
   const DWORD result = ::GetTempPathA(room(out), out.data());
   return text_length(attempt, result, out.size());
-}
-
-void* heap_realloc(void* block, std::size_t size) {
-  const Attempt attempt;
-  if (size == 0) {
-    std::free(block);
-    return attempt.settle(static_cast<void*>(nullptr), true);
-  }
-  void* result = std::realloc(block, size);
-  return attempt.settle(result, result != nullptr);
 }
 
 }  // namespace zxplat

@@ -13,9 +13,15 @@
 #include <string_view>
 #include <vector>
 
+#include "kit/cases.h"
+#include "kit/failure.h"
 #include "kit/faults.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
+#include "zxbfile.h"
+#include "zxmainf.h"
+#include "zxmisc.h"
+#include "zxsfmt.h"
 
 namespace {
 
@@ -648,6 +654,369 @@ TEST(zxfile, random_operations_with_short_reads_and_writes_come_out_alike) {
 
 TEST(zxfile_slow, many_random_operations_do_what_they_do_to_a_string) {
   fight_many(100'001, 4000, 400);
+}
+
+// ---- closing all that is open
+
+// While one lives, it notes the descriptors that are closed, in order.
+class Closings {
+ public:
+  Closings() {
+    // What tests left open that were jumped out of is not of interest.
+    zxStream::close_all();
+    closed.clear();
+    zxplat::files.close = [](zxplat::Fd fd) {
+      closed.push_back(fd);
+      return zxplat::system_files.close(fd);
+    };
+  }
+  Closings(const Closings&) = delete;
+  Closings& operator=(const Closings&) = delete;
+  ~Closings() { zxplat::files.close = zxplat::system_files.close; }
+
+  // The descriptors closed since the last call, from the lowest on.
+  static std::vector<zxplat::Fd> take() {
+    std::vector<zxplat::Fd> taken;
+    taken.swap(closed);
+    std::sort(taken.begin(), taken.end());
+    return taken;
+  }
+
+ private:
+  static inline std::vector<zxplat::Fd> closed;
+};
+
+using Descriptors = std::vector<zxplat::Fd>;
+
+bool is_open(zxplat::Fd fd) { return zxplat::files.size(fd) >= 0; }
+
+TEST(zxfile, closing_all_writes_down_what_waits_in_the_buffers) {
+  const Closings closings;
+  const TestFile a("");
+  const TestFile b("before ");
+  const TestFile c("0123456789");
+  Stream created(a.name, OpenMode::create);
+  Stream appended(b.name, OpenMode::append);
+  Stream changed(c.name, OpenMode::read_write);
+  EXPECT_TRUE(created.write("created"));
+  EXPECT_TRUE(appended.write("appended"));
+  EXPECT_EQ(changed.read(3), "012");
+  EXPECT_TRUE(changed.write("XY"));
+  zxStream::close_all();
+  EXPECT_EQ(a.bytes(), "created");
+  EXPECT_EQ(b.bytes(), "before appended");
+  EXPECT_EQ(c.bytes(), "012XY56789");
+  for (Stream* stream : {&created, &appended, &changed})
+    EXPECT_TRUE(stream->close());
+  EXPECT_EQ(a.bytes(), "created");
+  EXPECT_EQ(b.bytes(), "before appended");
+  EXPECT_EQ(c.bytes(), "012XY56789");
+}
+
+TEST(zxfile, closing_all_gives_every_descriptor_back_once) {
+  const Closings closings;
+  const TestFile file("abc");
+  Descriptors descriptors;
+  std::vector<zxStream*> streams;
+  for (int i = 0; i < 20; ++i) {
+    streams.push_back(zxStream::open(file.name, OpenMode::read));
+    descriptors.push_back(streams.back()->descriptor());
+  }
+  std::sort(descriptors.begin(), descriptors.end());
+  zxStream::close_all();
+  EXPECT_EQ(Closings::take(), descriptors);
+  for (const zxplat::Fd fd : descriptors) EXPECT_FALSE(is_open(fd)) << fd;
+  for (const zxStream* stream : streams)
+    EXPECT_EQ(stream->descriptor(), zxplat::k_no_fd);
+  zxStream::close_all();
+  for (zxStream* stream : streams) EXPECT_TRUE(zxStream::close(stream));
+  EXPECT_EQ(Closings::take(), Descriptors{});
+}
+
+TEST(zxfile, without_an_open_stream_closing_all_does_nothing) {
+  const Closings closings;
+  zxStream::close_all();
+  EXPECT_EQ(Closings::take(), Descriptors{});
+}
+
+// Brings a stream into a state in which it may be when all are closed.
+struct UseRow {
+  const char* name;
+  OpenMode mode;
+  void (*use)(const Stream& stream);
+};
+const UseRow k_uses[] = {
+    {"unused", OpenMode::read_write, [](const Stream&) {}},
+    {"reading", OpenMode::read, [](const Stream& s) { s.read(3); }},
+    {"at its end", OpenMode::read, [](const Stream& s) { s.read(20'000); }},
+    {"writing", OpenMode::read_write, [](const Stream& s) { s.write("XYZ"); }},
+    {"written", OpenMode::read_write,
+     [](const Stream& s) {
+       s.write("XYZ");
+       s->flush();
+     }},
+    {"appending", OpenMode::append, [](const Stream& s) { s.write("XYZ"); }},
+    {"unbuffered", OpenMode::read_write,
+     [](const Stream& s) {
+       s->set_unbuffered();
+       s.write("XYZ");
+     }},
+    {"positioned", OpenMode::read_write,
+     [](const Stream& s) { s->seek(5000, Whence::start); }},
+};
+
+TEST(zxfile, what_is_asked_of_a_stream_behind_closing_all_fails) {
+  for (const UseRow& row : k_uses) {
+    SCOPED_TRACE(row.name);
+    const Closings closings;
+    const TestFile file(pattern(10'000));
+    Stream stream(file.name, row.mode);
+    row.use(stream);
+    zxStream::close_all();
+    const std::string left = file.bytes();
+    // A file that takes the number must not be touched.
+    const TestFile other("other");
+    Stream taker(other.name, OpenMode::read_write);
+
+    EXPECT_TRUE(stream->flush());  // there is nothing to flush
+    EXPECT_EQ(stream->tell(), -1);
+    EXPECT_FALSE(stream->seek(0, Whence::start));
+    EXPECT_FALSE(stream->seek(1, Whence::start));
+    EXPECT_FALSE(stream->seek(-1, Whence::current));
+    EXPECT_FALSE(stream->seek(0, Whence::end));
+    EXPECT_EQ(stream.read(1), "");
+    EXPECT_EQ(stream.read(5000), "");
+    EXPECT_EQ(stream.read(100'000), "");
+    EXPECT_TRUE(stream->error());
+    EXPECT_FALSE(stream->eof());
+    EXPECT_EQ(stream->tell(), -1);
+    EXPECT_FALSE(stream->sync());
+    EXPECT_EQ(stream->descriptor(), zxplat::k_no_fd);
+
+    EXPECT_TRUE(taker.close());
+    EXPECT_EQ(other.bytes(), "other");
+    EXPECT_TRUE(file.bytes() == left);
+  }
+}
+
+// Bytes that wait in a buffer are refused when they are to be written down.
+TEST(zxfile, what_is_written_behind_closing_all_is_refused) {
+  for (const UseRow& row : k_uses) {
+    SCOPED_TRACE(row.name);
+    const Closings closings;
+    const TestFile file(pattern(10'000));
+    Stream stream(file.name, row.mode);
+    row.use(stream);
+    zxStream::close_all();
+    const std::string left = file.bytes();
+    const TestFile other("other");
+    Stream taker(other.name, OpenMode::read_write);
+
+    EXPECT_FALSE(stream.write("lost") && stream->flush());
+    EXPECT_TRUE(stream->error());
+    EXPECT_FALSE(stream.write(pattern(200'000)));
+    EXPECT_FALSE(stream.write("lost") && stream->sync());
+    stream->set_unbuffered();
+    EXPECT_FALSE(stream.write("lost"));
+
+    EXPECT_TRUE(taker.close());
+    EXPECT_EQ(other.bytes(), "other");
+    EXPECT_TRUE(file.bytes() == left);
+  }
+}
+
+TEST(zxfile, a_stream_closes_well_behind_closing_all) {
+  for (const UseRow& row : k_uses) {
+    for (const bool is_used_again : {false, true}) {
+      SCOPED_TRACE(testing::Message() << row.name << is_used_again);
+      const Closings closings;
+      const TestFile file(pattern(10'000));
+      Stream stream(file.name, row.mode);
+      row.use(stream);
+      zxStream::close_all();
+      Closings::take();
+      if (is_used_again) {
+        stream.read(3);
+        stream->seek(0, Whence::start);
+      }
+      EXPECT_TRUE(stream.close());
+      EXPECT_EQ(Closings::take(), Descriptors{});
+    }
+  }
+}
+
+// While one lives, it counts the blocks of memory that are in use.
+class Blocks {
+ public:
+  Blocks() {
+    in_use = 0;
+    zx_realloc = [](void* block, std::size_t size) {
+      if (block == nullptr && size > 0) ++in_use;
+      if (block != nullptr && size == 0) --in_use;
+      return old(block, size);
+    };
+  }
+  Blocks(const Blocks&) = delete;
+  Blocks& operator=(const Blocks&) = delete;
+  ~Blocks() { zx_realloc = old; }
+
+  static inline int in_use;
+
+ private:
+  static inline void* (*old)(void*, std::size_t) = zx_realloc;
+};
+
+TEST(zxfile, a_stream_gives_its_memory_back_with_and_without_closing_all) {
+  for (const UseRow& row : k_uses) {
+    for (const bool closes_all : {false, true}) {
+      SCOPED_TRACE(testing::Message() << row.name << closes_all);
+      const Closings closings;
+      const TestFile file(pattern(10'000));
+      const Blocks blocks;
+      Stream stream(file.name, row.mode);
+      row.use(stream);
+      EXPECT_GE(Blocks::in_use, 1);
+      if (closes_all) {
+        zxStream::close_all();
+        stream.read(3);
+      }
+      EXPECT_TRUE(stream.close());
+      EXPECT_EQ(Blocks::in_use, 0);
+    }
+  }
+}
+
+TEST(zxfile, closing_all_goes_on_over_what_fails) {
+  const Closings closings;
+  const TestFile a("");
+  const TestFile b("");
+  Stream first(a.name, OpenMode::create);
+  Stream second(b.name, OpenMode::create);
+  EXPECT_TRUE(first.write("first"));
+  EXPECT_TRUE(second.write("second"));
+  {
+    Faults faults;
+    faults.fail_nth(Call::write, 1, zxplat::k_err_disk_full);
+    faults.fail_nth(Call::close, 1);
+    zxStream::close_all();
+    EXPECT_EQ(faults.count(Call::write), 2);
+    EXPECT_EQ(faults.count(Call::close), 2);
+  }
+  // One of the two was refused.
+  EXPECT_EQ(a.bytes().size() + b.bytes().size(), a.bytes().empty() ? 6U : 5U);
+  EXPECT_TRUE(first.close());
+  EXPECT_TRUE(second.close());
+}
+
+TEST(zxfile, streams_can_be_opened_behind_closing_all) {
+  const Closings closings;
+  const TestFile file("abc");
+  Stream old(file.name, OpenMode::read);
+  zxStream::close_all();
+  Closings::take();
+  Stream fresh(file.name, OpenMode::read_write);
+  const zxplat::Fd fd = fresh->descriptor();
+  EXPECT_EQ(fresh.read(1), "a");
+  EXPECT_TRUE(fresh.write("X"));
+  zxStream::close_all();
+  EXPECT_EQ(Closings::take(), Descriptors{fd});
+  EXPECT_EQ(file.bytes(), "aXc");
+  EXPECT_TRUE(old.close());
+  EXPECT_TRUE(fresh.close());
+}
+
+// Opens and closes streams in any order, and now and then all of them.
+TEST(zxfile, streams_come_and_go_in_any_order) {
+  for (unsigned seed = 1; seed <= 20; ++seed) {
+    SCOPED_TRACE(testing::Message() << "seed " << seed);
+    const Closings closings;
+    const TestFile file("abc");
+    Random random(seed);
+    std::vector<zxStream*> streams;  // all that were not closed by themselves
+    Descriptors open;                // what close_all() must close
+    for (int step = 0; step < 300; ++step) {
+      const std::size_t choice = random.below(20);
+      if (choice == 0) {
+        zxStream::close_all();
+        std::sort(open.begin(), open.end());
+        ASSERT_EQ(Closings::take(), open) << step;
+        open.clear();
+      } else if (choice < 10 && streams.size() < 30) {
+        streams.push_back(zxStream::open(file.name, OpenMode::read));
+        ASSERT_NE(streams.back(), nullptr);
+        open.push_back(streams.back()->descriptor());
+      } else if (!streams.empty()) {
+        const auto at = streams.begin() + static_cast<std::ptrdiff_t>(
+                                              random.below(streams.size()));
+        const zxplat::Fd fd = (*at)->descriptor();
+        ASSERT_TRUE(zxStream::close(*at));
+        streams.erase(at);
+        const auto was_open = std::find(open.begin(), open.end(), fd);
+        const bool has_one = was_open != open.end();
+        ASSERT_EQ(Closings::take(), has_one ? Descriptors{fd} : Descriptors{});
+        if (has_one) open.erase(was_open);
+      }
+    }
+    for (zxStream* stream : streams) EXPECT_TRUE(zxStream::close(stream));
+    Closings::take();
+    zxStream::close_all();
+    EXPECT_EQ(Closings::take(), Descriptors{});
+  }
+}
+
+TEST(zxfile, closing_all_leaves_the_standard_streams_alone) {
+  const Closings closings;
+  zxStream::close_all();
+  EXPECT_EQ(Closings::take(), Descriptors{});
+  for (const zxplat::Fd fd :
+       {zxplat::k_stdin_fd, zxplat::k_stdout_fd, zxplat::k_stderr_fd})
+    EXPECT_EQ(zx_standard_stream(fd).descriptor(), fd);
+}
+
+// What the standard streams hold is neither lost nor written by it.
+ZX_CASE(zxfile_closes_all) {
+  init_zxlib_args(argc, argv);
+  char byte = '?';
+  g_stdin.read(&byte, 1);
+  oprint("first ");
+  zxStream::close_all();
+  zxplat::write_all(zxplat::k_stdout_fd, "closed ");
+  g_stdin.read(&byte, 1);
+  oprint("then #", byte);
+  eprint("errors");
+  return 0;
+}
+
+TEST(zxfile, the_standard_streams_work_on_behind_closing_all) {
+  kit::ProcessOptions options;
+  options.input = "ab";
+  const auto result = kit::run_case("zxfile_closes_all", {}, options);
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out, "closed first then b");
+  EXPECT_EQ(result.err, "errors");
+}
+
+TEST(zxfile, a_file_above_a_stream_closes_without_failing) {
+  for (const bool is_explicit : {true, false}) {
+    const Closings closings;
+    const TestFile written("");
+    const TestFile read("abc");
+    const kit::Failure failure = kit::failure_of([&] {
+      zxBFile output;
+      zxBFile input;
+      output.create(written.name.c_str());
+      output.puts("text");
+      input.open_or_die(read.name.c_str());
+      char byte;
+      input.read_all(&byte, 1);
+      zxStream::close_all();
+      if (!is_explicit) return;  // the destructors close
+      output.close(no_detail);
+      EXPECT_TRUE(input.close());
+    });
+    EXPECT_FALSE(failure.failed) << failure.screen;
+    EXPECT_EQ(written.bytes(), "text");
+  }
 }
 
 // ---- failing calls

@@ -16,6 +16,8 @@
 #include <utility>
 #include <vector>
 
+#include "kit/cases.h"
+#include "kit/faults.h"
 #include "kit/process.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
@@ -201,7 +203,6 @@ TEST(zxplat, calls_that_succeed_leave_the_last_error_alone) {
   zxplat::current_directory(text);
   zxplat::temp_directory(text);
   zxplat::is_terminal(zxplat::k_stdin_fd);
-  zxplat::heap_realloc(zxplat::heap_realloc(nullptr, 10), 0);
   zxplat::process.sleep(1);
   zxplat::process.clock();
   zxplat::process.ticks();
@@ -426,6 +427,37 @@ TEST(zxplat, transfers_of_no_bytes_succeed) {
   const Open file(dir.file("a"), OpenMode::read_write);
   EXPECT_EQ(files.read(file.fd, nullptr, 0), 0);
   EXPECT_EQ(files.write(file.fd, nullptr, 0), 0);
+}
+
+TEST(zxplat, a_text_is_written_whole_however_little_goes_at_once) {
+  const TempDir dir;
+  const std::string text(1000, 'x');
+  for (const std::size_t most : {1U, 7U, 999U, 1000U, 2000U}) {
+    kit::Faults faults;
+    faults.limit_writes(most);
+    {
+      const Open file(dir.file("a"), OpenMode::create);
+      EXPECT_TRUE(zxplat::write_all(file.fd, text));
+      EXPECT_TRUE(zxplat::write_all(file.fd, ""));
+    }
+    EXPECT_EQ(faults.count(kit::Call::write),
+              static_cast<int>((text.size() + most - 1) / most));
+    EXPECT_EQ(kit::read_file(dir.file("a")), text);
+  }
+}
+
+TEST(zxplat, a_text_whose_bytes_are_refused_is_given_up) {
+  const TempDir dir;
+  const Open file(dir.file("a"), OpenMode::create);
+  kit::Faults faults;
+  faults.limit_writes(2);
+  faults.fail_nth(kit::Call::write, 2, zxplat::k_err_disk_full);
+  EXPECT_FALSE(zxplat::write_all(file.fd, "abcdef"));
+  EXPECT_EQ(last_error(), zxplat::k_err_disk_full);
+  EXPECT_EQ(faults.count(kit::Call::write), 2);
+  EXPECT_EQ(kit::read_file(dir.file("a")), "ab");
+  faults.limit_writes(0);  // a write of nothing, again and again
+  EXPECT_FALSE(zxplat::write_all(file.fd, "abcdef"));
 }
 
 TEST(zxplat, seeking_counts_from_start_position_and_end) {
@@ -811,6 +843,29 @@ TEST(zxplat, a_file_called_nul_is_out_of_reach) {
   expect_missing("nul", zxplat::k_err_not_found);
   expect_remove_fails("nul", zxplat::k_err_not_found);
   expect_rename_fails("nul", "b", zxplat::k_err_not_found);
+}
+
+// ----------------------------------------------------------- the printer --
+
+TEST(zxplat, the_native_names_have_no_printer) {
+  if (kit::on_windows()) GTEST_SKIP() << "the system may have one";
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  for (const std::string name : {"prn", "PRN", "Prn", "lpt1", "LPT1", "Lpt1"}) {
+    expect_refused_everywhere(name, zxplat::k_err_not_found);
+  }
+  EXPECT_TRUE(fs::is_empty(dir.path()));
+}
+
+TEST(zxplat, names_that_begin_or_end_like_the_printer_are_names_natively) {
+  if (kit::on_windows()) GTEST_SKIP() << "the system has its own rules";
+  const TempDir dir;
+  const WorkingIn there(dir.path());
+  for (const std::string name :
+       {"prn.txt", "aprn", "prn1", "lpt", "lpt2", "lpt11", ".\\prn"}) {
+    write_through(name, OpenMode::create, name);
+    EXPECT_EQ(read_through(name), name);
+  }
 }
 
 // -------------------------------------------------------------- renaming --
@@ -1245,6 +1300,22 @@ TEST(zxplat, exit_ends_the_process_through_its_exit_handlers) {
   EXPECT_EQ(kit::read_file(dir.file("note")), "exit handlers ran");
 }
 
+TEST(zxplat, exit_at_once_ends_the_process_without_exit_handlers) {
+  if (!child_folder().empty()) {
+    std::atexit(leave_a_note);
+    zxplat::process.exit_at_once(78);
+  }
+  const TempDir dir;
+  EXPECT_EQ(run_as_child(dir).exit_code, 78);
+  EXPECT_FALSE(fs::exists(dir.file("note")));
+}
+
+TEST(zxplat, without_a_debugger_a_break_does_nothing) {
+  set_last_error(k_untouched);
+  zxplat::process.debug_break();
+  EXPECT_EQ(last_error(), k_untouched);
+}
+
 // The child's part: no file comes to stand under the number of a stream, and
 // what is said there is lost.
 void write_without_streams() {
@@ -1312,30 +1383,318 @@ TEST(zxplat, a_child_process_does_not_inherit_open_files) {
   EXPECT_EQ(result.exit_code, 0) << result.out;
 }
 
-// ---------------------------------------------------------------- memory --
+// ----------------------------------------------------------------- boxes --
 
-TEST(zxplat, the_heap_keeps_what_fits_when_a_block_is_resized) {
-  auto* block = static_cast<char*>(zxplat::heap_realloc(nullptr, 4));
-  ASSERT_NE(block, nullptr);
-  std::fill_n(block, 4, 'x');
-  block = static_cast<char*>(zxplat::heap_realloc(block, 100'000));
-  ASSERT_NE(block, nullptr);
-  EXPECT_EQ(std::string_view(block, 4), "xxxx");
-  block = static_cast<char*>(zxplat::heap_realloc(block, 2));
-  ASSERT_NE(block, nullptr);
-  EXPECT_EQ(std::string_view(block, 2), "xx");
-  EXPECT_EQ(zxplat::heap_realloc(block, 0), nullptr);
+constexpr const char* k_box_variable = "ZX_BOX_OUT";
+
+// What boxes and last words leave in the file that the variable names.
+std::string boxes_in_file(void (*action)()) {
+  const TempDir dir;
+  const Variables variables({k_box_variable});
+  kit::set_variable(k_box_variable, dir.file("boxes").c_str());
+  action();
+  return kit::read_file(dir.file("boxes"));
 }
 
-TEST(zxplat, an_exhausted_heap_gives_null_and_keeps_the_block) {
-  auto* block = static_cast<char*>(zxplat::heap_realloc(nullptr, 4));
-  ASSERT_NE(block, nullptr);
-  std::fill_n(block, 4, 'x');
+TEST(zxplat, a_box_is_written_as_caption_style_and_text) {
+  EXPECT_EQ(boxes_in_file(
+                [] { zxplat::process.message_box("text", "caption", 0x1010); }),
+            "caption\n0x1010\ntext\n");
+  EXPECT_EQ(boxes_in_file([] { zxplat::process.message_box("", "", 0); }),
+            "\n0x0000\n\n");
+}
+
+TEST(zxplat, the_style_of_a_box_is_in_hexadecimal) {
+  EXPECT_EQ(boxes_in_file([] {
+              for (const std::uint32_t style :
+                   {0U, 1U, 0xABCU, 0xFFFFU, 0x10000U, 0x12345678U, ~0U})
+                zxplat::process.message_box("t", "c", style);
+            }),
+            "c\n0x0000\nt\nc\n0x0001\nt\nc\n0x0abc\nt\nc\n0xffff\nt\n"
+            "c\n0x10000\nt\nc\n0x12345678\nt\nc\n0xffffffff\nt\n");
+}
+
+TEST(zxplat, boxes_and_last_words_are_added_to_the_file) {
+  EXPECT_EQ(boxes_in_file([] {
+              zxplat::process.last_words("last words");
+              zxplat::process.message_box("a\nb\r\n\xF9", "%s%n", 0x10);
+              zxplat::process.last_words("");
+              zxplat::process.last_words("more\n");
+            }),
+            "last words%s%n\n0x0010\na\nb\r\n\xF9\nmore\n");
+}
+
+TEST(zxplat, a_long_text_of_a_box_is_written_in_bounds) {
+  static const std::string text(100'000, 'x');
+  const std::string written = boxes_in_file(
+      [] { zxplat::process.message_box(text.c_str(), "caption", 0x1010); });
+  const std::string head = "caption\n0x1010\n";
+  EXPECT_TRUE(written.starts_with(head));
+  EXPECT_GT(written.size(), 17'000U);  // the longest message of a failure
+  EXPECT_LE(written.size(), head.size() + text.size() + 1);
+  EXPECT_EQ(written.find_first_not_of("x\n", head.size()), written.npos);
+  EXPECT_EQ(boxes_in_file([] { zxplat::process.last_words(text.c_str()); }),
+            text);
+}
+
+ZX_CASE(zxplat_says_box_and_last_words) {
+  zxplat::prepare_process();
+  zxplat::process.message_box("text", "caption", 0x1010);
+  zxplat::process.last_words("last words");
+  return 3;
+}
+
+TEST(zxplat, boxes_can_be_sent_to_standard_error) {
+  kit::ProcessOptions options;
+  options.variables = {{k_box_variable, "-"}};
+  const kit::ProcessResult result =
+      kit::run_case("zxplat_says_box_and_last_words", {}, options);
+  EXPECT_EQ(result.exit_code, 3);
+  EXPECT_EQ(result.err, "caption\n0x1010\ntext\nlast words");
+  EXPECT_EQ(result.out, "");
+}
+
+TEST(zxplat, boxes_are_written_to_standard_error_natively) {
+  if (kit::on_windows()) GTEST_SKIP() << "they would be shown";
+  const TempDir dir;
+  kit::ProcessOptions unset;
+  unset.removed_variables = {k_box_variable};
+  kit::ProcessOptions empty;
+  empty.variables = {{k_box_variable, ""}};
+  kit::ProcessOptions not_to_be_opened;
+  not_to_be_opened.variables = {{k_box_variable, dir.file("no\\box")}};
+  for (const auto& options : {unset, empty, not_to_be_opened}) {
+    const kit::ProcessResult result =
+        kit::run_case("zxplat_says_box_and_last_words", {}, options);
+    EXPECT_EQ(result.exit_code, 3);
+    EXPECT_EQ(result.err, "caption\n0x1010\ntext\nlast words");
+    EXPECT_EQ(result.out, "");
+  }
+}
+
+// ---------------------------------------------------------------- faults --
+
+// Functions that end in a fault, and where their frame is then.  Sanitizers
+// would be ahead of the fault, and the compiler may know of none: it is to
+// note the frame behind it as well, so that it is still there.
+using Faulty = void (*)();
+volatile std::uintptr_t faulty_frame = 0;
+volatile int zero = 0;
+volatile int hundred = 100;
+int* volatile nowhere = nullptr;
+
+#define FAULTY                                           \
+  [[gnu::noinline, gnu::noipa, gnu::no_sanitize_address, \
+    gnu::no_sanitize_undefined]] void
+#define NOTE_FRAME() \
+  (faulty_frame = reinterpret_cast<std::uintptr_t>(__builtin_frame_address(0)))
+
+FAULTY write_to_nowhere() {
+  NOTE_FRAME();
+  *static_cast<volatile int*>(nowhere) = 1;
+  NOTE_FRAME();
+}
+
+FAULTY read_from_nowhere() {
+  NOTE_FRAME();
+  zero = *static_cast<volatile int*>(nowhere);
+  NOTE_FRAME();
+}
+
+FAULTY run_into_a_trap() {
+  NOTE_FRAME();
+  __builtin_trap();
+}
+
+FAULTY divide_by_zero() {
+  NOTE_FRAME();
+  zero = hundred / zero;
+  NOTE_FRAME();
+}
+
+// The frame of a fault in the depth is another one each time.
+FAULTY fill_the_stack() {
+  volatile char room[2000];
+  room[0] = 1;
+  NOTE_FRAME();
+  if (zero == 0) fill_the_stack();
+  room[1] = room[0];
+}
+
+struct FaultRow {
+  const char* name;
+  Faulty action;
+  int signal;
+  int sub_code;
+};
+constexpr FaultRow k_faults[] = {
+    {"write", write_to_nowhere, 11, 1}, {"read", read_from_nowhere, 11, 1},
+    {"trap", run_into_a_trap, 4, 2},    {"division", divide_by_zero, 8, 1},
+    {"stack", fill_the_stack, 11, 1},
+};
+
+Faulty faulty_function = nullptr;
+
+void say(const std::string& text) {
+  zxplat::write_all(zxplat::k_stdout_fd, text);
+}
+
+// Tells the fault, and whether its place is the one that it must have.
+void tell(const zxplat::Fault& fault) {
+  const auto start = reinterpret_cast<std::uintptr_t>(faulty_function);
+  constexpr std::uintptr_t k_most = 500;  // bytes of code
+  const bool is_there =
+      fault.instruction > start && fault.instruction < start + k_most;
+  say(std::to_string(fault.signal) + " " + std::to_string(fault.sub_code) +
+      (is_there ? " there" : " elsewhere") +
+      (fault.frame == faulty_frame ? " in its frame" : " in another frame"));
+}
+
+void tell_and_end(const zxplat::Fault& fault) {
+  tell(fault);
+  zxplat::process.exit_at_once(40);
+}
+
+void tell_and_fault(const zxplat::Fault& fault) {
+  tell(fault);
+  faulty_function();
+  say(" went on in the handler");
+}
+
+// Does what the first argument names, with the handler of the second.
+ZX_CASE(zxplat_faults) {
+  zxplat::prepare_process();
+  zxplat::catch_faults(argv[2] == "ends"sv         ? tell_and_end
+                       : argv[2] == "comes back"sv ? tell
+                                                   : tell_and_fault);
+  for (const FaultRow& row : k_faults)
+    if (argv[1] == std::string_view(row.name)) faulty_function = row.action;
+  faulty_function();
+  say(" went on");
+  return 0;
+}
+
+std::string told(const FaultRow& row) {
+  return std::to_string(row.signal) + " " + std::to_string(row.sub_code) +
+         " there in its frame";
+}
+
+TEST(zxplat, faults_are_reported_with_their_kind_and_their_place) {
+  for (const FaultRow& row : k_faults) {
+    SCOPED_TRACE(row.name);
+    const kit::ProcessResult result =
+        kit::run_case("zxplat_faults", {row.name, "ends"});
+    EXPECT_EQ(result.exit_code, 40);
+    if (row.action == fill_the_stack) {
+      // The fault may come ahead of the noting of the frame.
+      EXPECT_TRUE(result.out.starts_with("11 1 there in ")) << result.out;
+    } else {
+      EXPECT_EQ(result.out, told(row));
+    }
+  }
+}
+
+// What the process ends with is the system's own affair.
+TEST(zxplat, a_handler_that_comes_back_leaves_the_fault_to_the_system) {
+  for (const FaultRow& row : k_faults) {
+    if (row.action == fill_the_stack) continue;
+    SCOPED_TRACE(row.name);
+    const kit::ProcessResult result =
+        kit::run_case("zxplat_faults", {row.name, "comes back"});
+    EXPECT_FALSE(result.timed_out);
+    EXPECT_NE(result.exit_code, 0);
+    if (!kit::on_windows()) {
+      EXPECT_EQ(result.exit_code, -row.signal);
+    }
+    EXPECT_EQ(result.out, told(row));
+  }
+}
+
+TEST(zxplat, a_fault_of_the_handler_itself_ends_the_process) {
+  for (const FaultRow& row : k_faults) {
+    if (row.action == fill_the_stack) continue;
+    SCOPED_TRACE(row.name);
+    const kit::ProcessResult result =
+        kit::run_case("zxplat_faults", {row.name, "faults"});
+    EXPECT_FALSE(result.timed_out);
+    EXPECT_NE(result.exit_code, 0);
+    if (!kit::on_windows()) {
+      EXPECT_EQ(result.exit_code, -row.signal);
+    }
+    EXPECT_EQ(result.out, told(row));
+  }
+}
+
+// ---------------------------------------------------------------- memory --
+
+std::uintptr_t address_of(const void* place) {
+  return reinterpret_cast<std::uintptr_t>(place);
+}
+
+TEST(zxplat, memory_is_read_as_it_is) {
+  for (const std::size_t size :
+       {1U, 2U, 3U, 4U, 8U, 4095U, 4096U, 4097U, 65'536U, 1'000'001U}) {
+    for (const std::size_t shift : {0U, 1U, 3U, 4000U}) {
+      SCOPED_TRACE(testing::Message() << size << " at " << shift);
+      std::string from(shift + size, '\0');
+      for (std::size_t i = 0; i < from.size(); ++i)
+        from[i] = static_cast<char>(i * 7 + i / 256);
+      std::string out(size + 2, '#');
+      ASSERT_TRUE(zxplat::read_memory(address_of(from.data() + shift),
+                                      out.data() + 1, size));
+      ASSERT_TRUE(out == "#" + from.substr(shift) + "#");
+    }
+  }
+}
+
+const char k_constant[] = "read-only";
+
+TEST(zxplat, constants_and_code_can_be_told_from_nothing) {
+  char out[sizeof k_constant];
+  EXPECT_TRUE(zxplat::read_memory(address_of(k_constant), out, sizeof out));
+  EXPECT_STREQ(out, "read-only");
+  char byte = 'x';
+  EXPECT_TRUE(zxplat::read_memory(address_of(&byte), out, 1));
+  EXPECT_EQ(out[0], 'x');
+}
+
+TEST(zxplat, what_is_not_there_cannot_be_read) {
+  constexpr std::uintptr_t k_last = ~std::uintptr_t{0};
+  std::vector<char> out(100'000);
+  for (const std::uintptr_t from :
+       {std::uintptr_t{0}, std::uintptr_t{1}, std::uintptr_t{16},
+        std::uintptr_t{4095}, k_last, k_last - 7, k_last - 4096}) {
+    for (const std::size_t size : {std::size_t{1}, std::size_t{8},
+                                   std::size_t{4096}, std::size_t{100'000}})
+      EXPECT_FALSE(zxplat::read_memory(from, out.data(), size))
+          << from << ' ' << size;
+  }
+}
+
+TEST(zxplat, memory_is_read_whole_or_not_at_all) {
+  const kit::GuardedMemory memory(200'000);
+  const auto size = static_cast<std::size_t>(memory.end() - memory.begin());
+  std::fill(memory.begin(), memory.end(), 'x');
+  std::string out(size + 1, '#');
+  EXPECT_TRUE(
+      zxplat::read_memory(address_of(memory.begin()), out.data(), size));
+  EXPECT_TRUE(out == std::string(size, 'x') + '#');
+  EXPECT_FALSE(
+      zxplat::read_memory(address_of(memory.begin()), out.data(), size + 1));
+  for (std::size_t i = 1; i <= 5000; i += i < 40 ? 1 : 31) {
+    const std::uintptr_t from = address_of(memory.end()) - i;
+    ASSERT_TRUE(zxplat::read_memory(from, out.data(), i)) << i;
+    ASSERT_FALSE(zxplat::read_memory(from, out.data(), i + 1)) << i;
+    ASSERT_FALSE(zxplat::read_memory(from + i, out.data(), 1)) << i;
+  }
+}
+
+TEST(zxplat, reading_memory_leaves_the_last_error_alone) {
+  char byte = 'x';
+  char out;
   set_last_error(k_untouched);
-  EXPECT_EQ(zxplat::heap_realloc(block, SIZE_MAX / 2), nullptr);
-  EXPECT_EQ(last_error(), zxplat::k_err_no_memory);
-  EXPECT_EQ(std::string_view(block, 4), "xxxx");
-  zxplat::heap_realloc(block, 0);
+  EXPECT_TRUE(zxplat::read_memory(address_of(&byte), &out, 1));
+  EXPECT_EQ(last_error(), k_untouched);
 }
 
 // ---------------------------------------------------------------- tables --
@@ -1351,6 +1710,7 @@ int g_slept = 0;
 
 TEST(zxplat, a_test_can_replace_entries_of_the_tables) {
   const TempDir dir;
+  g_slept = 0;
   files.remove = [](std::string_view) {
     set_last_error(zxplat::k_err_sharing);
     return false;
