@@ -12,8 +12,9 @@
 // when it is filled to four fifths.  ref() grows ahead of its insertion,
 // also when the key is there already; set() grows behind it.
 //
-// References to values last until the next insertion or removal, so
-// t.ref(a) = t.get(b) is the caller's fault; t.set(a, t.get(b)) is safe.
+// References to keys and values last until the next set(), ref(), erase() or
+// grow(), so t.ref(a) = t.get(b) is the caller's fault; the arguments of these
+// operations themselves may lie in the table.
 //
 //   zxSA<zxStr> colours;
 //   colours.ref("sky") = "blue";
@@ -117,7 +118,7 @@ class zxAA {
   // The value, or the shared empty value.
   const V& get(const K& key) const {
     const V* value = find(key);
-    return value ? *value : zx_empty_value<V>;
+    return value ? *value : zx_empty_value<V>();
   }
 
   // The value; a key that is not there: message 2202.
@@ -131,12 +132,10 @@ class zxAA {
   // The value for writing; a new key gets a default value first.
   V& ref(const K& key) {
     if (!check_with(key)) return zx_scratch_value<V>();
+    if (!is_filled()) return ref_in_room(key);
+    const K kept(key);  // the block may move under `key`
     grow(0);
-    const Place place = place_of(key);
-    if (place.entry != nullptr) return place.entry->value;
-    Entry* entry = add_entry(place, key);
-    if (entry == nullptr) return zx_scratch_value<V>();
-    return *::new (static_cast<void*>(&entry->value)) V();
+    return ref_in_room(kept);
   }
 
   // Inserts or overwrites.
@@ -153,7 +152,6 @@ class zxAA {
     ::new (static_cast<void*>(&entry->value)) V(value);
     grow(0);
   }
-
   // Removes a key; one that is not there: message 2204.
   void erase(const K& key) {
     if (!check_with(key)) return;
@@ -181,7 +179,7 @@ class zxAA {
   // least) if that is more than it has, else to the next of its sizes.
   // Beyond 32 bits of bytes: message 2201.
   void grow(std::int32_t wanted) {
-    if (std::int64_t{count} + count / 4 < capacity) return;
+    if (!is_filled()) return;
     const std::int64_t size = next_size(wanted);
     if (size >= k_limit) return bail_code(2201);
     resize(static_cast<std::int32_t>(size));
@@ -205,6 +203,8 @@ class zxAA {
     return {table, slots_in_order(), capacity, 0};
   }
   const_iterator end() const& { return {table, nullptr, capacity, capacity}; }
+  const_iterator begin() const&& = delete;
+  const_iterator end() const&& = delete;
 
  protected:
   using Traits = zxKeyTraits<K>;
@@ -243,8 +243,9 @@ class zxAA {
   static_assert(alignof(Entry) <= alignof(Header));
 
   static constexpr std::int64_t k_byte_limit = 0xFFFFFFFF / sizeof(Entry);
+  static constexpr std::int64_t k_count_limit = std::int64_t{INT32_MAX} + 1;
   static constexpr std::int64_t k_limit =
-      k_byte_limit > INT32_MAX ? INT32_MAX : k_byte_limit;
+      k_byte_limit > k_count_limit ? k_count_limit : k_byte_limit;
   static constexpr std::int32_t k_first_size = 64;
   static constexpr std::int32_t k_step = 1024;  // beyond this, growth by it
 
@@ -339,7 +340,18 @@ class zxAA {
     return entry;
   }
 
+  V& ref_in_room(const K& key) {
+    const Place place = place_of(key);
+    if (place.entry != nullptr) return place.entry->value;
+    Entry* entry = add_entry(place, key);
+    if (entry == nullptr) return zx_scratch_value<V>();
+    return *::new (static_cast<void*>(&entry->value)) V();
+  }
+
   // ---- growth
+
+  // True if the table is to grow: it is filled to four fifths.
+  bool is_filled() const { return std::int64_t{count} + count / 4 >= capacity; }
 
   std::int64_t next_size(std::int32_t wanted) const {
     constexpr std::int32_t k_least = 32;
@@ -395,8 +407,7 @@ class zxAA {
   std::int32_t mask = 0;      // capacity - 1 for a power of two, else 0
 };
 
-// Walks the occupied slots.  Like references to values it lasts until the
-// next insertion or removal.
+// Walks the occupied slots.  It lasts as long as references to values do.
 template <class K, class V>
 template <class Value>
 class zxAA<K, V>::Iterator {
@@ -475,7 +486,7 @@ class zxSA : public zxAA<zxStr, V> {
   template <class Key>
   const V& get(const Key& key) const {
     const V* value = find(key);
-    return value ? *value : zx_empty_value<V>;
+    return value ? *value : zx_empty_value<V>();
   }
   template <class Key>
   bool contains(const Key& key) const {

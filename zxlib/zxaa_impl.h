@@ -218,7 +218,7 @@ struct Growth {
 };
 
 // What stands ahead of the entries.
-struct alignas(16) Header {
+struct alignas(8) Header {
   Index index;
   SlotOrder order;
   std::int32_t room;     // slots for which the block is laid out

@@ -55,6 +55,12 @@ bool zxStream::close_descriptor() {
   return old == zxplat::k_no_fd || zxplat::files.close(old);
 }
 
+void zxStream::flush_all() {
+  for (zxStream* stream = newest_stream; stream != nullptr;
+       stream = stream->older)
+    stream->flush();
+}
+
 void zxStream::close_all() {
   for (zxStream* stream = newest_stream; stream != nullptr;
        stream = stream->older) {

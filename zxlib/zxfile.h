@@ -45,6 +45,9 @@ class zxStream {
   // its last words.
   static void close_all();
 
+  // Writes down what all of them have buffered, for the end of the process.
+  static void flush_all();
+
   // Reads up to `size` bytes; the count.  A short count sets eof() or
   // error().
   std::size_t read(void* out, std::size_t size);

@@ -96,6 +96,8 @@ void clear_at_exit() {
   g_stdin.close();
   g_stdout.close();
   g_stderr.close();
+  // Files that were open when a failure or the usage screen ended the process.
+  zxStream::flush_all();
   // The strings of a module that are destroyed still later.
   if ((traits & k_trait_executable) == 0) zx_realloc = zx_realloc_after_cleanup;
 }

@@ -36,8 +36,8 @@ std::size_t write_shown_name(const char* name) {
   return shown;
 }
 
-// One button "OK".
-constexpr std::uint32_t k_box_style = 0;
+// One button "OK", the sign of an error, ahead of every other window.
+constexpr std::uint32_t k_box_style = 0x1010;
 
 // No caller can go on without the block, not even while another failure is
 // being handled.

@@ -2,6 +2,8 @@
 // Tests: tests/zxlib/zxpkg_test.cpp.
 #include "zxpkg.h"
 
+#include <cstring>
+
 constinit ZxPackage* packages = nullptr;
 
 void register_package(ZxPackage* package) {
@@ -9,8 +11,8 @@ void register_package(ZxPackage* package) {
   ZxPackage** place = &packages;
   for (; *place != nullptr; place = &(*place)->next) {
     const ZxPackage& other = **place;
-    if (!(zxStr(other.name) == package->name)) continue;
-    ZX_ASSERT(zxStr(other.version) == package->version);
+    if (std::strcmp(other.name, package->name) != 0) continue;
+    ZX_ASSERT(std::strcmp(other.version, package->version) == 0);
     return;
   }
   *place = package;

@@ -227,7 +227,8 @@ struct Fault {
   std::uintptr_t instruction;
 };
 
-// Has faults reported to `handler`, which runs on a stack of its own.  If it
+// Has faults reported to `handler`, which runs on a stack of its own, but for
+// arithmetic: there it runs on the stack of the place that failed.  If it
 // comes back from a fault, the system's own action takes place: the end of
 // the process.  A signal that the process sent itself is over then.
 // The system's boxes for failing devices are switched off.

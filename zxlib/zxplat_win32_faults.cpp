@@ -57,6 +57,19 @@ constexpr ULONG k_reporting_room = 64 * 1024;
   ::TerminateProcess(::GetCurrentProcess(), 3);
 }
 
+DWORD address_of(const void* place) {
+  return static_cast<DWORD>(reinterpret_cast<std::uintptr_t>(place));
+}
+
+// Has the thread go on in handle_fault() as if the place of the fault had
+// called it, with the stack below `top`.
+void call_on_stack(CONTEXT& registers, DWORD top) {
+  top = (top & ~DWORD{15}) - sizeof(DWORD);
+  std::memcpy(reinterpret_cast<void*>(top), &registers.Eip, sizeof(DWORD));
+  registers.Esp = top;
+  registers.Eip = address_of(reinterpret_cast<const void*>(handle_fault));
+}
+
 LONG WINAPI on_exception(EXCEPTION_POINTERS* found) {
   const DWORD exception = found->ExceptionRecord->ExceptionCode;
   const auto* row =
@@ -66,11 +79,10 @@ LONG WINAPI on_exception(EXCEPTION_POINTERS* found) {
   ::SetUnhandledExceptionFilter(nullptr);  // the next one is the system's
   CONTEXT& registers = *found->ContextRecord;
   current_fault = {row->signal, row->sub_code, registers.Ebp, registers.Eip};
-  registers.Esp = static_cast<DWORD>(
-      reinterpret_cast<std::uintptr_t>(std::end(fault_stack) - 64));
-  registers.Ebp = 0;
-  registers.Eip =
-      static_cast<DWORD>(reinterpret_cast<std::uintptr_t>(handle_fault));
+  if (row->signal == k_arithmetic)
+    call_on_stack(registers, registers.Esp);
+  else
+    call_on_stack(registers, address_of(std::end(fault_stack) - 64));
   return EXCEPTION_CONTINUE_EXECUTION;
 }
 

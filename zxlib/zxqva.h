@@ -33,16 +33,23 @@
 #include "zxmisc.h"
 
 // The value that stands for an element that is not there; never written to.
+// It is made at the first use and never destroyed: constructors and
+// destructors of static objects may come here.
 template <class T>
-inline const T zx_empty_value{};
+const T& zx_empty_value() {
+  alignas(T) static unsigned char room[sizeof(T)];
+  static const T* const value = ::new (static_cast<void*>(room)) T();
+  return *value;
+}
 
 // A place that may be written to when the right one is out of reach; each
-// call makes it default again.
+// call makes it default again.  It is never destroyed either.
 template <class T>
 T& zx_scratch_value() {
-  static T value;
-  value = T();
-  return value;
+  alignas(T) static unsigned char room[sizeof(T)];
+  static T* const value = ::new (static_cast<void*>(room)) T();
+  *value = T();
+  return *value;
 }
 
 template <class T>
@@ -64,16 +71,18 @@ class zxQVA {
   T* end() & { return first + count; }
   const T* begin() const& { return first; }
   const T* end() const& { return first + count; }
+  const T* begin() const&& = delete;
+  const T* end() const&& = delete;
 
   // Element i; outside 0 to length() - 1 an assertion fails.
   T& get(std::int32_t i) { return is_live(i) ? first[i] : scratch(); }
   const T& get(std::int32_t i) const {
-    return is_live(i) ? first[i] : zx_empty_value<T>;
+    return is_live(i) ? first[i] : zx_empty_value<T>();
   }
 
   // Element i, or the shared empty value when there is none.
   const T& get_or(std::int32_t i) const {
-    return check() && zx_wide(i) < count ? first[i] : zx_empty_value<T>;
+    return check() && zx_wide(i) < count ? first[i] : zx_empty_value<T>();
   }
 
   // Element i for writing; the array grows to hold it.  A negative index
@@ -181,8 +190,9 @@ class zxQVA {
   // The smallest number of elements whose size does not fit 32 bits, and
   // never more than a count can be.
   static constexpr std::int64_t k_byte_limit = 0xFFFFFFFF / sizeof(T);
+  static constexpr std::int64_t k_count_limit = std::int64_t{INT32_MAX} + 1;
   static constexpr std::int64_t k_limit =
-      k_byte_limit > INT32_MAX ? INT32_MAX : k_byte_limit;
+      k_byte_limit > k_count_limit ? k_count_limit : k_byte_limit;
 
   // From this index on growth is by a sixteenth.
   static constexpr std::int32_t k_large = 128;

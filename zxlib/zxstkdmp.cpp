@@ -21,6 +21,9 @@ constexpr std::size_t k_words_per_row = 8;
 // A chain that breaks this early says little; the raw stack may say more.
 constexpr int k_telling_frames = 3;
 
+// More markers than any program has at a time: a list that goes on is broken.
+constexpr int k_max_markers = 1000;
+
 constexpr std::size_t k_raw_words = 0x40000;
 constexpr std::size_t k_raw_step = 32;  // bytes, probed together
 
@@ -197,13 +200,27 @@ class Walk {
 
   // The lines of the markers that lie in this frame.
   void write_markers_up_to(Word end) {
-    for (; cursor != nullptr && cursor->stack_pos <= end;
-         cursor = cursor->next) {
+    for (; can_follow_cursor() && cursor->stack_pos <= end;
+         cursor = cursor->next, ++markers) {
       char room[k_description_room];
       zxText text(room);
+      dump_file.flush();  // the description is not ours
       stack_dump_hooks.describe(*cursor, text);
       write_line("@APP ", text.view());
     }
+  }
+
+  // True if there is a marker at the cursor, as far as can be told: its bytes
+  // can be read, and so can the table of functions that they begin with.
+  bool can_follow_cursor() const {
+    alignas(zxFrameMarker) char bytes[sizeof(zxFrameMarker)];
+    Word table;
+    if (cursor == nullptr || markers >= k_max_markers ||
+        !zxplat::read_memory(reinterpret_cast<Word>(cursor), bytes,
+                             sizeof bytes))
+      return false;
+    std::memcpy(&table, bytes, sizeof table);
+    return zxplat::read_memory(table, &table, sizeof table);
   }
 
   void write_frame(const Frame& frame) {
@@ -284,6 +301,7 @@ class Walk {
   int frames = 0;
   bool in_fault;
   const zxFrameMarker* cursor = frame_markers;
+  int markers = 0;
 };
 
 // ------------------------------------------------------------- the parts --
@@ -356,19 +374,26 @@ zxFrameMarker::zxFrameMarker(std::int32_t value)
   push_frame_marker(this);
 }
 
-zxFrameMarker::~zxFrameMarker() { pop_frame_marker(this); }
+namespace {
+
+// The place in the list that holds the marker, or null.
+zxFrameMarker** find_marker(const zxFrameMarker* marker) {
+  zxFrameMarker** at = &frame_markers;
+  for (int i = 0; i < k_max_markers && *at != nullptr; ++i, at = &(*at)->next)
+    if (*at == marker) return at;
+  return nullptr;
+}
+
+}  // namespace
 
 void push_frame_marker(zxFrameMarker* marker) {
+  if (!ZX_ASSERT(find_marker(marker) == nullptr)) return;
   marker->next = frame_markers;
   frame_markers = marker;
 }
 
 void pop_frame_marker(zxFrameMarker* marker) {
   const bool innermost = frame_markers == marker;
-  for (zxFrameMarker** at = &frame_markers; *at != nullptr; at = &(*at)->next) {
-    if (*at != marker) continue;
-    *at = marker->next;
-    break;
-  }
+  if (zxFrameMarker** place = find_marker(marker)) *place = marker->next;
   ZX_ASSERT(innermost);
 }

@@ -47,7 +47,7 @@ class zxStr;
 class zxFrameMarker {
  public:
   explicit zxFrameMarker(std::int32_t value = 0);
-  virtual ~zxFrameMarker();
+  virtual ~zxFrameMarker();  // inline: derived classes may have RTTI
   zxFrameMarker(const zxFrameMarker&) = delete;
   zxFrameMarker& operator=(const zxFrameMarker&) = delete;
 
@@ -63,11 +63,13 @@ class zxFrameMarker {
 // The innermost marker; null if there is none.
 extern zxFrameMarker* frame_markers;
 
-// What the constructor and the destructor of a marker do.  A marker that is
-// not the innermost one fails an assertion in popping, and is taken out all
-// the same: it is about to be gone.
+// What the constructor and the destructor of a marker do.  Pushing one that
+// is in the list fails an assertion.  So does popping one that is not the
+// innermost; it is taken out all the same, since it is about to be gone.
 void push_frame_marker(zxFrameMarker* marker);
 void pop_frame_marker(zxFrameMarker* marker);
+
+inline zxFrameMarker::~zxFrameMarker() { pop_frame_marker(this); }
 
 // Writes the dump.  `check` must be 0x1234: it is the word by which the walk
 // knows that it starts from the right frame.

@@ -233,16 +233,14 @@ bool zxStr::operator==(const char* text) const {
 
 bool zxStr::operator==(char byte) const { return equals(&byte, 1); }
 
-std::strong_ordering zxStr::order(const char* text, std::int32_t size) const {
+std::strong_ordering zxStr::order(std::string_view text) const {
   if (!check()) return std::strong_ordering::equal;
-  const std::int32_t common = rep->length < size ? rep->length : size;
-  const int bytes = std::memcmp(rep->data, text, zx_size(common));
-  return bytes != 0 ? bytes <=> 0 : rep->length <=> size;
+  return view() <=> text;
 }
 
 std::strong_ordering zxStr::operator<=>(const char* text) const {
   if (!ZX_ASSERT(text != nullptr)) return std::strong_ordering::equal;
-  return order(text, zx_count(std::strlen(text)));
+  return order(text);
 }
 
 void zxStr::copy_to(char* out, std::int32_t size) const {
@@ -309,6 +307,7 @@ void zxStr::set_length(std::int32_t n) {
 
 char* zxStr::buffer(std::int32_t n) {
   set_length(n);
+  if (rep->length != n) return nullptr;  // a failure that was dropped
   unshare();
   return rep->data;
 }
@@ -317,8 +316,11 @@ void zxStr::sync_length() {
   if (!check()) return;
   const void* end = std::memchr(rep->data, '\0', zx_size(rep->capacity) + 1);
   if (!ZX_ASSERT(end != nullptr)) return;
-  rep->length =
+  const auto length =
       static_cast<std::int32_t>(static_cast<const char*>(end) - rep->data);
+  if (length == rep->length) return;
+  unshare();
+  rep->length = length;
 }
 
 // ---- appending

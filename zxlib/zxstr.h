@@ -127,8 +127,7 @@ class zxStr {
   bool operator==(const char* text) const;
   bool operator==(char byte) const;
   friend std::strong_ordering operator<=>(const zxStr& a, const zxStr& b) {
-    return b.check() ? a.order(b.rep->data, b.rep->length)
-                     : std::strong_ordering::equal;
+    return b.check() ? a.order(b.view()) : std::strong_ordering::equal;
   }
   std::strong_ordering operator<=>(const char* text) const;
 
@@ -143,7 +142,7 @@ class zxStr {
   void set_length(std::int32_t n);
 
   // set_length(n), unshared: the place for up to n characters and a NUL.  The
-  // caller fills it and calls sync_length().
+  // caller fills it and calls sync_length().  Null if n was refused.
   char* buffer(std::int32_t n);
 
   // Sets the length by the first NUL within the capacity, which a caller of
@@ -218,7 +217,7 @@ class zxStr {
            r.data[zx_wide(r.length)] == '\0';
   }
   bool equals(const char* text, std::int32_t size) const;
-  std::strong_ordering order(const char* text, std::int32_t size) const;
+  std::strong_ordering order(std::string_view text) const;
   void share(const zxStr& other) {
     rep = other.rep;
     ++rep->refs;

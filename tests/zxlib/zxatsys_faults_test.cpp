@@ -366,6 +366,7 @@ ZX_CASE(zxatsys_faults_in_emergency) {
 
 ZX_CASE(zxatsys_faults_in_exit_handler) {
   start();
+  if (argc > 2) traits &= ~k_trait_console;
   install_fault_handlers();
   late_action = wanted_action(argv);
   std::atexit([] { say("last"); });
@@ -423,6 +424,20 @@ TEST(zxatsys_faults, a_signal_sent_during_a_failure_is_passed_over) {
                "act went on " + k_screen_12);
     expect_end(outcome_of("zxatsys_faults_in_exit_handler", {way}).process,
                k_screen_12 + "act went on last");
+  }
+}
+
+// It is not even a failure that would be dropped.
+TEST(zxatsys_faults, a_signal_sent_during_a_failure_has_no_last_words) {
+  for (const char* way : {"send arithmetic", "send bad address"}) {
+    SCOPED_TRACE(way);
+    const Outcome outcome =
+        outcome_of("zxatsys_faults_in_exit_handler", {way, "windowed"});
+    EXPECT_EQ(outcome.process.exit_code, 100);
+    EXPECT_TRUE(outcome.process.out.ends_with("act went on last"));
+    EXPECT_EQ(outcome.box,
+              "P FATAL ERROR (v)\n0x1010\n 1012: seek: operation failed\n"
+              "[1012-1012-0/0-0/0//]\nProgram Terminated.\n\n");
   }
 }
 

@@ -283,6 +283,14 @@ TEST(zxatsys_report, a_printer_that_gives_out_is_closed_all_the_same) {
   }
 }
 
+TEST(zxatsys_report, a_printer_that_takes_nothing_is_given_up) {
+  Office office;
+  office.write_limit = 0;
+  office.write_dump("dump\r\n");
+  EXPECT_EQ(office.report(), "");
+  EXPECT_EQ(office.closed, 2);
+}
+
 TEST(zxatsys_report, texts_of_any_length_are_printed_in_bounds) {
   static const std::string text(100'000, 'x');
   Office office;

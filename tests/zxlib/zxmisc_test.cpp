@@ -7,17 +7,30 @@
 
 #include <cctype>
 #include <climits>
+#include <cstdlib>
 #include <cstring>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "kit/cases.h"
 #include "kit/failure.h"
 #include "zxatsys.h"
 #include "zxatsys_impl.h"
+#include "zxlib/failure_road.h"
+#include "zxplat.h"
+#include "zxsfmt.h"
 #include "zxstr.h"
 
 namespace {
+
+using failure_road::expect_end;
+using failure_road::Outcome;
+using failure_road::outcome_of;
+using failure_road::Recorder;
+using failure_road::say;
+using failure_road::screen;
+using failure_road::start;
 
 // More than any address space has, and no overflow in itself.
 constexpr std::size_t k_absurd_size = SIZE_MAX / 2;
@@ -248,6 +261,156 @@ TEST(zxmisc, an_exhausted_heap_during_a_failure_ends_the_process) {
   EXPECT_FALSE(result.timed_out);
   EXPECT_EQ(result.exit_code, 100);
   EXPECT_EQ(result.out, "");
+}
+
+ZX_CASE(zxmisc_exhausts_the_heap) {
+  start();
+  std::atexit([] { say("handler"); });
+  oprint("working");
+  zx_realloc(nullptr, k_absurd_size);
+  return 0;
+}
+
+TEST(zxmisc, an_exhausted_heap_ends_the_process_as_any_failure) {
+  const kit::ProcessResult process =
+      outcome_of("zxmisc_exhausts_the_heap").process;
+  EXPECT_FALSE(process.timed_out);
+  EXPECT_EQ(process.exit_code, 100);
+  EXPECT_EQ(process.out,
+            "working" +
+                screen("2000: malloc: out of mem", "[2000-2000-0/8-0/8//]") +
+                "handler");
+}
+
+// ------------------------------------- the slot of a module: the beginning --
+
+constexpr char k_early_box[] =
+    "box 4112 fatal init error: Using static string/array in a ZXL.";
+
+// A recorder of a program of these traits, whose library has been started or
+// not.
+class Program : public Recorder {
+ public:
+  Program(std::uint32_t its_traits, bool is_started) {
+    traits = its_traits;
+    zx_is_started = is_started;
+  }
+  ~Program() { zx_is_started = true; }
+};
+
+TEST(zxmisc, a_module_that_is_not_started_can_have_no_memory) {
+  for (const std::uint32_t its_traits : {0U, k_trait_console}) {
+    const Program module(its_traits, false);
+    void* block = zx_heap_realloc(nullptr, 10);
+    EXPECT_EQ(module.events, (std::vector<std::string>{k_early_box, "exit 9"}));
+    block = zx_heap_realloc(block, 20);
+    EXPECT_EQ(module.events, (std::vector<std::string>{k_early_box, "exit 9",
+                                                       k_early_box, "exit 9"}));
+    zx_is_started = true;
+    zx_heap_realloc(block, 0);
+  }
+}
+
+TEST(zxmisc, a_static_string_of_a_module_is_told_when_it_is_made) {
+  const Program module(k_trait_console, false);
+  const zxStr nothing;
+  EXPECT_EQ(module.events, std::vector<std::string>{});
+  const zxStr text("text");
+  EXPECT_EQ(module.events, (std::vector<std::string>{k_early_box, "exit 9"}));
+  zx_is_started = true;
+}
+
+TEST(zxmisc, started_modules_and_programs_have_memory) {
+  const struct {
+    std::uint32_t its_traits;
+    bool is_started;
+  } rows[] = {
+      {0, true},
+      {k_trait_console, true},
+      {k_trait_executable, false},
+      {k_trait_executable, true},
+      {k_trait_console | k_trait_executable, false},
+  };
+  for (const auto& row : rows) {
+    const Program program(row.its_traits, row.is_started);
+    void* block = zx_heap_realloc(nullptr, 10);
+    EXPECT_NE(block, nullptr);
+    block = zx_heap_realloc(block, 1000);
+    EXPECT_NE(block, nullptr);
+    EXPECT_EQ(zx_heap_realloc(block, 0), nullptr);
+    EXPECT_EQ(program.events, std::vector<std::string>{});
+  }
+}
+
+ZX_CASE(zxmisc_module_asks_early) {
+  traits = k_trait_console;
+  std::atexit([] { say("handler"); });
+  const zxStr text("text");
+  say("not here");
+  return text.length();
+}
+
+TEST(zxmisc, a_module_that_asks_for_memory_too_early_ends_with_9) {
+  const Outcome outcome = outcome_of("zxmisc_module_asks_early");
+  expect_end(outcome.process, "handler", 9);
+  EXPECT_EQ(outcome.box,
+            "fatal init error\n0x1010\nUsing static string/array in a ZXL.\n");
+  EXPECT_EQ(outcome.dump, "");
+}
+
+// ------------------------------------------- the slot of a module: the end --
+
+TEST(zxmisc, behind_the_cleanup_of_a_module_there_is_no_memory) {
+  constexpr char k_late_box[] =
+      "box 4112 fatal cleanup error: Using static string/array in a ZXL - "
+      "realloc called after cleanup";
+  const Recorder recorder;
+  EXPECT_EQ(zx_realloc_after_cleanup(nullptr, 0), nullptr);
+  EXPECT_EQ(zx_realloc_after_cleanup(nullptr, 10), nullptr);
+  EXPECT_EQ(recorder.events, std::vector<std::string>{});
+  char block[] = "bytes";
+  for (const std::size_t size : {0U, 1U, 100U})
+    EXPECT_EQ(zx_realloc_after_cleanup(block, size), nullptr);
+  EXPECT_EQ(recorder.events,
+            (std::vector<std::string>{k_late_box, "break", k_late_box, "break",
+                                      k_late_box, "break"}));
+  EXPECT_STREQ(block, "bytes");
+}
+
+void say_what_is_in_the_slot() {
+  say(zx_realloc == zx_realloc_after_cleanup ? "cleanup "
+      : zx_realloc == zx_heap_realloc        ? "heap "
+                                             : "other ");
+}
+
+// Destroyed behind the library's end, as it is older than its start.
+zxStr last_text;
+
+ZX_CASE(zxmisc_slot_at_the_end) {
+  if (argc > 1) traits &= ~k_trait_executable;
+  std::atexit(say_what_is_in_the_slot);
+  start();
+  std::atexit(say_what_is_in_the_slot);
+  if (argc > 2) last_text = argv[2];
+  return 7;
+}
+
+TEST(zxmisc, only_a_modules_slot_is_closed_at_the_end) {
+  const Outcome program = outcome_of("zxmisc_slot_at_the_end");
+  expect_end(program.process, "heap heap ", 7);
+  EXPECT_EQ(program.box, "");
+  const Outcome module = outcome_of("zxmisc_slot_at_the_end", {"module"});
+  expect_end(module.process, "heap cleanup ", 7);
+  EXPECT_EQ(module.box, "");
+}
+
+TEST(zxmisc, a_module_is_told_of_a_static_string_that_outlives_its_library) {
+  const Outcome outcome =
+      outcome_of("zxmisc_slot_at_the_end", {"module", "text"});
+  expect_end(outcome.process, "heap cleanup ", 7);
+  EXPECT_EQ(outcome.box,
+            "fatal cleanup error\n0x1010\nUsing static string/array in a ZXL "
+            "- realloc called after cleanup\n");
 }
 
 }  // namespace
