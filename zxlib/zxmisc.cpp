@@ -59,12 +59,12 @@ constinit bool zx_is_started = false;
 constinit zxReallocFunction zx_realloc = zx_heap_realloc;
 
 void* zx_heap_realloc(void* block, std::size_t size) {
+  if (!zx_is_started && (traits & k_trait_executable) == 0) [[unlikely]]
+    fail_for_early_use();
   if (size == 0) {
     std::free(block);
     return nullptr;
   }
-  if (!zx_is_started && (traits & k_trait_executable) == 0) [[unlikely]]
-    fail_for_early_use();
   void* result = block ? std::realloc(block, size) : std::malloc(size);
   if (result == nullptr) [[unlikely]]
     fail_for_memory();

@@ -5,8 +5,8 @@
 #include <signal.h>
 #include <windows.h>
 
-#include <algorithm>
 #include <cstring>
+#include <iterator>
 
 #include "zxplat_win32_impl.h"
 
@@ -51,6 +51,39 @@ alignas(16) char fault_stack[256 * 1024];
 // What the system itself needs to report an exhausted stack.
 constexpr ULONG k_reporting_room = 64 * 1024;
 
+// SSE arithmetic has two exceptions for all that can go wrong in it; its
+// control word tells what did: six flags and, seven bits above, their masks.
+constexpr DWORD k_sse_faults = 0xC00002B4;
+constexpr DWORD k_sse_traps = 0xC00002B5;
+constexpr int k_sse_sub_codes[] = {129, 130, 131, 132, 133, 134};
+
+int sse_sub_code(const CONTEXT& registers) {
+  constexpr std::size_t k_control_word = 24;
+  DWORD control;
+  std::memcpy(&control, registers.ExtendedRegisters + k_control_word,
+              sizeof control);
+  const DWORD found = control & ~(control >> 7);
+  for (std::size_t i = 0; i < std::size(k_sse_sub_codes); ++i)
+    if ((found >> i & 1) != 0) return k_sse_sub_codes[i];
+  return k_sse_sub_codes[0];
+}
+
+// The signal and the sub-code of an exception; false if it is none of ours.
+bool tell_fault(DWORD exception, const CONTEXT& registers, Fault& fault) {
+  if (exception == k_sse_faults || exception == k_sse_traps) {
+    fault.signal = k_arithmetic;
+    fault.sub_code = sse_sub_code(registers);
+    return true;
+  }
+  for (const FaultRow& row : k_rows) {
+    if (row.exception != exception) continue;
+    fault.signal = row.signal;
+    fault.sub_code = row.sub_code;
+    return true;
+  }
+  return false;
+}
+
 // Where the thread goes on behind the fault; there is no way back.
 [[gnu::force_align_arg_pointer]] void handle_fault() {
   fault_handler(current_fault);
@@ -71,18 +104,16 @@ void call_on_stack(CONTEXT& registers, DWORD top) {
 }
 
 LONG WINAPI on_exception(EXCEPTION_POINTERS* found) {
-  const DWORD exception = found->ExceptionRecord->ExceptionCode;
-  const auto* row =
-      std::find_if(std::begin(k_rows), std::end(k_rows),
-                   [&](const FaultRow& r) { return r.exception == exception; });
-  if (row == std::end(k_rows)) return EXCEPTION_CONTINUE_SEARCH;
-  ::SetUnhandledExceptionFilter(nullptr);  // the next one is the system's
   CONTEXT& registers = *found->ContextRecord;
-  current_fault = {row->signal, row->sub_code, registers.Ebp, registers.Eip};
-  if (row->signal == k_arithmetic)
-    call_on_stack(registers, registers.Esp);
-  else
-    call_on_stack(registers, address_of(std::end(fault_stack) - 64));
+  Fault& fault = current_fault;
+  if (!tell_fault(found->ExceptionRecord->ExceptionCode, registers, fault))
+    return EXCEPTION_CONTINUE_SEARCH;
+  ::SetUnhandledExceptionFilter(nullptr);  // the next one is the system's
+  fault.frame = registers.Ebp;
+  fault.instruction = registers.Eip;
+  call_on_stack(registers, fault.signal == k_arithmetic
+                               ? registers.Esp
+                               : address_of(std::end(fault_stack) - 64));
   return EXCEPTION_CONTINUE_EXECUTION;
 }
 

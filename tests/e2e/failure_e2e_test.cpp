@@ -234,6 +234,7 @@ void check_full_table() {
   EXPECT_FINE(table.length() == table.slots());
   EXPECT_DROPPED(table.find(5) == nullptr);
   EXPECT_DROPPED(table.get(5).length() == 0);
+  EXPECT_DROPPED_IN(table.set(5, "five"), table.length() == table.slots());
   EXPECT_DROPPED_IN(table.erase(5), table.length() == table.slots());
   write_count(table, 1);
   EXPECT_FINE(table.at(7) == "seven" && !table.contains(5));

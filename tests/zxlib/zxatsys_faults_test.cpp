@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <csignal>
 #include <cstdint>
 #include <cstdlib>
@@ -157,49 +158,90 @@ Action wanted_action(char** argv) {
 
 // -------------------------------------------------------- faults, for real --
 
-// Says where the action lies, and does it.
+// What stands in the stack above the action, which may have no frame of its
+// own.
+UNCHECKED void call(Action action) {
+  action();
+  int_result = 0;
+}
+UNCHECKED void carry_out(Action action) {
+  call(action);
+  int_result = 0;
+}
+
+std::string text_of(Action action) {
+  return std::to_string(reinterpret_cast<std::uintptr_t>(action));
+}
+
+// Says where the action lies, and what calls it, and does it.
 ZX_CASE(zxatsys_faults) {
   start();
   install_fault_handlers();
   if (argc > 2 && !kit::trap_float_errors()) return 9;
   const Action action = wanted_action(argv);
-  say(std::to_string(reinterpret_cast<std::uintptr_t>(action)));
+  say(text_of(action) + " " + text_of(reinterpret_cast<Action>(carry_out)) +
+      ";");
   zxplat::set_last_error(0);
-  action();
+  carry_out(action);
   return 7;
 }
 
-// The head of the first frame of a dump: the address and the frame pointer.
+// The head of a frame in a dump: the address and the frame pointer.
 struct FrameHead {
   std::uint64_t address = 0;
   std::uint64_t frame = 0;
 };
-FrameHead first_frame_of(const std::string& dump) {
+
+std::vector<FrameHead> frames_of(const std::string& dump) {
   const std::string_view head = "------ ret @ADDR ";
   const std::string_view between = "   BP: ";
   const std::size_t digits = 2 * sizeof(void*);
-  const std::size_t at = dump.find(head);
-  if (at == std::string::npos) return {};
-  const std::string_view rest = std::string_view(dump).substr(at + head.size());
-  if (rest.substr(digits, between.size()) != between) return {};
-  const auto number = [&](std::size_t from) {
-    return std::stoull(std::string(rest.substr(from, digits)), nullptr, 16);
-  };
-  return {number(0), number(digits + between.size())};
+  std::vector<FrameHead> frames;
+  for (std::size_t at = dump.find(head); at != std::string::npos;
+       at = dump.find(head, at + 1)) {
+    const std::size_t from = at + head.size();
+    EXPECT_EQ(dump.substr(from + digits, between.size()), between);
+    const auto number = [&](std::size_t place) {
+      return std::stoull(dump.substr(place, digits), nullptr, 16);
+    };
+    frames.push_back({number(from), number(from + digits + between.size())});
+  }
+  return frames;
 }
 
-// The outcome of the case without the number that it says first, which goes
-// to `place`.
-Outcome fault_by(const std::string& way, std::uint64_t& place,
-                 const std::vector<std::string>& more = {}) {
+// True if the address lies in a small function.
+bool is_within(std::uint64_t address, std::uint64_t function) {
+  return address >= function && address < function + 100;
+}
+
+bool walks_past(const std::vector<FrameHead>& frames, std::uint64_t function) {
+  return std::any_of(frames.begin(), frames.end(), [&](const FrameHead& frame) {
+    return is_within(frame.address, function);
+  });
+}
+
+struct FaultOutcome {
+  kit::ProcessResult process;  // its output without what the case says first
+  std::vector<FrameHead> frames;
+  std::string dump;
+  std::uint64_t action = 0;  // where the two functions lie
+  std::uint64_t caller = 0;
+};
+
+FaultOutcome fault_by(const std::string& way,
+                      const std::vector<std::string>& more = {}) {
   std::vector<std::string> arguments = {way};
   arguments.insert(arguments.end(), more.begin(), more.end());
-  Outcome outcome = outcome_of("zxatsys_faults", arguments);
-  std::string& out = outcome.process.out;
-  const std::size_t end = out.find_first_not_of("0123456789");
-  place = end == 0 ? 0 : std::stoull(out.substr(0, end));
-  out.erase(0, end);
-  return outcome;
+  const Outcome outcome = outcome_of("zxatsys_faults", arguments);
+  FaultOutcome result = {outcome.process, frames_of(outcome.dump),
+                         outcome.dump};
+  std::string& out = result.process.out;
+  const std::size_t end = out.find(';');
+  if (end == std::string::npos) return result;
+  result.action = std::stoull(out);
+  result.caller = std::stoull(out.substr(out.find(' ')));
+  out.erase(0, end + 1);
+  return result;
 }
 
 TEST(zxatsys_faults, a_bad_instruction_or_address_is_message_1001) {
@@ -214,37 +256,37 @@ TEST(zxatsys_faults, a_bad_instruction_or_address_is_message_1001) {
   for (const auto& row : rows) {
     SCOPED_TRACE(row.way);
     const std::string number = std::to_string(row.detail);
-    std::uint64_t place = 0;
-    const Outcome outcome = fault_by(row.way, place);
+    const FaultOutcome outcome = fault_by(row.way);
     expect_end(outcome.process, screen("1001: exception (" + number + ")",
                                        "[1001-1001-" + number + "/0-0/0//]"));
     EXPECT_NE(outcome.dump.find("@ERR:1001: exception (" + number + ") "),
               std::string::npos);
-    const FrameHead frame = first_frame_of(outcome.dump);
-    EXPECT_GE(frame.address, place);
-    EXPECT_LT(frame.address, place + 100);
-    EXPECT_NE(frame.frame, 0U);
+    ASSERT_GE(outcome.frames.size(), 2U);
+    EXPECT_TRUE(is_within(outcome.frames[0].address, outcome.action));
+    EXPECT_NE(outcome.frames[0].frame, 0U);
+    // The walk goes on from there.
+    EXPECT_TRUE(walks_past(outcome.frames, outcome.caller));
   }
 }
 
 TEST(zxatsys_faults, a_whole_number_divided_by_0_is_message_3000) {
-  std::uint64_t place = 0;
-  const Outcome outcome = fault_by("divide whole numbers", place);
+  const FaultOutcome outcome = fault_by("divide whole numbers");
   expect_end(outcome.process,
              screen("3000: general math err (829=NAN/bad op 835=flt stk "
                     "ovrflow) (801)",
                     "[3000-3000-801/0-0/0//]"));
   EXPECT_NE(outcome.dump.find("@ERR:3000: "), std::string::npos);
+  // The dump walks up from the failure, past the place of the fault.
+  EXPECT_TRUE(walks_past(outcome.frames, outcome.caller));
 }
 
 TEST(zxatsys_faults, an_exhausted_stack_is_message_1001) {
-  std::uint64_t place = 0;
-  const Outcome outcome = fault_by("exhaust the stack", place);
+  const FaultOutcome outcome = fault_by("exhaust the stack");
   expect_end(outcome.process,
              screen("1001: exception (1101)", "[1001-1001-1101/0-0/0//]"));
-  const FrameHead frame = first_frame_of(outcome.dump);
-  EXPECT_NE(frame.address, 0U);
-  EXPECT_NE(frame.frame, 0U);
+  ASSERT_FALSE(outcome.frames.empty());
+  EXPECT_NE(outcome.frames[0].address, 0U);
+  EXPECT_NE(outcome.frames[0].frame, 0U);
 }
 
 TEST(zxatsys_faults, a_signal_that_was_sent_has_the_sub_code_50) {
@@ -262,8 +304,7 @@ TEST(zxatsys_faults, a_signal_that_was_sent_has_the_sub_code_50) {
   };
   for (const auto& row : rows) {
     SCOPED_TRACE(row.way);
-    std::uint64_t place = 0;
-    const Outcome outcome = fault_by(row.way, place);
+    const FaultOutcome outcome = fault_by(row.way);
     expect_end(outcome.process, screen(row.message, row.line));
     EXPECT_NE(outcome.dump.find("@ERR:" + row.message.substr(0, 5)),
               std::string::npos);
@@ -291,8 +332,7 @@ constexpr char k_general[] =
 bool expect_float_faults(const std::vector<FloatRow>& rows) {
   for (const FloatRow& row : rows) {
     SCOPED_TRACE(row.way);
-    std::uint64_t place = 0;
-    const Outcome outcome = fault_by(row.way, place, {"trap"});
+    const FaultOutcome outcome = fault_by(row.way, {"trap"});
     if (outcome.process.exit_code == 9) return false;
     expect_end(outcome.process, screen(row.message, row.line));
   }
@@ -322,8 +362,7 @@ TEST(zxatsys_faults, errors_of_long_double_numbers_have_their_messages) {
 TEST(zxatsys_faults, untrapped_floating_point_errors_are_none) {
   for (const char* way : {"divide doubles", "overflow doubles",
                           "divide double zeros", "underflow doubles"}) {
-    std::uint64_t place = 0;
-    EXPECT_EQ(fault_by(way, place).process.exit_code, 7) << way;
+    EXPECT_EQ(fault_by(way).process.exit_code, 7) << way;
   }
 }
 
