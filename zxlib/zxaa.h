@@ -378,18 +378,19 @@ class zxAA {
 
   // Moves to a block with room for `size` slots, or for twice as many as so
   // far: the steps by which tables grow are too small to move each time.
-  // False, and nothing is done, if there can be no such block (message 2201).
+  // False, and nothing is done, if there is no such block.
   bool make_room(std::int32_t size) {
     std::int64_t room = table != nullptr ? 2 * std::int64_t{header().room} : 0;
     if (room < size || room >= k_limit) room = size;
     Layout layout(static_cast<std::int32_t>(room), sizeof(Entry));
     if (layout.bytes() > SIZE_MAX) layout = Layout(size, sizeof(Entry));
-    if (layout.bytes() > SIZE_MAX) {
-      bail_code(2201);
-      return false;
-    }
-    Header* fresh = layout.make_header(
-        zx_realloc(nullptr, static_cast<std::size_t>(layout.bytes())));
+    // What does not fit an address is asked for as what nobody has.
+    void* memory =
+        zx_realloc(nullptr, layout.bytes() > SIZE_MAX
+                                ? SIZE_MAX
+                                : static_cast<std::size_t>(layout.bytes()));
+    if (memory == nullptr) return false;
+    Header* fresh = layout.make_header(memory);
     if (table != nullptr) {
       fresh->take_over(header());
       std::memcpy(static_cast<void*>(fresh + 1),
