@@ -153,7 +153,8 @@ TEST(mkvtx_e2e, an_error_in_the_text_writes_nothing) {
   EXPECT_NE(result.out.find(" 1.00 Fatal Error t.txt(4): '1..5' is no number"),
             std::string::npos)
       << result.out;
-  EXPECT_EQ(files_in(folder.path()), (Names{"D4WVTX.BIN", "MKVTX.dmp", "t.txt"}));
+  EXPECT_EQ(files_in(folder.path()),
+            (Names{"D4WVTX.BIN", "MKVTX.dmp", "t.txt"}));
   EXPECT_EQ(kit::read_file(folder.file("D4WVTX.BIN")), "old");
 }
 
@@ -279,6 +280,34 @@ TEST(mkvtx_e2e, the_words_of_the_format_page_are_right) {
     ++rows;
   }
   EXPECT_GE(rows, 8);
+}
+
+// The indented lines of a page, as they would stand in a file or on a screen.
+std::string indented_in(const std::string& file) {
+  constexpr std::size_t k_indent = 4;
+  std::string text;
+  for (const std::string& line : lines_of(file))
+    if (line.starts_with("    ")) text += line.substr(k_indent) + "\n";
+  return text;
+}
+
+TEST(mkvtx_e2e, the_examples_of_the_failure_page_are_right) {
+  const std::string page = indented_in("docs/failures.md");
+  const kit::TempDir folder;
+  const std::string out = run({"mkvtx", "none.txt"}, folder).out;
+  const std::size_t behind_path = out.find(" 1.00 Fatal Error");
+  ASSERT_NE(behind_path, std::string::npos) << out;
+  std::string screen = out.substr(behind_path);
+  std::erase(screen, '\r');
+  EXPECT_NE(page.find("mkvtx" + screen), std::string::npos) << screen;
+
+  std::istringstream dump(kit::read_file(folder.file("MKVTX.dmp")));
+  for (std::string line; std::getline(dump, line);) {
+    std::erase(line, '\r');
+    if (line.starts_with("------ ret @ADDR")) break;
+    if (line.starts_with("@PROG:")) line = "@PROG:mkvtx";
+    EXPECT_NE(page.find(line + "\n"), std::string::npos) << line;
+  }
 }
 
 }  // namespace
