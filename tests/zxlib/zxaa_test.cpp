@@ -1,19 +1,24 @@
-// zxaa_test.cpp - tests of zxlib/zxaa.h: the hash table, and its form with
-// string keys.
+// zxaa_test.cpp - tests of zxlib/zxaa.h, zxaa_impl.h and zxaa.cpp: the hash
+// table, its form with string keys, and the parts beside the entries.
 
 #include "zxaa.h"
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <array>
+#include <bit>
 #include <climits>
+#include <cstdint>
 #include <cstdio>
 #include <cstring>
 #include <functional>
+#include <iterator>
 #include <map>
+#include <memory>
+#include <numeric>
 #include <optional>
 #include <random>
+#include <ranges>
 #include <string>
 #include <string_view>
 #include <type_traits>
@@ -297,6 +302,276 @@ TEST(zxaa, negative_keys_hash_as_unsigned_numbers) {
   EXPECT_EQ(table.get(key(INT_MIN)), 2);
 }
 
+TEST(zxaa, at_of_an_absent_key_is_message_2202) {
+  constexpr auto k_message = "2202: zxaa: no such element";
+  constexpr auto k_line = "[2202-2202-0/E-0/E//]";
+  Plain table;
+  EXPECT_FAILURE(table.at(key(1)), k_message, k_line);  // no block yet
+  table.set(key(1), 10);
+  EXPECT_EQ(table.at(key(1)), 10);
+  table.at(key(1)) = 11;
+  EXPECT_EQ(table.get(key(1)), 11);
+  EXPECT_FAILURE(table.at(key(2)), k_message, k_line);
+  EXPECT_FAILURE(table.at(key(65)), k_message, k_line);
+  EXPECT_ASSERTION(table.at(key(0)), "zxaa");
+  kit::with_failures_dropped([&] {
+    EXPECT_EQ(table.at(key(2)), 0);
+    table.at(key(2)) = 5;
+    EXPECT_EQ(table.at(key(2)), 0);
+  });
+  EXPECT_EQ(shape_of(table), "64 1 63");
+}
+
+// ---------------------------------------------- whole numbers and pointers --
+
+// Each key alone in a table: its slot is its home, by mask and by mod.
+template <class K>
+void expect_homes(const std::vector<std::pair<K, std::uint32_t>>& rows) {
+  for (const auto& [k, hash] : rows) {
+    for (const std::int32_t size : {64, 3072}) {
+      SCOPED_TRACE(std::to_string(hash) + " " + std::to_string(size));
+      zxAA<K, std::int32_t> table;
+      table.grow(size);
+      EXPECT_FALSE(table.contains(k));
+      table.set(k, 5);
+      EXPECT_EQ(table.get(k), 5);
+      ASSERT_NE(table.begin(), table.end());
+      EXPECT_EQ(zx_size(table.begin().slot()), hash % zx_size(size));
+      EXPECT_EQ((*table.begin()).key, k);
+      table.erase(k);
+      EXPECT_FALSE(table.contains(k));
+    }
+  }
+}
+
+template <class K>
+void expect_null_is_zero() {
+  zxAA<K, std::int32_t> table;
+  EXPECT_ASSERTION(table.find(K{}), "zxaa");
+  EXPECT_ASSERTION(table.set(K{}, 1), "zxaa");
+  EXPECT_ASSERTION(table.ref(K{}), "zxaa");
+  EXPECT_EQ(table.slots(), 0);
+}
+
+TEST(zxaa, whole_numbers_hash_as_themselves_cut_to_32_bits) {
+  expect_homes<std::int8_t>({{std::int8_t{1}, 1},
+                             {std::int8_t{127}, 127},
+                             {std::int8_t{-1}, 0xFFFFFFFF},
+                             {std::int8_t{-128}, 0xFFFFFF80}});
+  expect_homes<std::uint8_t>({{std::uint8_t{255}, 255}});
+  expect_homes<std::int16_t>(
+      {{std::int16_t{-2}, 0xFFFFFFFE}, {std::int16_t{-32768}, 0xFFFF8000}});
+  expect_homes<std::uint16_t>({{std::uint16_t{65535}, 65535}});
+  expect_homes<std::int32_t>(
+      {{1, 1}, {-1, 0xFFFFFFFF}, {INT_MAX, 0x7FFFFFFF}, {INT_MIN, 0x80000000}});
+  expect_homes<std::uint32_t>({{0xFFFFFFFF, 0xFFFFFFFF}});
+  expect_homes<std::int64_t>({{5, 5},
+                              {-1, 0xFFFFFFFF},
+                              {0x100000005, 5},
+                              {0x100000000, 0},
+                              {INT64_MIN, 0},
+                              {-5'000'000'000, 0xD5FA0E00}});
+  expect_homes<std::uint64_t>({{0x8000000000000001, 1}});
+  expect_homes<char>({{'a', 97}});
+  expect_homes<bool>({{true, 1}});
+}
+
+TEST(zxaa, zero_is_the_null_key_of_whole_numbers) {
+  expect_null_is_zero<std::int8_t>();
+  expect_null_is_zero<std::uint16_t>();
+  expect_null_is_zero<std::int32_t>();
+  expect_null_is_zero<std::int64_t>();
+  expect_null_is_zero<std::uint64_t>();
+  expect_null_is_zero<bool>();
+  expect_null_is_zero<int*>();
+  expect_null_is_zero<const char*>();
+}
+
+TEST(zxaa, wide_keys_with_the_same_32_bits_are_kept_apart) {
+  zxAA<std::int64_t, std::int32_t> table;
+  const auto wide = [](std::int64_t i) { return (i << 32) + 7; };
+  for (std::int32_t i = 0; i < 40; ++i) table.set(wide(i), i);
+  std::int32_t slot = 7;
+  for (auto at = table.begin(); at != table.end(); ++at, ++slot) {
+    EXPECT_EQ(at.slot(), slot);
+    EXPECT_EQ((*at).key, wide(slot - 7));
+  }
+  for (std::int32_t i = 0; i < 40; i += 2) table.erase(wide(i));
+  for (std::int32_t i = 0; i < 40; ++i) {
+    ASSERT_EQ(table.contains(wide(i)), i % 2 == 1);
+    ASSERT_EQ(table.get(wide(i)), i % 2 == 1 ? i : 0);
+  }
+}
+
+TEST(zxaa, every_narrow_key_has_a_place) {
+  zxAA<std::int8_t, std::int32_t> table;
+  for (int i = -128; i < 128; ++i)
+    if (i != 0) table.set(static_cast<std::int8_t>(i), i);
+  EXPECT_EQ(table.length(), 255);
+  for (int i = -128; i < 128; ++i)
+    if (i != 0) {
+      ASSERT_EQ(table.get(static_cast<std::int8_t>(i)), i);
+    }
+}
+
+TEST(zxaa, addresses_are_keys) {
+  int objects[500];
+  zxAA<const int*, std::int32_t> table;
+  for (std::int32_t i = 0; i < 500; ++i) table.set(&objects[i], i);
+  for (std::int32_t i = 0; i < 500; ++i) ASSERT_EQ(table.get(&objects[i]), i);
+  EXPECT_EQ(table.find(objects + 500), nullptr);
+  for (std::int32_t i = 0; i < 500; i += 3) table.erase(&objects[i]);
+  for (std::int32_t i = 0; i < 500; ++i)
+    ASSERT_EQ(table.contains(&objects[i]), i % 3 != 0);
+}
+
+// An address out of nowhere, which a table never looks at.
+const int* address(std::uint64_t bits) {
+  return reinterpret_cast<const int*>(static_cast<std::uintptr_t>(bits));
+}
+
+TEST(zxaa, addresses_hash_by_both_of_their_halves) {
+  expect_homes<const int*>({{address(0x40), 0x40},
+                            {address(0x1234), 0x1234},
+                            {address(0x80000001), 0x80000001},
+                            {address(0xFFFFFFFF), 0xFFFFFFFF}});
+  if (sizeof(void*) == 4) return;
+  expect_homes<const int*>({{address(0x100000000), 1},
+                            {address(0x100000001), 0},
+                            {address(0x7FFF12345678), 0x12342987},
+                            {address(0xFFFFFFFF00000000), 0xFFFFFFFF}});
+}
+
+// ---------------------------------------------------------------- iterating --
+
+TEST(zxaa, a_loop_gives_keys_and_values_by_their_slots) {
+  Plain table;
+  Model model(hash_of_number);
+  for (const std::int32_t k : {63, 127, 5, 64, -1, 4, 69, 40}) {
+    table.set(key(k), k * 10);
+    model.set(std::to_string(k), k * 10);
+  }
+  std::vector<std::pair<std::string, std::int32_t>> expected;
+  for (const Slot& slot : model.slots)
+    if (slot) expected.push_back(*slot);
+  std::vector<std::pair<std::string, std::int32_t>> seen;
+  for (auto [k, value] : table) {
+    seen.emplace_back(name_of(k), value);
+    value += 1;  // the value in the table
+  }
+  EXPECT_EQ(seen, expected);
+  EXPECT_EQ(seen.front().first, "127");  // 63 lies in the last slot
+  seen.clear();
+  for (const auto [k, value] : std::as_const(table))
+    seen.emplace_back(name_of(k), value - 1);
+  EXPECT_EQ(seen, expected);
+  EXPECT_EQ(table.get(key(5)), 51);
+
+  // Keys are for reading, and so are the values of a constant table.
+  using Entry = decltype(*table.begin());
+  using ConstEntry = decltype(*std::as_const(table).begin());
+  static_assert(std::is_same_v<decltype(Entry::key), const PlainKey&>);
+  static_assert(std::is_same_v<decltype(Entry::value), std::int32_t&>);
+  static_assert(
+      std::is_same_v<decltype(ConstEntry::value), const std::int32_t&>);
+}
+
+template <class T>
+concept has_begin = requires(T&& t) {
+  static_cast<T&&>(t).begin();
+};
+template <class T>
+concept has_end = requires(T&& t) {
+  static_cast<T&&>(t).end();
+};
+
+TEST(zxaa, a_temporary_is_not_gone_through) {
+  static_assert(has_begin<Plain&> && has_begin<const Plain&>);
+  static_assert(has_end<Plain&> && has_end<const Plain&>);
+  static_assert(!has_begin<Plain> && !has_begin<const Plain>);
+  static_assert(!has_end<Plain> && !has_end<const Plain>);
+}
+
+TEST(zxaa, an_iterator_tells_the_slot) {
+  Plain table;
+  for (const std::int32_t k : {62, 126, 190, 7}) table.set(key(k), k);
+  std::vector<std::int32_t> slots;
+  for (auto at = table.begin(); at != table.end(); ++at)
+    slots.push_back(at.slot());
+  EXPECT_EQ(slots, (std::vector<std::int32_t>{0, 7, 62, 63}));
+  EXPECT_EQ(table.end().slot(), 64);
+  auto at = table.begin();
+  EXPECT_EQ((*at++).key, key(190));
+  EXPECT_EQ((*at).key, key(7));
+  const auto copy = at;
+  EXPECT_EQ(copy, at);
+  EXPECT_NE(++at, copy);
+  EXPECT_EQ(copy.slot(), 7);
+}
+
+TEST(zxaa, an_empty_table_has_nothing_to_go_through) {
+  Plain table;
+  EXPECT_EQ(table.begin(), table.end());
+  EXPECT_EQ(std::as_const(table).begin(), std::as_const(table).end());
+  EXPECT_EQ(table.slots(), 0);
+  table.grow(0);
+  EXPECT_EQ(table.begin(), table.end());
+  table.set(key(1), 1);
+  EXPECT_NE(table.begin(), table.end());
+  table.erase(key(1));
+  EXPECT_EQ(table.begin(), table.end());
+  table.set(key(1), 1);
+  table.clear();
+  EXPECT_EQ(table.begin(), table.end());
+  EXPECT_EQ(Plain::iterator(), Plain::iterator());
+}
+
+TEST(zxaa, going_through_a_table_moves_nothing) {
+  zxSA<zxStr> table;
+  for (int i = 0; i < 1000; ++i)
+    table.set(zxStr(std::to_string(i)), zxStr(std::to_string(i)));
+  const zxStr* value = table.find("500");
+  for (int round = 0; round < 3; ++round) {
+    int entries = 0;
+    for (const auto [name, text] : table) {
+      EXPECT_EQ(name, text);
+      ++entries;
+    }
+    EXPECT_EQ(entries, 1000);
+    EXPECT_EQ(table.find("500"), value);
+    for (auto [name, text] : table)
+      if (name == "500") {
+        EXPECT_EQ(&text, value);
+      }
+  }
+}
+
+TEST(zxaa, the_algorithms_of_the_standard_work_on_a_table) {
+  static_assert(std::forward_iterator<Plain::iterator>);
+  static_assert(std::forward_iterator<Strings::const_iterator>);
+  static_assert(std::ranges::forward_range<Plain&>);
+  static_assert(std::ranges::forward_range<const Strings&>);
+  Strings table;
+  for (int i = 1; i <= 300; ++i) table.set(zxStr(std::to_string(i)), i);
+  const Strings& constant = table;
+  EXPECT_EQ(std::distance(table.begin(), table.end()), 300);
+  EXPECT_EQ(std::ranges::distance(constant), 300);
+  const auto is_even = [](const auto& entry) { return entry.value % 2 == 0; };
+  EXPECT_EQ(std::ranges::count_if(constant, is_even), 150);
+  EXPECT_EQ(std::count_if(table.begin(), table.end(), is_even), 150);
+  std::ranges::for_each(table, [](auto entry) { entry.value *= 2; });
+  const auto found = std::ranges::find_if(
+      table, [](const auto& entry) { return entry.key == "77"; });
+  ASSERT_NE(found, table.end());
+  EXPECT_EQ((*found).value, 154);
+  EXPECT_TRUE(std::ranges::none_of(
+      constant, [](const auto& entry) { return entry.value == 153; }));
+  EXPECT_EQ(std::accumulate(
+                constant.begin(), constant.end(), 0,
+                [](int sum, const auto& entry) { return sum + entry.value; }),
+            300 * 301);
+}
+
 // ---------------------------------------------------------------- growing --
 
 // A table with the keys 1 to n, stored by set.
@@ -459,6 +734,60 @@ TEST(zxaa, blocks_end_below_32_bits_of_bytes) {
   expect_limit<Value56>(0x4444444);
 }
 
+// What was asked of the slot; 0 for nothing.
+std::size_t asked_for = 0;
+void* note_and_fail(void*, std::size_t size) {
+  asked_for = size;
+  bail_code(2000);
+  return nullptr;
+}
+
+// Whatever the number of slots, the block that is asked for holds them all.
+// One that no address can reach is asked for as the largest that there is,
+// and never as a small one.
+template <class V>
+void expect_blocks_of_their_size() {
+  constexpr std::uint64_t k_entry = sizeof(PlainKey) + sizeof(V);
+  int granted = 0;
+  int refused = 0;
+  for (double step = 33; step < INT_MAX; step *= 1.05) {
+    const auto slots = static_cast<std::int32_t>(step);
+    SCOPED_TRACE(slots);
+    // The entries, two numbers of 32 bits and a bit for each slot, and cells
+    // of eight bytes, half as many again up to a power of two.
+    const auto n = static_cast<std::uint64_t>(slots);
+    const std::uint64_t least =
+        n * (k_entry + 8) + std::bit_ceil(n + n / 2) * 8;
+    const std::uint64_t most = least + n / 4 + 4096;
+    zxAA<PlainKey, V> table;
+    const zxReallocFunction old = zx_realloc;
+    asked_for = 0;
+    zx_realloc = note_and_fail;
+    const kit::Failure failure = kit::failure_of([&] { table.grow(slots); });
+    zx_realloc = old;
+    ASSERT_TRUE(failure.failed);
+    if (n >= 0xFFFFFFFF / k_entry) {
+      ASSERT_EQ(failure.message, "2201: zxaa: tbl too big");
+      ASSERT_EQ(asked_for, 0U);
+      ++refused;
+    } else {
+      ASSERT_EQ(failure.message, "2000: malloc: out of mem");
+      ASSERT_GE(asked_for, std::min<std::uint64_t>(least, SIZE_MAX));
+      ASSERT_LE(asked_for, most);
+      ++granted;
+    }
+    ASSERT_EQ(shape_of(table), "0 0 0");
+  }
+  EXPECT_GT(granted, 100);
+  EXPECT_GT(refused, 10);
+}
+
+TEST(zxaa, a_block_that_is_asked_for_holds_all_its_slots) {
+  expect_blocks_of_their_size<std::int32_t>();
+  expect_blocks_of_their_size<Value12>();
+  expect_blocks_of_their_size<Value56>();
+}
+
 // --------------------------------------------------------------- removing --
 
 TEST(zxaa, erase_removes_and_absent_keys_are_message_2204) {
@@ -571,6 +900,37 @@ TEST(zxaa, a_value_of_the_table_may_be_stored_again) {
   }
   EXPECT_TRUE(table.get("299") == "the text of all");
   EXPECT_EQ(table.get("0").representation()->refs, 300);
+}
+
+TEST(zxaa, the_arguments_of_an_operation_may_lie_in_the_table) {
+  zxSA<zxStr> table;
+  table.ref("key 0") = "key 1";
+  for (int i = 1; i < 3000; ++i) {
+    const zxStr name = "key " + zxStr(std::to_string(i));
+    const zxStr next = "key " + zxStr(std::to_string(i + 1));
+    table.ref(name) = next;
+    // By a key and by a value that move when the table grows.
+    const bool grows = table.length() + table.length() / 4 >= table.slots();
+    const std::int32_t slots = table.slots();
+    zxStr& value = table.ref((*table.begin()).key);
+    ASSERT_EQ(table.slots() > slots, grows);
+    ASSERT_EQ(&value, &(*table.begin()).value);
+    table.set(table.get(name), table.get("key 0"));
+    ASSERT_TRUE(table.get(next) == "key 1");
+    table.ref(table.get(name)) = next;
+  }
+  EXPECT_EQ(table.length(), 3001);
+  // Each is removed by its own key, or by a value which names it.
+  while (table.length() > 2000) table.erase((*table.begin()).key);
+  while (table.length() > 0) {
+    const zxStr* named = table.find((*table.begin()).value);
+    const zxStr first = (*table.begin()).key;
+    if (named != nullptr)
+      table.erase((*table.begin()).value);
+    else
+      table.erase(first);
+  }
+  EXPECT_EQ(table.begin(), table.end());
 }
 
 // ------------------------------------------------------------ string keys --
@@ -831,6 +1191,102 @@ TEST(zxaa, a_dropped_2206_leaves_the_walk) {
   EXPECT_EQ(shape_of(full.table), "51 51 0");
 }
 
+// A table with an entry in each of its 64 slots, which growth prevents: while
+// it is filled its fields tell of more slots.
+class BrimfulTable {
+ public:
+  BrimfulTable() {
+    const auto put = [this](std::int32_t k) {
+      table.set(key(k), k);
+      model.count = 0;  // so that it does not grow
+      model.set(std::to_string(k), k);
+    };
+    for (std::int32_t k = 1; k <= 51; ++k) put(k);
+    EXPECT_NE(table.begin(), table.end());  // the order of 64 slots is made
+    tell_of_slots(200);
+    for (std::int32_t k = 1052; k <= 1064; ++k) put(k);
+    tell_of_slots(64);
+    model.count = 64;
+  }
+  void tell_of_slots(std::int32_t slots) {
+    Fields fields = fields_of(table);
+    fields.capacity = slots;
+    fields.mask = slots == 64 ? 63 : 0;
+    set_fields(table, fields);
+  }
+
+  Plain table;
+  Model model{hash_of_number};
+};
+
+TEST(zxaa, a_full_table_has_its_keys_and_2206_for_all_others) {
+  constexpr auto k_line = "[2206-2206-0/E-0/E//]";
+  BrimfulTable full;
+  Plain& table = full.table;
+  expect_same(table, full.model);
+  for (const std::int32_t k : {52, 1051, 5000, -1}) {
+    SCOPED_TRACE(k);
+    std::int32_t* value;
+    EXPECT_FAILURE(table.find(key(k)), "2206: ", k_line);
+    EXPECT_FAILURE(table.get(key(k)), "2206: ", k_line);
+    EXPECT_FAILURE(table.at(key(k)), "2206: ", k_line);
+    EXPECT_FAILURE(table.contains(key(k)), "2206: ", k_line);
+    EXPECT_FAILURE(table.lookup(key(k), value), "2206: ", k_line);
+    EXPECT_FAILURE(table.set(key(k), 1), "2206: ", k_line);
+    EXPECT_FAILURE(table.erase(key(k)), "2206: ", k_line);
+    kit::with_failures_dropped([&] {
+      EXPECT_EQ(table.find(key(k)), nullptr);
+      table.set(key(k), 1);
+      table.erase(key(k));
+    });
+    expect_same(table, full.model);
+  }
+  for (const auto [k, value] : table) ASSERT_EQ(table.get(k), value);
+  table.set(key(7), 70);
+  full.model.set("7", 70);
+  expect_same(table, full.model);
+  table.erase(key(7));
+  full.model.erase("7");
+  expect_same(table, full.model);
+}
+
+TEST(zxaa, ref_finds_room_in_a_full_table_for_it_grows_first) {
+  BrimfulTable full;
+  full.table.ref(key(5000)) = 5;
+  full.model.ref("5000", 5);
+  EXPECT_EQ(shape_of(full.table), "128 65 127");
+  expect_same(full.table, full.model);
+}
+
+TEST(zxaa, a_key_for_which_no_slot_is_left_is_message_2206) {
+  constexpr auto k_line = "[2206-2206-0/E-0/E//]";
+  BrimfulTable full;
+  full.tell_of_slots(200);
+  EXPECT_FAILURE(full.table.ref(key(5000)), "2206: ", k_line);
+  EXPECT_FAILURE(full.table.set(key(5000), 1), "2206: ", k_line);
+  kit::with_failures_dropped([&] {
+    full.table.ref(key(5000)) = 1;
+    full.table.set(key(5000), 1);
+    EXPECT_EQ(full.table.find(key(5000)), nullptr);
+  });
+  EXPECT_EQ(shape_of(full.table), "200 64 0");
+  for (const std::int32_t k : {1, 51, 1052, 1064})
+    EXPECT_EQ(full.table.get(key(k)), k);
+}
+
+// Not so yet: the key's hash is noted ahead of the search for a slot, and
+// with as many entries as there is room for it is noted over the first slot.
+TEST(zxaa, DISABLED_a_key_for_which_no_slot_is_left_changes_no_slot) {
+  BrimfulTable full;
+  full.tell_of_slots(200);
+  kit::with_failures_dropped([&] {
+    full.table.ref(key(5000)) = 1;
+    full.table.set(key(5000), 1);
+  });
+  full.tell_of_slots(64);
+  expect_same(full.table, full.model);
+}
+
 TEST(zxaa, a_dropped_failure_gives_a_neutral_value_and_changes_nothing) {
   zxSA<zxStr> table;
   table.set("a", "1");
@@ -853,6 +1309,324 @@ TEST(zxaa, a_dropped_failure_gives_a_neutral_value_and_changes_nothing) {
     EXPECT_FALSE(plain.contains(key(0)));
   });
   EXPECT_EQ(shape_of(plain), "0 0 0");
+}
+
+// -------------------------------------------------- the parts of a table --
+
+using zxaa_impl::Cell;
+using zxaa_impl::Index;
+using zxaa_impl::SlotMap;
+
+// Bytes at the end of a block of exactly their size, so that a look behind
+// them is noticed.
+class ExactBytes {
+ public:
+  ExactBytes(std::string_view bytes, std::size_t place)
+      : block(new char[place + bytes.size()]),
+        start(block.get() + place),
+        size(bytes.size()) {
+    std::copy(bytes.begin(), bytes.end(), start);
+  }
+  std::uint32_t hash() const { return zxaa_impl::hash_of_bytes(start, size); }
+  bool same_as(const ExactBytes& other) const {
+    return zxaa_impl::same_bytes(start, other.start, size);
+  }
+  char& operator[](std::size_t i) { return start[i]; }
+
+ private:
+  std::unique_ptr<char[]> block;
+  char* start;
+  std::size_t size;
+};
+
+TEST(zxaa, the_hash_of_bytes_depends_on_each_bit_and_not_on_the_place) {
+  constexpr unsigned k_seed = 64;
+  std::printf("seed %u\n", k_seed);
+  std::mt19937 random(k_seed);
+  for (std::size_t length = 0; length <= 64; ++length) {
+    for (const bool zeros : {false, true}) {
+      SCOPED_TRACE(length);
+      std::string text(length, '\0');
+      if (!zeros)
+        for (char& byte : text) byte = static_cast<char>(random());
+      const std::uint32_t expected = ExactBytes(text, 0).hash();
+      for (std::size_t place = 1; place < 16; ++place)
+        ASSERT_EQ(ExactBytes(text, place).hash(), expected);
+      ExactBytes flipped(text, 3);
+      for (std::size_t bit = 0; bit < 8 * length; ++bit) {
+        const auto flip = static_cast<char>(1 << bit % 8);
+        flipped[bit / 8] = static_cast<char>(flipped[bit / 8] ^ flip);
+        ASSERT_NE(flipped.hash(), expected) << bit;
+        flipped[bit / 8] = static_cast<char>(flipped[bit / 8] ^ flip);
+      }
+      ASSERT_EQ(flipped.hash(), expected);
+    }
+  }
+}
+
+TEST(zxaa, the_same_bytes_are_the_same_in_each_bit) {
+  constexpr unsigned k_seed = 65;
+  std::printf("seed %u\n", k_seed);
+  std::mt19937 random(k_seed);
+  for (std::size_t length = 0; length <= 64; ++length) {
+    SCOPED_TRACE(length);
+    std::string text(length, '\0');
+    for (char& byte : text) byte = static_cast<char>(random());
+    const ExactBytes one(text, 0);
+    for (std::size_t place = 0; place < 16; ++place)
+      ASSERT_TRUE(one.same_as(ExactBytes(text, place)));
+    ExactBytes flipped(text, 5);
+    for (std::size_t bit = 0; bit < 8 * length; ++bit) {
+      const auto flip = static_cast<char>(1 << bit % 8);
+      flipped[bit / 8] = static_cast<char>(flipped[bit / 8] ^ flip);
+      ASSERT_FALSE(one.same_as(flipped)) << bit;
+      ASSERT_FALSE(flipped.same_as(one)) << bit;
+      flipped[bit / 8] = static_cast<char>(flipped[bit / 8] ^ flip);
+    }
+  }
+}
+
+// A map of slots and the same in one flag for each slot.
+class MapPair {
+ public:
+  explicit MapPair(std::int32_t slots)
+      : words(SlotMap::word_count(slots)),
+        map(words.data(), slots),
+        model(zx_size(slots)) {}
+
+  std::int32_t size() const { return static_cast<std::int32_t>(model.size()); }
+  void take(std::int32_t slot) {
+    map.take(slot);
+    model[zx_size(slot)] = true;
+  }
+  void free(std::int32_t slot) {
+    map.free(slot);
+    model[zx_size(slot)] = false;
+  }
+  void take_all() {
+    for (std::int32_t i = 0; i < size(); ++i) take(i);
+  }
+  void expect_same_from(std::int32_t home) const {
+    ASSERT_EQ(map.first_free(home), slow_first_free(home)) << home;
+  }
+  // From every slot, or from some where there are very many.
+  void expect_same() const {
+    for (std::int32_t i = 0; i < size(); ++i) {
+      const bool at_an_end = i < 100 || i + 100 >= size();
+      if (size() > 10'000 && !at_an_end && i % 6'000 != 0) continue;
+      expect_same_from(i);
+      if (testing::Test::HasFatalFailure()) return;
+    }
+  }
+
+ private:
+  std::int32_t slow_first_free(std::int32_t home) const {
+    const auto start = model.begin() + home;
+    auto found = std::find(start, model.end(), false);
+    if (found == model.end()) found = std::find(model.begin(), start, false);
+    // At the start of the search there was no free one, if it ends there.
+    if (found == start && *found) return -1;
+    return static_cast<std::int32_t>(found - model.begin());
+  }
+
+  std::vector<std::uint64_t> words;
+  SlotMap map;
+  std::vector<bool> model;
+};
+
+constexpr std::int32_t k_map_sizes[] = {1,   63,   64,   65,   127,    128,
+                                        129, 4095, 4096, 4097, 300'000};
+
+TEST(zxaa, a_map_of_slots_finds_the_first_free_one_with_wrap) {
+  constexpr unsigned k_seed = 4097;
+  std::printf("seed %u\n", k_seed);
+  std::mt19937 random(k_seed);
+  for (const std::int32_t size : k_map_sizes) {
+    SCOPED_TRACE(size);
+    MapPair pair(size);
+    pair.expect_same();
+    const auto any = [&] {
+      return static_cast<std::int32_t>(random() % static_cast<unsigned>(size));
+    };
+    // Phases that fill the map up and thin it out.
+    const int steps = size > 10'000 ? 60 : 1500;
+    for (int i = 0; i < steps && !HasFatalFailure(); ++i) {
+      const bool filling = i / 100 % 3 != 2;
+      for (std::int32_t k = 0; k <= size / 40; ++k) {
+        if (filling)
+          pair.take(any());
+        else if (k % 10 == 0)
+          pair.free(any());
+      }
+      for (int k = 0; k < 5; ++k) pair.expect_same_from(any());
+    }
+    pair.expect_same();
+    if (HasFatalFailure()) return;
+  }
+}
+
+TEST(zxaa, a_full_map_has_no_free_slot_and_one_given_back_is_found) {
+  for (const std::int32_t size : k_map_sizes) {
+    SCOPED_TRACE(size);
+    MapPair pair(size);
+    pair.take_all();
+    pair.expect_same();
+    for (const std::int32_t slot : {0, size / 3, size / 2, size - 1}) {
+      pair.free(slot);
+      pair.expect_same_from(0);
+      pair.expect_same_from(slot);
+      pair.expect_same_from(slot + 1 == size ? 0 : slot + 1);
+      pair.expect_same_from(size - 1);
+      if (HasFatalFailure()) return;
+      pair.take(slot);
+      pair.expect_same_from(slot);
+    }
+    // All of a word, and all but one of the map.
+    for (std::int32_t i = 0; i < std::min(size, 64); ++i) pair.free(i);
+    pair.expect_same();
+    if (HasFatalFailure()) return;
+  }
+}
+
+// An index and what it should hold.
+class IndexPair {
+ public:
+  explicit IndexPair(std::int32_t room_for)
+      : room(room_for),
+        cells(static_cast<std::size_t>(Index::cell_count(room_for))),
+        index(cells.data(), room_for) {}
+
+  void add(std::int32_t entry, std::uint32_t hash) {
+    index.add(hash, entry);
+    model[entry] = hash;
+  }
+  void remove(std::int32_t entry) {
+    index.remove(find(entry, model.at(entry)));
+    model.erase(entry);
+  }
+  void renumber(std::int32_t from, std::int32_t to) {
+    index.renumber(model.at(from), from, to);
+    model[to] = model.at(from);
+    model.erase(from);
+  }
+  void take_over(const IndexPair& other) {
+    index.take_over(other.index);
+    model = other.model;
+  }
+  Cell* find(std::int32_t entry, std::uint32_t hash) const {
+    return index.find(hash, [=](std::int32_t e) { return e == entry; });
+  }
+
+  void check() const {
+    for (const auto& [entry, hash] : model) {
+      const Cell* cell = find(entry, hash);
+      ASSERT_NE(cell, nullptr);
+      ASSERT_EQ(cell->entry_above, entry + 1);
+      ASSERT_EQ(cell->hash, hash);
+      // Where a walk ends that finds nothing there is room.
+      const Cell* end = find(-5, hash);
+      ASSERT_NE(end, nullptr);
+      ASSERT_EQ(end->entry_above, 0);
+    }
+    ASSERT_EQ(
+        std::ranges::count_if(
+            cells, [](const Cell& cell) { return cell.entry_above != 0; }),
+        static_cast<std::ptrdiff_t>(model.size()));
+  }
+
+  const std::int32_t room;
+  std::unordered_map<std::int32_t, std::uint32_t> model;
+
+ private:
+  std::vector<Cell> cells;
+  Index index;
+};
+
+TEST(zxaa, an_index_has_half_as_many_cells_again_up_to_a_power_of_two) {
+  const struct {
+    std::int32_t room;
+    std::uint64_t cells;
+  } rows[] = {{32, 64},     {33, 64},     {42, 64},     {43, 64},
+              {44, 128},    {64, 128},    {1024, 2048}, {3072, 8192},
+              {5461, 8192}, {5462, 16384}};
+  for (const auto& row : rows)
+    EXPECT_EQ(Index::cell_count(row.room), row.cells) << row.room;
+  EXPECT_EQ(Index::cell_count(INT_MAX), 0x100000000U);
+}
+
+TEST(zxaa, an_index_holds_what_a_map_of_the_standard_holds) {
+  constexpr unsigned k_seed = 32;
+  std::printf("seed %u\n", k_seed);
+  std::mt19937 random(k_seed);
+  for (const std::int32_t room : {32, 33, 64, 200}) {
+    SCOPED_TRACE(room);
+    IndexPair pair(room);
+    const auto last = static_cast<std::uint32_t>(Index::cell_count(room) - 1);
+    // Homes at the end and the start of the cells, shared by other hashes.
+    const std::uint32_t hashes[] = {0,        1,          last,
+                                    last - 1, last + 1,   2 * last + 1,
+                                    last - 2, 0xFFFFFFFF, 0x80000000 + last};
+    const auto any_hash = [&]() -> std::uint32_t {
+      if (random() % 3 == 0) return static_cast<std::uint32_t>(random());
+      return hashes[random() % std::size(hashes)];
+    };
+    const auto any_entry = [&] {
+      return static_cast<std::int32_t>(random() % static_cast<unsigned>(room));
+    };
+    for (int step = 0; step < 5000 && !HasFatalFailure(); ++step) {
+      const std::int32_t entry = any_entry();
+      const std::int32_t other = any_entry();
+      const bool is_there = pair.model.contains(entry);
+      const bool shrinking = step / 300 % 3 == 2;
+      if (!is_there) {
+        const bool has_room = pair.model.size() < zx_size(room) * 4 / 5;
+        if (has_room && (!shrinking || random() % 3 == 0))
+          pair.add(entry, any_hash());
+      } else if (shrinking || random() % 3 == 0) {
+        pair.remove(entry);
+      } else if (!pair.model.contains(other)) {
+        pair.renumber(entry, other);
+      }
+      pair.check();
+    }
+    for (const std::int32_t larger : {room, 2 * room, 1000}) {
+      IndexPair next(larger);
+      next.take_over(pair);
+      next.check();
+    }
+  }
+}
+
+// A run of ten from the last but two cells on, each of them removed in turn.
+TEST(zxaa, a_removal_inside_a_run_that_wraps_keeps_the_others) {
+  constexpr std::int32_t k_room = 32;
+  const auto last = static_cast<std::uint32_t>(Index::cell_count(k_room) - 1);
+  for (std::int32_t removed = 0; removed < 10; ++removed) {
+    for (const std::uint32_t spread : {0U, 1U, 2U}) {
+      SCOPED_TRACE(std::to_string(removed) + " " + std::to_string(spread));
+      IndexPair pair(k_room);
+      for (std::int32_t i = 0; i < 10; ++i)
+        pair.add(i, last - 2 + static_cast<std::uint32_t>(i) % 3 * spread);
+      pair.remove(removed);
+      pair.check();
+    }
+  }
+}
+
+TEST(zxaa, a_full_index_ends_its_walks) {
+  IndexPair pair(32);
+  for (std::int32_t i = 0; i < 64; ++i)
+    pair.add(i, static_cast<std::uint32_t>(i) % 7);
+  for (std::int32_t i = 0; i < 64; ++i) {
+    const Cell* cell = pair.find(i, static_cast<std::uint32_t>(i) % 7);
+    ASSERT_NE(cell, nullptr);
+    ASSERT_EQ(cell->entry_above, i + 1);
+  }
+  EXPECT_EQ(pair.find(64, 5), nullptr);
+  EXPECT_EQ(pair.find(0, 5), nullptr);
+  pair.add(64, 5);  // without a place
+  EXPECT_EQ(pair.find(64, 5), nullptr);
+  EXPECT_NE(pair.find(63, 0), nullptr);
 }
 
 // --------------------------------------------- random use against a model --
@@ -985,6 +1759,261 @@ TEST(zxaa_slow, long_random_use_gives_what_the_model_gives) {
     run_pair<StringKind>(seed, 40, 100'000);
     run_pair<StringKind>(seed, 20'000, 100'000);
   }
+}
+
+// ------------------------------------- the order of slots, asked for or not --
+
+template <class Kind>
+void put_random(typename Kind::Table& real, Model& model, std::mt19937& random,
+                unsigned keys) {
+  const std::string k = Kind::any_key(random, keys);
+  const auto value = static_cast<std::int32_t>(random());
+  if (random() % 2 == 0) {
+    real.set(Kind::key_of(k), value);
+    model.set(k, value);
+  } else {
+    real.ref(Kind::key_of(k)) = value;
+    model.ref(k, value);
+  }
+}
+
+template <class Kind>
+void erase_random(typename Kind::Table& real, Model& model,
+                  std::mt19937& random, unsigned keys) {
+  const std::string k = Kind::any_key(random, keys);
+  if (!real.contains(Kind::key_of(k))) return;
+  real.erase(Kind::key_of(k));
+  model.erase(k);
+}
+
+// However large the table is when the order is first asked for, it is that of
+// a table in which it was known all the time.
+template <class Kind>
+void expect_order_whenever_asked(unsigned seed) {
+  std::printf("seed %u\n", seed);
+  for (const int steps : {1, 51, 53, 700, 2000, 6000}) {
+    for (const int asked_at : {-1, 0, steps / 3, steps - 1}) {
+      for (const bool asked_by_erase : {false, true}) {
+        SCOPED_TRACE(std::to_string(steps) + " " + std::to_string(asked_at));
+        std::mt19937 random(seed);
+        typename Kind::Table real;
+        Model model(Kind::hash);
+        const auto keys = 2 * static_cast<unsigned>(steps);
+        for (int i = 0; i < steps; ++i) {
+          put_random<Kind>(real, model, random, keys);
+          if (i != asked_at) continue;
+          if (asked_by_erase)
+            erase_random<Kind>(real, model, random, keys);
+          else
+            static_cast<void>(real.begin());
+        }
+        expect_same(real, model);
+        for (int i = 0; i < 100; ++i) {
+          erase_random<Kind>(real, model, random, keys);
+          put_random<Kind>(real, model, random, keys);
+        }
+        expect_same(real, model);
+        if (testing::Test::HasFatalFailure()) return;
+      }
+    }
+  }
+}
+
+TEST(zxaa, the_order_is_the_same_whenever_it_is_asked_for) {
+  expect_order_whenever_asked<PlainKind>(17);
+  expect_order_whenever_asked<StringKind>(18);
+}
+
+TEST(zxaa_slow, the_order_is_the_same_whenever_it_is_asked_for) {
+  for (unsigned seed = 200; seed < 215; ++seed) {
+    expect_order_whenever_asked<PlainKind>(seed);
+    expect_order_whenever_asked<StringKind>(seed);
+  }
+}
+
+TEST(zxaa, a_cleared_table_knows_nothing_of_its_earlier_order) {
+  for (const bool asked : {false, true}) {
+    Plain table;
+    fill(table, 700);
+    if (asked) {
+      EXPECT_NE(table.begin(), table.end());
+    }
+    table.clear();
+    Model model(hash_of_number);
+    for (const std::int32_t k : {62, 126, 190, 254, 64}) {
+      table.set(key(k), k);
+      model.set(std::to_string(k), k);
+    }
+    expect_same(table, model);
+  }
+}
+
+// Growth by single slots, far more often than by the steps of a table.
+TEST(zxaa, the_order_survives_any_number_of_growths) {
+  for (const int asked_at : {-1, 60, 200}) {
+    SCOPED_TRACE(asked_at);
+    Plain table;
+    Model model(hash_of_number);
+    int growths = 0;
+    for (int i = 1; i <= 400; ++i) {
+      const std::int32_t k = i * 7919;
+      table.ref(key(k)) = i;
+      model.ref(std::to_string(k), i);
+      const std::int32_t before = table.slots();
+      for (int again = 0; again < 2; ++again) {  // one may not be enough
+        table.grow(table.slots() + 1);
+        model.grow(model.capacity() + 1);
+      }
+      growths += table.slots() != before;
+      if (i == asked_at) expect_same(table, model);
+    }
+    EXPECT_GT(growths, 300);
+    expect_same(table, model);
+  }
+}
+
+// Texts with a checksum of one's choice: the last two bytes go into the whole
+// of it, so for each checksum there is one pair of them.
+class ChosenChecksum {
+ public:
+  ChosenChecksum() : last_bytes(0x10000) {
+    for (unsigned i = 0; i < 0x10000; ++i)
+      last_bytes[sum_behind("", i)] = static_cast<std::uint16_t>(i);
+  }
+  std::string text(const std::string& start, std::uint16_t checksum) const {
+    // What goes in is mixed with the sum so far.
+    const unsigned before = crc16(start.data(), start.size());
+    const unsigned mixed = last_bytes[checksum] ^ before ^ 0xFFFFU;
+    return start + static_cast<char>(mixed >> 8) + static_cast<char>(mixed);
+  }
+
+ private:
+  static std::uint16_t sum_behind(const std::string& start, unsigned bytes) {
+    const std::string all =
+        start + static_cast<char>(bytes >> 8) + static_cast<char>(bytes & 0xFF);
+    return crc16(all.data(), all.size());
+  }
+  std::vector<std::uint16_t> last_bytes;
+};
+
+// Many texts whose homes are the last and the first slots of a table: three
+// for each of up to five checksums of a home.
+std::vector<std::string> texts_around_the_end(std::int32_t size) {
+  const ChosenChecksum chosen;
+  std::vector<std::string> texts;
+  for (const std::int32_t home : {size - 3, size - 2, size - 1, 0, 2}) {
+    for (int k = 0; k < 5; ++k) {
+      const std::int32_t checksum = home + k * size;
+      for (int i = 0; i < 3 && checksum <= 0xFFFF; ++i)
+        texts.push_back(chosen.text("k" + std::to_string(i) + "_",
+                                    static_cast<std::uint16_t>(checksum)));
+    }
+  }
+  return texts;
+}
+
+TEST(zxaa, runs_of_colliding_strings_that_wrap_are_kept_by_the_rule) {
+  constexpr unsigned k_seed = 5120;
+  std::printf("seed %u\n", k_seed);
+  std::mt19937 random(k_seed);
+  for (const std::int32_t size : {64, 2048, 3072, 4096, 5120}) {
+    SCOPED_TRACE(size);
+    std::vector<std::string> texts = texts_around_the_end(size);
+    if (size == 64) texts.resize(45);
+    for (const std::string& text : texts) {
+      const std::size_t home = hash_of_text(text) % zx_size(size);
+      ASSERT_TRUE(home < 3 || home + 3 >= zx_size(size));
+    }
+    std::shuffle(texts.begin(), texts.end(), random);
+    Strings table;
+    Model model(hash_of_text);
+    table.grow(size);
+    model.grow(size);
+    for (std::size_t i = 0; i < texts.size(); ++i) {
+      table.set(zxStr(std::string_view(texts[i])), static_cast<int>(i));
+      model.set(texts[i], static_cast<int>(i));
+    }
+    ASSERT_EQ(table.slots(), size);
+    ASSERT_EQ(fields_of(table).mask == 0, size == 3072 || size == 5120);
+    expect_same(table, model);
+    for (std::size_t gone = 0; gone < texts.size(); ++gone) {
+      table.erase(zxStr(std::string_view(texts[gone])));
+      model.erase(texts[gone]);
+      expect_same(table, model);
+      for (std::size_t i = 0; i < texts.size(); ++i) {
+        const auto* value = table.find(zxStr(std::string_view(texts[i])));
+        ASSERT_EQ(value != nullptr, i > gone);
+        ASSERT_TRUE(i <= gone || *value == static_cast<int>(i));
+      }
+      if (HasFatalFailure()) return;
+    }
+  }
+}
+
+// ------------------------------------------------------------- large tables --
+
+// Far apart, so that they make short runs only.
+std::int32_t spread_key(std::int32_t i) {
+  return static_cast<std::int32_t>(static_cast<std::uint32_t>(i) *
+                                   2'654'435'761U);
+}
+
+TEST(zxaa, a_hundred_thousand_numbers_are_found_and_erased) {
+  constexpr std::int32_t k_keys = 100'000;
+  zxAA<std::int32_t, std::int32_t> table;
+  for (std::int32_t i = 1; i <= k_keys; ++i) table.set(spread_key(i), i);
+  EXPECT_EQ(table.length(), k_keys);
+  // count + count/4 is below a capacity of so many steps, and not below one
+  // step less.
+  EXPECT_EQ(table.slots(), 123 * 1024);
+  for (std::int32_t i = 1; i <= k_keys; ++i)
+    ASSERT_EQ(table.get(spread_key(i)), i);
+  for (std::int32_t i = k_keys + 1; i <= 2 * k_keys; ++i)
+    ASSERT_EQ(table.find(spread_key(i)), nullptr);
+  for (std::int32_t i = 3; i <= k_keys; i += 3) table.erase(spread_key(i));
+  EXPECT_EQ(table.length(), k_keys - k_keys / 3);
+  for (std::int32_t i = 1; i <= k_keys; ++i) {
+    const std::int32_t* value = table.find(spread_key(i));
+    ASSERT_EQ(value != nullptr, i % 3 != 0);
+    ASSERT_TRUE(value == nullptr || *value == i);
+  }
+  std::vector<bool> seen(k_keys + 1);
+  for (const auto [k, value] : table) {
+    ASSERT_EQ(k, spread_key(value));
+    ASSERT_FALSE(seen[zx_size(value)]);
+    seen[zx_size(value)] = true;
+  }
+  EXPECT_EQ(std::ranges::count(seen, true), table.length());
+  EXPECT_EQ(table.slots(), 123 * 1024);
+}
+
+// Of which many share a checksum, since there are 65 536 of those.
+TEST(zxaa, a_hundred_thousand_strings_are_found_and_some_erased) {
+  constexpr std::int32_t k_keys = 100'000;
+  constexpr std::int32_t k_erased_each = 997;  // erasing is slow in large runs
+  const auto name = [](std::int32_t i) { return "key " + std::to_string(i); };
+  Strings table;
+  for (std::int32_t i = 0; i < k_keys; ++i) table.set(zxStr(name(i)), i);
+  EXPECT_EQ(table.length(), k_keys);
+  EXPECT_EQ(table.slots(), 123 * 1024);
+  for (std::int32_t i = 0; i < k_keys; ++i) {
+    ASSERT_EQ(table.get(name(i).c_str()), i);
+    ASSERT_FALSE(table.contains(name(k_keys + i).c_str()));
+  }
+  for (std::int32_t i = 0; i < k_keys; i += k_erased_each)
+    table.erase(zxStr(name(i)));
+  for (std::int32_t i = 0; i < k_keys; ++i) {
+    const std::int32_t* value = table.find(zxStr(name(i)));
+    ASSERT_EQ(value != nullptr, i % k_erased_each != 0);
+    ASSERT_TRUE(value == nullptr || *value == i);
+  }
+  std::vector<bool> seen(k_keys);
+  for (const auto [k, value] : table) {
+    ASSERT_EQ(k.view(), name(value));
+    ASSERT_FALSE(seen[zx_size(value)]);
+    seen[zx_size(value)] = true;
+  }
+  EXPECT_EQ(std::ranges::count(seen, true), table.length());
 }
 
 }  // namespace

@@ -10,6 +10,7 @@
 #include <cstring>
 #include <deque>
 #include <random>
+#include <ranges>
 #include <string>
 #include <type_traits>
 #include <utility>
@@ -241,6 +242,104 @@ TEST(zxqva, get_or_gives_the_shared_empty_value_out_of_range) {
   EXPECT_TRUE(array.get_or(0) == "a");
   EXPECT_EQ(array.length(), 1);
   EXPECT_EQ(zxQVA<int>().get_or(0), 0);
+}
+
+// -------------------------------------------------------------- iterating --
+
+TEST(zxqva, begin_and_end_span_the_live_elements) {
+  zxQVA<int> array;
+  const zxQVA<int>& constant = array;
+  EXPECT_EQ(array.begin(), array.end());
+  EXPECT_EQ(constant.begin(), constant.end());
+  fill(array, 10);
+  EXPECT_EQ(array.begin(), fields_of(array).base);
+  EXPECT_EQ(array.end() - array.begin(), 10);
+  EXPECT_EQ(array.begin(), &array.get(0));
+  EXPECT_EQ(constant.begin(), array.begin());
+  EXPECT_EQ(constant.end(), array.end());
+  array.drop_first();
+  array.drop_first();
+  array.drop_last();
+  EXPECT_EQ(std::vector<int>(array.begin(), array.end()), numbers(2, 7));
+  array.slide_to(20);
+  EXPECT_EQ(std::vector<int>(constant.begin(), constant.end()), numbers(2, 7));
+  array.set_length(0);
+  EXPECT_EQ(array.begin(), array.end());
+  array.clear();
+  EXPECT_EQ(array.begin(), nullptr);
+  EXPECT_EQ(array.end(), nullptr);
+  static_assert(std::is_same_v<decltype(array.begin()), int*>);
+  static_assert(std::is_same_v<decltype(constant.end()), const int*>);
+  static_assert(std::ranges::contiguous_range<zxQVA<zxStr>&>);
+  static_assert(std::ranges::contiguous_range<const zxQVA<zxStr>&>);
+}
+
+template <class T>
+concept has_begin = requires(T&& t) {
+  static_cast<T&&>(t).begin();
+};
+template <class T>
+concept has_end = requires(T&& t) {
+  static_cast<T&&>(t).end();
+};
+
+TEST(zxqva, a_temporary_is_not_gone_through) {
+  using Array = zxQVA<zxStr>;
+  static_assert(has_begin<Array&> && has_begin<const Array&>);
+  static_assert(has_end<Array&> && has_end<const Array&>);
+  static_assert(!has_begin<Array> && !has_begin<const Array>);
+  static_assert(!has_end<Array> && !has_end<const Array>);
+}
+
+TEST(zxqva, a_loop_reads_and_writes_the_elements) {
+  zxQVA<int> array;
+  for (const int n : array) FAIL() << n;
+  fill(array, 40);
+  for (int i = 0; i < 5; ++i) array.drop_first();
+  for (int& n : array) n *= 2;
+  int expected = 10;
+  for (const int n : std::as_const(array)) {
+    EXPECT_EQ(n, expected);
+    expected += 2;
+  }
+  EXPECT_EQ(expected, 80);
+}
+
+TEST(zxqva, the_algorithms_of_the_standard_work_on_an_array) {
+  zxQVA<int> array;
+  for (int i = 0; i < 500; ++i) array.append(i * 7919 % 503);
+  for (int i = 0; i < 100; ++i) array.drop_first();
+  std::vector<int> model(array.begin(), array.end());
+  EXPECT_EQ(model, elements_of(array));
+  std::sort(array.begin(), array.end());
+  std::sort(model.begin(), model.end());
+  EXPECT_EQ(elements_of(array), model);
+  EXPECT_EQ(std::ranges::find(array, model[77]), array.begin() + 77);
+  EXPECT_EQ(std::ranges::find(array, 1000), array.end());
+  EXPECT_EQ(std::ranges::max(array), model.back());
+  std::ranges::reverse(array);
+  std::ranges::reverse(model);
+  EXPECT_EQ(elements_of(array), model);
+  // The blocks went on from 417: 443, 470, 499, 530.
+  EXPECT_EQ(shape_of(array), "530 400 100");
+  // Elements that are not wanted are moved behind the others and cut off.
+  const auto rest =
+      std::ranges::remove_if(array, [](int n) { return n % 2 != 0; });
+  array.set_length(static_cast<int>(rest.begin() - array.begin()));
+  std::erase_if(model, [](int n) { return n % 2 != 0; });
+  EXPECT_EQ(elements_of(array), model);
+}
+
+TEST(zxqva, sorting_keeps_each_element_once) {
+  zxQVA<zxStr> array;
+  for (int i = 0; i < 300; ++i)
+    array.append(zxStr(std::to_string(i * 7919 % 307)));
+  array.append(array.get(5));
+  std::sort(array.begin(), array.end());
+  EXPECT_TRUE(std::is_sorted(array.begin(), array.end()));
+  int shared = 0;
+  for (const zxStr& text : array) shared += text.representation()->refs == 2;
+  EXPECT_EQ(shared, 2);
 }
 
 // -------------------------------------------------------- stack and queue --
@@ -492,6 +591,16 @@ TEST(zxqva, counts_of_bytes_end_with_31_bits) {
   zxQVA<char> array;
   EXPECT_FAILURE(array.reserve(INT_MAX, INT_MAX), "2205: zxva: tbl too big",
                  "[2205-2205-0/E-0/E//]");
+  EXPECT_FAILURE(array.reserve(INT_MAX, 1), "2205: zxva: tbl too big",
+                 "[2205-2205-0/E-0/E//]");
+  // As many as a count can tell are asked of the heap.
+  const zxReallocFunction old = zx_realloc;
+  zx_realloc = no_memory;
+  EXPECT_FAILURE(array.reserve(INT_MAX, 0), "2000: malloc: out of mem",
+                 "[2000-2000-0/E-0/E//]");
+  EXPECT_FAILURE(array.reserve(1, INT_MAX - 1), "2000: malloc: out of mem",
+                 "[2000-2000-0/E-0/E//]");
+  zx_realloc = old;
   EXPECT_EQ(shape_of(array), "0 0 0");
 }
 
@@ -704,6 +813,9 @@ class Pair {
     ASSERT_EQ(real.block_offset(), model.offset);
     for (int i = 0; i < model.count(); ++i)
       ASSERT_EQ(as_string(real.get(i)), model.all[static_cast<std::size_t>(i)]);
+    ASSERT_TRUE(std::ranges::equal(
+        std::as_const(real), model.all,
+        [](const zxStr& a, const std::string& b) { return a == b.c_str(); }));
     if (model.count() == 0) return;
     ASSERT_EQ(as_string(real.last()), model.all.back());
     ASSERT_EQ(as_string(real.from_top(model.count() - 1)), model.all.front());

@@ -1,5 +1,5 @@
 // zxstr_test.cpp - tests of zxlib/zxstr.h and zxstr.cpp: the string, its
-// sharing and growth, and the checksum of 16 bits.
+// sharing and growth, its form with room inside, and the checksum of 16 bits.
 
 #include "zxstr.h"
 
@@ -8,18 +8,23 @@
 #include <algorithm>
 #include <array>
 #include <climits>
+#include <compare>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <functional>
 #include <memory>
 #include <random>
+#include <ranges>
 #include <string>
 #include <string_view>
+#include <type_traits>
 #include <utility>
 #include <vector>
 
 #include "kit/failure.h"
 #include "zxplat.h"
+#include "zxqva.h"
 
 namespace {
 
@@ -228,6 +233,7 @@ TEST(zxstr, what_changes_nothing_keeps_the_sharing) {
          const zxStr t = s;
          s = t;
        }},
+      {"sync_length without a NUL", [](zxStr& s) { s.sync_length(); }},
       {"reading", [](zxStr& s) { EXPECT_EQ(s[0], 'h'); }},
       {"comparing", [](zxStr& s) { EXPECT_TRUE(s == "hello"); }},
       {"copying out",
@@ -575,6 +581,97 @@ TEST(zxstr, concatenation_with_null_is_an_assertion) {
   EXPECT_EQ(state_of(a), "hello|5|1");
 }
 
+TEST(zxstr, chains_of_concatenations_take_exactly_the_sum) {
+  const zxStr a("hello");
+  const zxStr b(" you");
+  EXPECT_EQ(state_of(a + b + a), "hello youhello|14|1");
+  EXPECT_EQ(state_of(a + " my " + b + '!'), "hello my  you!|14|1");
+  EXPECT_EQ(state_of('<' + (a + b) + '>'), "<hello you>|11|1");
+  EXPECT_EQ(state_of("1" + a + "2" + b + "3"), "1hello2 you3|12|1");
+  // What has spare room gives none of it on.
+  zxStr roomy("hello");
+  roomy.reserve(500);
+  EXPECT_EQ(state_of(std::move(roomy) + b), "hello you|9|1");
+  zxStr shared("hello");
+  const zxStr sharer = shared;
+  EXPECT_EQ(state_of(std::move(shared) + b), "hello you|9|1");
+  EXPECT_EQ(text_of(sharer), "hello");
+}
+
+TEST(zxstr, a_chain_of_concatenations_leaves_no_block_behind) {
+  SlotWatch slot;
+  {
+    const zxStr a("hello");
+    const zxStr sum = a + " you" + '!' + a;
+    EXPECT_EQ(text_of(sum), "hello you!hello");
+  }
+  EXPECT_EQ(std::count(slot.calls.begin(), slot.calls.end(), "free"),
+            static_cast<std::ptrdiff_t>(slot.calls.size()) / 2);
+}
+
+TEST(zxstr, concatenation_leaves_a_given_up_side_usable) {
+  const struct {
+    const char* name;
+    zxStr (*sum)(zxStr&);
+    const char* expected;
+  } rows[] = {
+      {"string", [](zxStr& s) { return std::move(s) + zxStr("ab"); },
+       "helloab"},
+      {"text", [](zxStr& s) { return std::move(s) + "ab"; }, "helloab"},
+      {"byte", [](zxStr& s) { return std::move(s) + 'a'; }, "helloa"},
+      {"empty string", [](zxStr& s) { return std::move(s) + zxStr(); },
+       "hello"},
+      {"empty text", [](zxStr& s) { return std::move(s) + ""; }, "hello"},
+      {"itself", [](zxStr& s) { return s + s; }, "hellohello"},
+      {"itself given up", [](zxStr& s) { return std::move(s) + s; },
+       "hellohello"},
+      {"its own end", [](zxStr& s) { return std::move(s) + (s.c_str() + 1); },
+       "helloello"},
+      {"its own last byte", [](zxStr& s) { return std::move(s) + s[4]; },
+       "helloo"},
+      {"behind text", [](zxStr& s) { return "ab" + std::move(s); }, "abhello"},
+      {"behind its own end",
+       [](zxStr& s) { return (s.c_str() + 3) + std::move(s); }, "lohello"},
+      {"behind a byte", [](zxStr& s) { return 'a' + std::move(s); }, "ahello"},
+  };
+  for (const auto& row : rows) {
+    for (const std::int32_t room : {5, 6, 10, 200}) {
+      for (const bool shared : {false, true}) {
+        SCOPED_TRACE(row.name);
+        zxStr s("hello");
+        s.reserve(room);
+        const zxStr sharer = shared ? s : zxStr();
+        const zxStr sum = row.sum(s);
+        EXPECT_EQ(text_of(sum), row.expected);
+        if (sum.length() != 5) {
+          EXPECT_EQ(state_of(sum),
+                    row.expected + "|"s + std::to_string(sum.length()) + "|1");
+        }
+        EXPECT_EQ(text_of(sharer), shared ? "hello" : "");
+        EXPECT_TRUE(text_of(s) == "hello" || is_shared_empty(s));
+        s = "again";
+        s += '!';
+        EXPECT_EQ(text_of(s), "again!");
+        EXPECT_EQ(text_of(sum), row.expected);
+      }
+    }
+  }
+}
+
+TEST(zxstr, a_given_up_side_beside_an_empty_one_is_shared_or_taken) {
+  SlotWatch slot;
+  zxStr s("hello");
+  const zxStrRep* block = s.representation();
+  slot.calls.clear();
+  const zxStr with_string = s + zxStr();
+  const zxStr with_text = zxStr(with_string) + "";
+  const zxStr behind = "" + zxStr(with_text);
+  const zxStr last = std::move(s) + "";
+  for (const zxStr* sum : {&with_string, &with_text, &behind, &last})
+    EXPECT_EQ(sum->representation(), block);
+  EXPECT_EQ(slot.calls, SlotWatch::Calls());
+}
+
 // -------------------------------------------------------------- comparing --
 
 TEST(zxstr, equality_is_by_length_and_bytes) {
@@ -631,6 +728,121 @@ TEST(zxstr, comparing_with_a_shorter_text_stays_within_it) {
   EXPECT_FALSE(a == heap_text.get());
 }
 
+// --------------------------------------------------------------- ordering --
+
+// The order as the rule tells it.
+std::strong_ordering slow_order(std::string_view a, std::string_view b) {
+  for (std::size_t i = 0; i < a.size() && i < b.size(); ++i) {
+    const int x = static_cast<unsigned char>(a[i]);
+    const int y = static_cast<unsigned char>(b[i]);
+    if (x != y)
+      return x < y ? std::strong_ordering::less : std::strong_ordering::greater;
+  }
+  return a.size() <=> b.size();
+}
+
+TEST(zxstr, the_order_is_that_of_unsigned_bytes_and_then_of_lengths) {
+  // In their order.
+  constexpr std::string_view k_texts[] = {
+      "",         "\0"sv,       "\0\0"sv, "\0a"sv, "\1",       " ",
+      "A",        "B",          "a",      "a\0"sv, "a\0b"sv,   "a\0c"sv,
+      "a\1",      "aa",         "aaa",    "ab",    "a\x7F",    "a\x80",
+      "a\xFF",    "a\xFF\0"sv,  "b",      "z",     "\x7F",     "\x80",
+      "\x80\x01", "\x80\x80",   "\xE0",   "\xFE",  "\xFF\0"sv, "\xFF\x7F",
+      "\xFF\xFF", "\xFF\xFFzz",
+  };
+  for (std::size_t i = 0; i < std::size(k_texts); ++i) {
+    for (std::size_t j = 0; j < std::size(k_texts); ++j) {
+      SCOPED_TRACE(std::to_string(i) + " " + std::to_string(j));
+      const zxStr a = str(k_texts[i]);
+      const zxIStr b(k_texts[j].data(), zx_count(k_texts[j].size()));
+      EXPECT_EQ(a <=> b, i <=> j);
+      EXPECT_EQ(b <=> a, j <=> i);
+      EXPECT_EQ(a < b, i < j);
+      EXPECT_EQ(a <= b, i <= j);
+      EXPECT_EQ(a > b, i > j);
+      EXPECT_EQ(a >= b, i >= j);
+      // Text ends at its first NUL.
+      const std::string text(k_texts[j].substr(0, k_texts[j].find('\0')));
+      EXPECT_EQ(a <=> text.c_str(), slow_order(k_texts[i], text));
+      EXPECT_EQ(text.c_str() < a, slow_order(text, k_texts[i]) < 0);
+    }
+  }
+  zxStr s("abc");
+  const zxStr sharer = s;
+  EXPECT_EQ(s <=> sharer, std::strong_ordering::equal);
+  s.reserve(100);
+  EXPECT_EQ(s <=> sharer, std::strong_ordering::equal);
+}
+
+TEST(zxstr, the_order_of_random_texts_is_that_of_the_slow_one) {
+  constexpr unsigned k_seed = 815;
+  std::printf("seed %u\n", k_seed);
+  std::mt19937 random(k_seed);
+  const auto any = [&] {
+    std::string text(random() % 40, 'a');
+    if (!text.empty())
+      for (int i = 0; i < 2; ++i)
+        text[random() % text.size()] = static_cast<char>(random());
+    return text;
+  };
+  for (int round = 0; round < 20'000; ++round) {
+    const std::string a = any();
+    const std::string b = any();
+    ASSERT_EQ(str(a) <=> str(b), slow_order(a, b));
+  }
+}
+
+TEST(zxstr, the_order_with_null_is_an_assertion) {
+  const char* null = nullptr;
+  const zxStr a("hello");
+  EXPECT_ASSERTION(a <=> null, "zxstr");
+  EXPECT_ASSERTION(a < null, "zxstr");
+  EXPECT_ASSERTION(null < a, "zxstr");
+  kit::with_failures_dropped(
+      [&] { EXPECT_EQ(a <=> null, std::strong_ordering::equal); });
+}
+
+TEST(zxstr, ordering_with_a_shorter_text_stays_within_it) {
+  const auto text = std::make_unique<char[]>(3);
+  text[0] = text[1] = 'x';
+  EXPECT_TRUE(zxStr(std::string(10'000, 'x')) > text.get());
+  EXPECT_TRUE(zxStr('x') < text.get());
+}
+
+TEST(zxstr, arrays_of_strings_are_sorted_by_the_standard) {
+  constexpr unsigned k_seed = 99;
+  std::printf("seed %u\n", k_seed);
+  std::mt19937 random(k_seed);
+  zxQVA<zxStr> array;
+  std::vector<std::string> model;
+  for (int i = 0; i < 2000; ++i) {
+    // Some several times, and sharing.
+    if (i % 5 == 4) {
+      array.append(array.get(i / 2));
+      model.push_back(std::string(model[zx_size(i / 2)]));
+      continue;
+    }
+    std::string text(random() % 6, '\0');
+    for (char& byte : text) byte = static_cast<char>(random());
+    array.append(str(text));
+    model.push_back(text);
+  }
+  std::sort(array.begin(), array.end());
+  std::sort(model.begin(), model.end(),
+            [](const auto& a, const auto& b) { return slow_order(a, b) < 0; });
+  for (std::int32_t i = 0; i < array.length(); ++i)
+    ASSERT_EQ(text_of(array.get(i)), model[zx_size(i)]);
+  EXPECT_TRUE(std::binary_search(array.begin(), array.end(), str(model[77])));
+  std::ranges::sort(array, std::ranges::greater());
+  for (std::int32_t i = 0; i < array.length(); ++i)
+    ASSERT_EQ(text_of(array.from_top(i)), model[zx_size(i)]);
+  std::int32_t holders = 0;
+  for (const zxStr& s : array)
+    if (!s.is_empty()) holders += share(s, array.get(0));
+  EXPECT_EQ(holders, refs(array.get(0)));
+}
+
 // ---------------------------------------------------------------- reading --
 
 TEST(zxstr, indexes_reach_the_characters_and_no_more) {
@@ -670,14 +882,75 @@ TEST(zxstr, a_view_has_the_characters) {
   EXPECT_EQ(zxStr().length(), 0);
 }
 
+// Takes any text.
+std::size_t bytes_in(std::string_view text) { return text.size(); }
+
+TEST(zxstr, a_string_is_a_view_and_a_view_makes_a_string) {
+  const zxStr s("a\0c"sv);
+  const zxIStr inner("a\0c", 3);
+  const std::string_view view = s;
+  EXPECT_EQ(view, "a\0c"sv);
+  EXPECT_EQ(view.data(), s.c_str());
+  EXPECT_EQ(std::string_view(inner).data(), inner.c_str());
+  EXPECT_EQ(bytes_in(s), 3U);
+  EXPECT_EQ(bytes_in(inner), 3U);
+  EXPECT_EQ(std::string(s), "a\0c"s);
+  EXPECT_EQ(state_of(zxStr(view)), "a\0c|3|1"s);
+  EXPECT_EQ(state_of(zxStr(view.substr(1))), "\0c|2|1"s);
+  EXPECT_FALSE(share(zxStr(s.view()), s));
+  const zxStr none;
+  EXPECT_TRUE(std::string_view(none).empty());
+  EXPECT_NE(std::string_view(none).data(), nullptr);
+  // A view becomes a string only when one says so, for that allocates.
+  static_assert(std::is_constructible_v<zxStr, std::string_view>);
+  static_assert(!std::is_convertible_v<std::string_view, zxStr>);
+  static_assert(!std::is_convertible_v<char, zxStr>);
+}
+
+TEST(zxstr, the_characters_are_a_range) {
+  const zxStr s("a\0c"sv);
+  EXPECT_EQ(s.begin(), s.c_str());
+  EXPECT_EQ(s.end() - s.begin(), 3);
+  std::string seen;
+  for (const char byte : s) seen += byte;
+  EXPECT_EQ(seen, "a\0c"s);
+  EXPECT_EQ(std::count(s.begin(), s.end(), '\0'), 1);
+  EXPECT_EQ(std::ranges::find(s, 'c'), s.begin() + 2);
+  zxIStr inner("hello");
+  EXPECT_EQ(std::string(inner.begin(), inner.end()), "hello");
+  inner += "!";
+  EXPECT_EQ(inner.end()[-1], '!');
+  const zxStr none;
+  EXPECT_EQ(none.begin(), none.end());
+  static_assert(std::ranges::contiguous_range<const zxStr&>);
+}
+
 template <class S>
 concept has_view = requires(S&& s) {
   static_cast<S&&>(s).view();
 };
+template <class S>
+concept has_begin = requires(S&& s) {
+  static_cast<S&&>(s).begin();
+};
+template <class S>
+concept has_end = requires(S&& s) {
+  static_cast<S&&>(s).end();
+};
+template <class S>
+concept becomes_view = std::is_convertible_v<S, std::string_view>;
+template <class S>
+concept gives_out =
+    has_view<S> && has_begin<S> && has_end<S> && becomes_view<S>;
+template <class S>
+concept keeps_in =
+    !has_view<S> && !has_begin<S> && !has_end<S> && !becomes_view<S>;
 
 TEST(zxstr, a_temporary_gives_no_view) {
-  static_assert(has_view<zxStr&> && has_view<const zxStr&>);
-  static_assert(!has_view<zxStr> && !has_view<const zxStr>);
+  static_assert(gives_out<zxStr&> && gives_out<const zxStr&>);
+  static_assert(gives_out<zxIStr&> && gives_out<const zxIStr&>);
+  static_assert(keeps_in<zxStr> && keeps_in<const zxStr>);
+  static_assert(keeps_in<zxIStr> && keeps_in<const zxIStr>);
 }
 
 TEST(zxstr, copy_to_takes_characters_and_nul) {
@@ -933,6 +1206,86 @@ TEST(zxstr, block_sizes_beyond_31_bits_are_right) {
   EXPECT_EQ(state_of(s), "hello|5|1");
 }
 
+// A string of nearly 2^31 characters, most of which nobody ever touches.
+class HugeText {
+ public:
+  explicit HugeText(std::int32_t length) {
+    zx_realloc = [](void* block, std::size_t size) -> void* {
+      if (size > PTRDIFF_MAX) return nullptr;
+      if (block == nullptr) return std::calloc(size, 1);
+      if (size == 0) {
+        std::free(block);
+        return nullptr;
+      }
+      return std::realloc(block, size);
+    };
+    void* probe = zx_realloc(nullptr, zx_size(length) + 16);
+    exists = probe != nullptr;
+    std::free(probe);
+    if (!exists) return;
+    text.reserve(length);
+    const_cast<zxStrRep*>(text.representation())->length = length;
+  }
+  ~HugeText() {
+    text.clear();
+    zx_realloc = old;
+  }
+  HugeText(const HugeText&) = delete;
+  HugeText& operator=(const HugeText&) = delete;
+
+  bool exists;
+  zxStr text;
+
+ private:
+  zxReallocFunction old = zx_realloc;
+};
+
+TEST(zxstr, lengths_at_the_end_of_31_bits_assert_and_change_nothing) {
+  constexpr std::int32_t k_length = 0x7FFFFFF0;
+  HugeText huge(k_length);
+  if (!huge.exists) GTEST_SKIP() << "no 2 GiB in one piece here";
+  const struct {
+    const char* name;
+    void (*call)(zxStr&);
+  } rows[] = {
+      {"byte, with the margin", [](zxStr& s) { s += 'x'; }},
+      {"no text, with the margin", [](zxStr& s) { s += ""; }},
+      {"text, with the margin", [](zxStr& s) { s += "x"; }},
+      {"text, the sum", [](zxStr& s) { s += "0123456789abcdef"; }},
+      {"string", [](zxStr& s) { s += zxStr("x"); }},
+      {"itself", [](zxStr& s) { s += s; }},
+      {"+ string", [](zxStr& s) { s + zxStr("0123456789abcdef"); }},
+      {"+ itself", [](zxStr& s) { s + s; }},
+      {"+ text", [](zxStr& s) { s + "0123456789abcdef"; }},
+      {"text +", [](zxStr& s) { "0123456789abcdef" + s; }},
+      {"string +", [](zxStr& s) { zxStr("0123456789abcdef") + s; }},
+      {"build with itself",
+       [](zxStr& s) { s.build(s.c_str(), s.length(), s.c_str(), 16); }},
+      {"set_length", [](zxStr& s) { s.set_length(k_length + 1); }},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.name);
+    EXPECT_ASSERTION(row.call(huge.text), "zxstr");
+    kit::with_failures_dropped([&] { row.call(huge.text); });
+    EXPECT_EQ(huge.text.length(), k_length);
+    EXPECT_EQ(huge.text.capacity(), k_length);
+    EXPECT_EQ(refs(huge.text), 1);
+  }
+}
+
+TEST(zxstr, a_byte_beside_the_longest_string_is_an_assertion) {
+  HugeText huge(INT32_MAX);
+  if (!huge.exists) GTEST_SKIP() << "no 2 GiB in one piece here";
+  EXPECT_ASSERTION(huge.text + 'x', "zxstr");
+  EXPECT_ASSERTION('x' + huge.text, "zxstr");
+  EXPECT_ASSERTION(huge.text += 'x', "zxstr");
+  kit::with_failures_dropped([&] {
+    EXPECT_TRUE((huge.text + 'x').is_empty());
+    EXPECT_TRUE(('x' + huge.text).is_empty());
+  });
+  EXPECT_EQ(huge.text.length(), INT32_MAX);
+}
+
 TEST(zxstr, a_buffer_is_filled_and_its_length_synced) {
   zxStr s("hello");
   const zxStr copy = s;
@@ -958,6 +1311,28 @@ TEST(zxstr, a_buffer_of_the_present_length_is_unshared) {
   s.buffer(5)[0] = 'y';
   EXPECT_EQ(state_of(s), "yello|5|1");
   EXPECT_EQ(state_of(copy), "hello|5|1");
+}
+
+TEST(zxstr, sync_length_at_an_inner_nul_leaves_the_sharers) {
+  zxStr s("a\0b"sv);
+  const zxStr copy = s;
+  s.sync_length();
+  EXPECT_EQ(state_of(s), "a|3|1");
+  EXPECT_EQ(state_of(copy), "a\0b|3|1"s);
+}
+
+TEST(zxstr, a_buffer_that_is_refused_is_null) {
+  zxStr s("hello");
+  zxIStr inner("hello");
+  kit::with_failures_dropped([&] {
+    for (const std::int32_t n : {-1, INT32_MIN, INT32_MAX, INT32_MAX - 63}) {
+      EXPECT_EQ(s.buffer(n), nullptr);
+      EXPECT_EQ(inner.buffer(n), nullptr);
+    }
+  });
+  EXPECT_EQ(state_of(s), "hello|5|1");
+  EXPECT_EQ(state_of(inner), "hello|100|0");
+  EXPECT_EQ(s.buffer(5), s.c_str());
 }
 
 TEST(zxstr, sync_length_stops_at_the_end_of_the_block) {
@@ -1160,6 +1535,523 @@ TEST(zxstr, to_int_agrees_with_a_slow_model) {
   EXPECT_GT(not_zero, 20'000);
 }
 
+// ------------------------------------------------ strings with room inside --
+
+// True if the characters lie in the object itself.
+template <class S>
+bool is_inside(const S& s) {
+  const auto object = reinterpret_cast<std::uintptr_t>(&s);
+  const auto rep = reinterpret_cast<std::uintptr_t>(s.representation());
+  return rep >= object && rep < object + sizeof s;
+}
+
+// A text of that length that tells its places apart.
+std::string text_of_length(std::int32_t length) {
+  std::string text;
+  for (std::int32_t i = 0; i < length; ++i)
+    text += static_cast<char>('a' + i % 26);
+  return text;
+}
+
+TEST(zxstr, the_inner_room_follows_the_pointer_in_the_object) {
+  const zxIStr s;
+  unsigned char object[sizeof s];
+  std::memcpy(object, static_cast<const void*>(&s), sizeof s);
+  const void* pointer;
+  std::int32_t counts[3];
+  std::memcpy(&pointer, object, sizeof pointer);
+  std::memcpy(counts, object + sizeof pointer, sizeof counts);
+  EXPECT_EQ(pointer, reinterpret_cast<const char*>(&s) + sizeof pointer);
+  EXPECT_EQ(counts[0], 100);  // capacity
+  EXPECT_EQ(counts[1], 0);    // refs
+  EXPECT_EQ(counts[2], 0);    // length
+  EXPECT_EQ(object[sizeof pointer + sizeof counts], '\0');
+  // The pointer, three counts, 100 characters and the NUL, up to a multiple
+  // of the pointer.
+  static_assert(sizeof(zxIStr) == (sizeof(void*) == 8 ? 128 : 120));
+  static_assert(zxIStr::k_room == 100);
+  static_assert(!zx_relocatable<zxIStr>);
+  static_assert(zx_relocatable<zxStr>);
+}
+
+TEST(zxstr, inner_constructors_stay_inside_up_to_100_characters) {
+  for (const std::int32_t length : {0, 1, 99, 100, 101, 300}) {
+    SCOPED_TRACE(length);
+    const std::string text = text_of_length(length);
+    const bool fits = length <= 100;
+    const std::string state =
+        text + (fits ? "|100|0" : "|" + std::to_string(length) + "|1");
+    const zxIStr from_text(text.c_str());
+    const zxIStr from_characters(text.data(), length);
+    const zxIStr from_temporary{str(text)};
+    for (const zxIStr* s : {&from_text, &from_characters, &from_temporary}) {
+      EXPECT_EQ(state_of(*s), state);
+      EXPECT_EQ(is_inside(*s), fits);
+      EXPECT_EQ(s->c_str()[length], '\0');
+    }
+    // A string beyond the room is shared as by any string.
+    const zxStr plain = str(text);
+    const zxIStr from_string(plain);
+    EXPECT_EQ(is_inside(from_string), fits);
+    EXPECT_EQ(share(from_string, plain), !fits);
+    EXPECT_EQ(text_of(from_string), text);
+    EXPECT_EQ(refs(plain), fits ? 1 : 2);
+  }
+  EXPECT_EQ(state_of(zxIStr("a\0b", 3)), "a\0b|100|0"s);
+  EXPECT_EQ(state_of(zxIStr("abc", 0)), "|100|0");
+}
+
+TEST(zxstr, inner_constructors_refuse_null_and_negative_lengths) {
+  const char* null = nullptr;
+  EXPECT_ASSERTION(zxIStr(null), "zxstr");
+  EXPECT_ASSERTION(zxIStr(null, 0), "zxstr");
+  EXPECT_ASSERTION(zxIStr(null, 200), "zxstr");
+  EXPECT_ASSERTION(zxIStr("abc", -1), "zxstr");
+  EXPECT_ASSERTION(zxIStr("abc", INT32_MIN), "zxstr");
+  kit::with_failures_dropped([&] {
+    zxIStr a(null);
+    zxIStr b(null, 200);
+    zxIStr c("abc", -1);
+    for (zxIStr* s : {&a, &b, &c}) {
+      EXPECT_EQ(state_of(*s), "|100|0");
+      EXPECT_TRUE(is_inside(*s));
+      s->append("abc");
+      EXPECT_EQ(state_of(*s), "abc|100|0");
+    }
+  });
+}
+
+enum class Way { copy_made, move_made, copied, moved };
+constexpr Way k_ways[] = {Way::copy_made, Way::move_made, Way::copied,
+                          Way::moved};
+
+// What a string of `To` holds, and where, after it has been made from or
+// assigned one of `From`.  `old_length` is its length ahead of an assignment.
+template <class To, class From>
+void expect_taken(Way way, std::int32_t length, std::int32_t old_length) {
+  SCOPED_TRACE("way " + std::to_string(static_cast<int>(way)) + ", " +
+               std::to_string(length) + " over " + std::to_string(old_length));
+  const std::string text = text_of_length(length);
+  auto from = std::make_unique<From>(text.data(), length);
+  const bool from_inside = is_inside(*from);
+  const zxStrRep* block = from->representation();
+  auto to = [&] {
+    if (way == Way::copy_made) return std::make_unique<To>(*from);
+    if (way == Way::move_made) return std::make_unique<To>(std::move(*from));
+    auto old =
+        std::make_unique<To>(std::string(old_length, '-').data(), old_length);
+    if (way == Way::copied) *old = *from;
+    if (way == Way::moved) *old = std::move(*from);
+    return old;
+  }();
+
+  // Only the own room holds a short text; an ordinary string, and one that
+  // has left its room, never returns to it.
+  const bool has_room = std::is_same_v<To, zxIStr> && old_length <= 100;
+  const bool inside = has_room && length <= 100;
+  EXPECT_EQ(is_inside(*to), inside);
+  EXPECT_EQ(text_of(*to), text);
+  EXPECT_EQ(to->c_str()[length], '\0');
+  if (inside) {
+    EXPECT_EQ(state_of(*to), text + "|100|0");
+  } else if (length == 0) {
+    EXPECT_TRUE(is_shared_empty(*to));
+  } else if (from_inside) {
+    // Copied, into the old block where that is large enough.
+    const bool assigned = way == Way::copied || way == Way::moved;
+    const std::int32_t old_room = assigned && !has_room ? old_length : 0;
+    EXPECT_EQ(state_of(*to),
+              text + "|" + std::to_string(std::max(length, old_room)) + "|1");
+  } else {
+    EXPECT_EQ(to->representation(), block);  // shared or taken over
+  }
+
+  // The source has its text still, or nothing; its room stays its own.
+  if (from_inside) {
+    EXPECT_EQ(from->representation(), block);
+  }
+  const bool kept = text_of(*from) == text;
+  EXPECT_TRUE(kept || (is_shared_empty(*from) && way != Way::copy_made &&
+                       way != Way::copied));
+  if (!inside && length > 0 && !from_inside) {
+    EXPECT_EQ(refs(*to), kept ? 2 : 1);
+  }
+
+  // Both live on by themselves.
+  *from += "from";
+  EXPECT_EQ(text_of(*to), text);
+  *to += "to";
+  EXPECT_EQ(text_of(*from), (kept ? text : "") + "from");
+  from.reset();
+  EXPECT_EQ(text_of(*to), text + "to");
+}
+
+TEST(zxstr, the_inner_room_is_never_shared_taken_or_left_dangling) {
+  constexpr std::int32_t k_lengths[] = {0, 1, 99, 100, 101, 300};
+  for (const Way way : k_ways) {
+    for (const std::int32_t length : k_lengths) {
+      const bool assigned = way == Way::copied || way == Way::moved;
+      for (const std::int32_t old_length : k_lengths) {
+        if (!assigned && old_length != 0) continue;
+        expect_taken<zxIStr, zxIStr>(way, length, old_length);
+        expect_taken<zxIStr, zxStr>(way, length, old_length);
+        expect_taken<zxStr, zxIStr>(way, length, old_length);
+        expect_taken<zxStr, zxStr>(way, length, old_length);
+      }
+    }
+  }
+}
+
+TEST(zxstr, appended_bytes_fill_the_inner_room_and_then_take_64_more) {
+  zxIStr s;
+  std::string text;
+  for (int i = 0; i < 100; ++i) {
+    s += 'x';
+    text += 'x';
+    ASSERT_TRUE(is_inside(s)) << i;
+  }
+  EXPECT_EQ(state_of(s), text + "|100|0");
+  s += 'y';
+  EXPECT_FALSE(is_inside(s));
+  EXPECT_EQ(state_of(s), text + "y|164|1");
+}
+
+TEST(zxstr, appended_text_stays_inside_up_to_a_length_of_99) {
+  const struct {
+    std::int32_t before;
+    std::int32_t added;
+    std::int32_t capacity;
+  } rows[] = {{0, 99, 100},  {50, 49, 100}, {98, 1, 100},  {99, 0, 100},
+              {0, 100, 164}, {50, 50, 164}, {99, 1, 164},  {100, 0, 164},
+              {0, 101, 165}, {99, 2, 165},  {100, 1, 165}, {100, 300, 464}};
+  for (const auto& row : rows) {
+    SCOPED_TRACE(std::to_string(row.before) + " " + std::to_string(row.added));
+    const std::string before = text_of_length(row.before);
+    const std::string added = text_of_length(row.added);
+    zxIStr by_text(before.data(), row.before);
+    zxIStr by_bytes(by_text);
+    zxIStr by_string(by_text);
+    by_text += added.c_str();
+    by_bytes.append(added.data(), row.added);
+    by_string += str(added);
+    for (const zxIStr* s : {&by_text, &by_bytes, &by_string}) {
+      EXPECT_EQ(is_inside(*s), row.capacity == 100);
+      EXPECT_EQ(state_of(*s), before + added + "|" +
+                                  std::to_string(row.capacity) +
+                                  (row.capacity == 100 ? "|0" : "|1"));
+    }
+  }
+}
+
+TEST(zxstr, an_inner_string_appends_and_assigns_parts_of_itself) {
+  for (const std::int32_t length : {0, 10, 49, 50, 51, 100}) {
+    for (const std::int32_t from : {0, 7, 50, 100}) {
+      if (from > length) continue;
+      SCOPED_TRACE(std::to_string(length) + " " + std::to_string(from));
+      const std::string text = text_of_length(length);
+      const std::string part = text.substr(zx_size(from));
+      zxIStr whole(text.c_str());
+      whole += whole;
+      EXPECT_EQ(text_of(whole), text + text);
+      zxIStr appended(text.c_str());
+      appended += appended.c_str() + from;
+      EXPECT_EQ(text_of(appended), text + part);
+      zxIStr assigned(text.c_str());
+      assigned = assigned.c_str() + from;
+      EXPECT_EQ(text_of(assigned), part);
+      zxIStr built(text.c_str());
+      built.build(built.c_str() + from, length - from, built.c_str(), length);
+      EXPECT_EQ(text_of(built), part + text);
+    }
+  }
+}
+
+TEST(zxstr, assigned_text_and_bytes_leave_the_inner_room) {
+  const struct {
+    const char* name;
+    void (*assign)(zxIStr&);
+    std::string expected;
+  } rows[] = {
+      {"text", [](zxIStr& s) { s = "new"; }, "new|3|1"},
+      {"empty text", [](zxIStr& s) { s = ""; }, "|0|1"},
+      {"byte", [](zxIStr& s) { s = 'n'; }, "n|1|1"},
+      {"build", [](zxIStr& s) { s.build("ab", 2, "c", 1); }, "abc|3|1"},
+      {"100 characters", [](zxIStr& s) { s = text_of_length(100).c_str(); },
+       text_of_length(100) + "|100|1"},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.name);
+    zxIStr s("hello");
+    row.assign(s);
+    EXPECT_EQ(state_of(s), row.expected);
+    EXPECT_FALSE(is_inside(s));
+    // An ordinary string from then on.
+    const zxStr copy = s;
+    EXPECT_EQ(share(s, copy), !s.is_empty());
+    s.clear();
+    EXPECT_TRUE(is_shared_empty(s));
+  }
+}
+
+TEST(zxstr, an_assigned_empty_string_keeps_the_inner_room) {
+  const zxStr none;
+  const zxIStr inner_none;
+  zxStr emptied("x");
+  emptied.set_length(0);
+  for (const zxStr* empty : {&none, static_cast<const zxStr*>(&inner_none),
+                             static_cast<const zxStr*>(&emptied)}) {
+    zxIStr s("hello");
+    s = *empty;
+    EXPECT_EQ(state_of(s), "|100|0");
+    EXPECT_TRUE(is_inside(s));
+    EXPECT_STREQ(s.c_str(), "");
+  }
+  zxIStr s("hello");
+  s = zxStr();
+  EXPECT_TRUE(is_inside(s));
+  s.append("again");
+  EXPECT_EQ(state_of(s), "again|100|0");
+}
+
+TEST(zxstr, a_grown_inner_string_is_shared_by_assignment) {
+  zxIStr s(text_of_length(99).c_str());
+  s += "and more";
+  ASSERT_FALSE(is_inside(s));
+  zxStr plain;
+  plain = s;
+  EXPECT_TRUE(share(plain, s));
+  EXPECT_EQ(state_of(plain), text_of_length(99) + "and more|171|2");
+  zxIStr other;
+  other = s;
+  EXPECT_TRUE(share(other, s));
+  EXPECT_EQ(refs(s), 3);
+  s.at(0) = 'A';
+  EXPECT_EQ(plain[0], 'a');
+  EXPECT_TRUE(share(plain, other));
+}
+
+TEST(zxstr, operations_on_an_inner_string_work_in_its_room) {
+  const struct {
+    const char* name;
+    void (*change)(zxIStr&);
+    std::string expected;
+  } rows[] = {
+      {"to_upper", [](zxIStr& s) { s.to_upper(); }, "HELLO|100|0"},
+      {"to_lower", [](zxIStr& s) { s.to_lower(); }, "hello|100|0"},
+      {"at", [](zxIStr& s) { s.at(4) = '!'; }, "hell!|100|0"},
+      {"unshare", [](zxIStr& s) { s.unshare(); }, "hello|100|0"},
+      {"clear", [](zxIStr& s) { s.clear(); }, "|100|0"},
+      {"set_length to the same", [](zxIStr& s) { s.set_length(5); },
+       "hello|100|0"},
+      {"set_length down", [](zxIStr& s) { s.set_length(2); }, "he|100|0"},
+      {"set_length to none", [](zxIStr& s) { s.set_length(0); }, "|100|0"},
+      {"set_length down and up",
+       [](zxIStr& s) {
+         s.set_length(1);
+         s.set_length(3);
+       },
+       "h\0\0|100|0"s},
+      {"set_length, just", [](zxIStr& s) { s.set_length(100); },
+       "hello" + std::string(95, '\0') + "|100|0"},
+      {"set_length beyond", [](zxIStr& s) { s.set_length(101); },
+       "hello" + std::string(96, '\0') + "|165|1"},
+      {"reserve within", [](zxIStr& s) { s.reserve(100); }, "hello|100|0"},
+      {"reserve of none", [](zxIStr& s) { s.reserve(0); }, "hello|100|0"},
+      {"reserve beyond", [](zxIStr& s) { s.reserve(101); }, "hello|101|1"},
+      {"buffer within", [](zxIStr& s) { s.buffer(100)[99] = '!'; },
+       "hello" + std::string(94, '\0') + "!|100|0"},
+      {"buffer beyond", [](zxIStr& s) { s.buffer(101)[100] = '!'; },
+       "hello" + std::string(95, '\0') + "!|165|1"},
+      {"sync_length",
+       [](zxIStr& s) {
+         std::memcpy(s.buffer(50), "by a caller", 12);
+         s.sync_length();
+       },
+       "by a caller|100|0"},
+      {"sync_length to none",
+       [](zxIStr& s) {
+         *s.buffer(100) = '\0';
+         s.sync_length();
+       },
+       "|100|0"},
+      {"assignment of itself", [](zxIStr& s) { s = *&s; }, "hello|100|0"},
+      {"a short string", [](zxIStr& s) { s = zxStr("short"); }, "short|100|0"},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.name);
+    zxIStr s("hello");
+    row.change(s);
+    EXPECT_EQ(state_of(s), row.expected);
+    EXPECT_EQ(is_inside(s), row.expected.ends_with("|0"));
+    EXPECT_EQ(s.c_str()[s.length()], '\0');
+  }
+  zxIStr none;
+  none.reserve(0);
+  EXPECT_EQ(state_of(none), "|100|0");
+}
+
+TEST(zxstr, an_emptied_inner_string_that_has_grown_is_an_ordinary_one) {
+  zxIStr s(text_of_length(101).c_str());
+  s.clear();
+  EXPECT_TRUE(is_shared_empty(s));
+  const zxStr plain("hello");
+  s = plain;
+  EXPECT_TRUE(share(s, plain));
+}
+
+TEST(zxstr, an_inner_string_allocates_nothing_while_it_stays_inside) {
+  const SlotWatch slot;
+  const std::string most = text_of_length(100);
+  zxIStr s;
+  for (int i = 0; i < 100; ++i) s += 'x';
+  s.clear();
+  s.append(most.data(), 99);
+  zxIStr copy(s);
+  zxIStr moved(std::move(copy));
+  copy = moved;
+  copy = std::move(moved);
+  copy = zxIStr(most.c_str());
+  copy = zxStr();
+  copy += "some";
+  copy.set_length(100);
+  copy.buffer(50)[3] = '\0';
+  copy.sync_length();
+  copy.reserve(100);
+  copy.at(1) = 'A';
+  copy.to_lower();
+  copy.unshare();
+  copy.append(copy);
+  std::swap(s, copy);
+  EXPECT_FALSE(s == copy);
+  EXPECT_TRUE(s < copy || copy < s);
+  char out[101];
+  copy.copy_to(out, 101);
+  EXPECT_TRUE(is_inside(s) && is_inside(copy) && is_inside(moved));
+  EXPECT_EQ(slot.calls, SlotWatch::Calls());
+}
+
+TEST(zxstr, an_inner_string_returns_no_more_than_it_took) {
+  SlotWatch slot;
+  {
+    zxIStr s(text_of_length(99).c_str());
+    s += 'x';
+    s += 'y';  // 101: one block
+    s.append(text_of_length(70).c_str());
+    zxIStr given(std::move(s));
+    const zxStr copy = given;
+    s = "more";
+  }
+  const auto count = [&](std::string_view start) {
+    return std::count_if(
+        slot.calls.begin(), slot.calls.end(),
+        [&](const std::string& call) { return call.starts_with(start); });
+  };
+  EXPECT_EQ(count("new"), 2);
+  EXPECT_EQ(count("free"), 2);
+}
+
+// Takes by value what it is given, and keeps it beyond the caller's.
+zxStr upper_of(zxStr text) {
+  text.to_upper();
+  return text;
+}
+
+zxStr from_a_work_string(std::int32_t length) {
+  zxIStr work;
+  for (std::int32_t i = 0; i < length; ++i) work += 'w';
+  return work;
+}
+
+zxIStr a_work_string(std::int32_t length) {
+  zxIStr work;
+  for (std::int32_t i = 0; i < length; ++i) work += 'w';
+  return work;
+}
+
+TEST(zxstr, inner_strings_pass_by_value) {
+  for (const std::int32_t length : {0, 5, 100, 101, 300}) {
+    SCOPED_TRACE(length);
+    const std::string text = text_of_length(length);
+    std::string upper = text;
+    for (char& byte : upper) byte = zx_upper(byte);
+    zxIStr s(text.c_str());
+    EXPECT_EQ(text_of(upper_of(s)), upper);
+    EXPECT_EQ(text_of(s), text);
+    EXPECT_EQ(is_inside(s), length <= 100);
+    EXPECT_EQ(text_of(upper_of(std::move(s))), upper);
+    EXPECT_TRUE(text_of(s) == text || is_shared_empty(s));
+
+    const std::string work(zx_size(length), 'w');
+    const zxStr plain = from_a_work_string(length);
+    EXPECT_EQ(text_of(plain), work);
+    EXPECT_EQ(refs(plain), length == 0 ? 0 : 1);
+    const zxIStr returned = a_work_string(length);
+    EXPECT_EQ(text_of(returned), work);
+    EXPECT_EQ(is_inside(returned), length <= 100);
+  }
+}
+
+TEST(zxstr, inner_strings_swap_with_all_strings) {
+  constexpr std::int32_t k_lengths[] = {0, 5, 100, 101, 300};
+  for (const std::int32_t m : k_lengths) {
+    for (const std::int32_t n : k_lengths) {
+      SCOPED_TRACE(std::to_string(m) + " " + std::to_string(n));
+      const std::string a(zx_size(m), 'a');
+      const std::string b(zx_size(n), 'b');
+      zxIStr inner_a(a.c_str());
+      zxIStr inner_b(b.c_str());
+      std::swap(inner_a, inner_b);
+      EXPECT_EQ(text_of(inner_a), b);
+      EXPECT_EQ(text_of(inner_b), a);
+      zxStr plain(a.c_str());
+      std::swap<zxStr>(plain, inner_a);
+      EXPECT_EQ(text_of(plain), b);
+      EXPECT_EQ(text_of(inner_a), a);
+      EXPECT_FALSE(share(plain, inner_a));
+      std::swap<zxStr>(inner_b, plain);
+      EXPECT_EQ(text_of(plain), a);
+      EXPECT_EQ(text_of(inner_b), b);
+    }
+  }
+}
+
+TEST(zxstr, an_inner_string_moved_onto_itself_stays) {
+  for (const std::int32_t length : {0, 5, 100, 101}) {
+    const std::string text = text_of_length(length);
+    zxIStr s(text.c_str());
+    zxIStr& same = s;
+    s = std::move(same);
+    EXPECT_EQ(text_of(s), text);
+    EXPECT_EQ(is_inside(s), length <= 100);
+    zxStr& as_string = s;
+    as_string = std::move(static_cast<zxStr&>(same));
+    EXPECT_EQ(text_of(s), text);
+    EXPECT_EQ(is_inside(s), length <= 100);
+  }
+}
+
+TEST(zxstr, inner_strings_are_concatenated_and_compared_as_strings) {
+  const zxIStr a("hello");
+  const zxIStr none;
+  EXPECT_EQ(state_of(a + " you"), "hello you|9|1");
+  EXPECT_EQ(state_of("you " + a), "you hello|9|1");
+  EXPECT_EQ(state_of(a + a), "hellohello|10|1");
+  EXPECT_EQ(state_of(a + '!'), "hello!|6|1");
+  // What would be shared is copied.
+  EXPECT_EQ(state_of(a + none), "hello|5|1");
+  EXPECT_EQ(state_of(none + a), "hello|5|1");
+  EXPECT_EQ(state_of(a + ""), "hello|5|1");
+  EXPECT_TRUE(is_shared_empty(none + none));
+  EXPECT_EQ(state_of(zxIStr("hello") + " you"), "hello you|9|1");
+  EXPECT_EQ(state_of(zxIStr("hello") + ""), "hello|5|1");
+  EXPECT_TRUE(a == zxStr("hello"));
+  EXPECT_TRUE(zxStr("hello") == a);
+  EXPECT_TRUE(a == zxIStr("hello"));
+  EXPECT_TRUE(a == "hello");
+  EXPECT_FALSE(a == none);
+  EXPECT_TRUE(none < a);
+}
+
 // ------------------------------------------------- corrupt representation --
 
 struct Operation {
@@ -1303,6 +2195,26 @@ TEST(zxstr, a_dropped_failure_leaves_a_corrupt_string_as_it_is) {
   expect_safe_return(k_length_far_off);
 }
 
+TEST(zxstr, every_operation_finds_a_corrupt_inner_room) {
+  const Corruption corruptions[] = {
+      {"negative length", [](zxStrRep& r) { r.length = -1; }},
+      {"length above the room", [](zxStrRep& r) { r.length = 101; }},
+      {"negative capacity", [](zxStrRep& r) { r.capacity = -1; }},
+      {"no NUL", [](zxStrRep& r) { r.data[5] = 'X'; }},
+  };
+  for (const Corruption& corruption : corruptions) {
+    for (const Operation& operation : k_checked_operations) {
+      SCOPED_TRACE(std::string(corruption.name) + ", " + operation.name);
+      zxIStr s("hello");
+      corruption.corrupt(*const_cast<zxStrRep*>(s.representation()));
+      EXPECT_ASSERTION(operation.call(s), "zxstr");
+      kit::with_failures_dropped([&] { operation.call(s); });
+      EXPECT_TRUE(is_inside(s));
+      EXPECT_EQ(std::string_view(s.c_str(), 5), "hello");
+    }
+  }
+}
+
 TEST(zxstr, equality_checks_the_other_string_too) {
   for (const auto& corruption : k_corruptions) {
     SCOPED_TRACE(corruption.name);
@@ -1375,27 +2287,71 @@ TEST(zxstr, crc16_is_that_of_the_bitwise_model) {
   }
 }
 
+TEST(zxstr, crc16_is_the_same_at_every_length_place_and_split) {
+  constexpr unsigned k_seed = 1234;
+  std::printf("seed %u\n", k_seed);
+  std::mt19937 random(k_seed);
+  for (std::size_t length = 0; length <= 64; ++length) {
+    for (std::size_t place = 0; place < 16; ++place) {
+      // The block ends with the bytes, so that a byte too many is noticed.
+      const auto block = std::make_unique<char[]>(place + length);
+      char* bytes = block.get() + place;
+      for (std::size_t i = 0; i < length; ++i)
+        bytes[i] = static_cast<char>(random());
+      const auto start = static_cast<std::uint16_t>(random());
+      const std::string_view all(bytes, length);
+      ASSERT_EQ(crc16(bytes, length), slow_crc16(0xFFFF, all));
+      const std::uint16_t expected = slow_crc16(start, all);
+      for (std::size_t cut = 0; cut <= length; ++cut) {
+        const std::uint16_t first = crc16_add(start, bytes, cut);
+        ASSERT_EQ(first, slow_crc16(start, all.substr(0, cut)));
+        ASSERT_EQ(crc16_add(first, bytes + cut, length - cut), expected);
+      }
+    }
+  }
+}
+
 // --------------------------------------------- random use against a model --
 
-// The rules of one string, told with the standard library:
-// holders share a block by a shared pointer, and capacities are plain numbers.
+// The rules of one string, told with the standard library: holders share a
+// block by a shared pointer, capacities are plain numbers, and the room
+// inside an object is a block that nobody else holds.
 class Model {
  public:
+  Model() = default;
+  explicit Model(bool inner_room) : inside(inner_room) {
+    if (inside) block = std::make_shared<Block>(Block{"", k_room});
+  }
+
   std::string text() const { return block ? block->text : ""; }
   std::int64_t capacity() const { return block ? block->capacity : 0; }
-  std::int64_t refs() const { return block.use_count(); }
+  std::int64_t refs() const { return inside ? 0 : block.use_count(); }
+  bool is_inside() const { return inside; }
   bool shares(const Model& other) const { return block == other.block; }
 
   void assign(const Model& other) {
-    if (other.text().empty() && block != other.block)
-      block = nullptr;
-    else
+    if (block == other.block) return;
+    if (other.text().empty()) {
+      clear();
+    } else if (inside && size_of(other.text()) <= k_room) {
+      block->text = other.text();
+    } else if (other.inside) {
+      build(other.text());
+    } else {
       block = other.block;
+      inside = false;
+    }
+  }
+  // Gives its block up, as a string can that is moved from.
+  void let_go() {
+    if (!inside) block = nullptr;
   }
   void build(const std::string& sum) {
-    const std::int64_t old_capacity = capacity();
     const bool own = refs() == 1;
-    replace(sum, own ? std::max(old_capacity, size_of(sum)) : size_of(sum));
+    const std::int64_t wanted =
+        own ? std::max(capacity(), size_of(sum)) : size_of(sum);
+    block = std::make_shared<Block>(Block{sum, wanted});
+    inside = false;
   }
   void append_byte(char byte) {
     const std::int64_t old_length = size_of(text());
@@ -1416,7 +2372,7 @@ class Model {
   void reserve(std::int64_t n) {
     if (n < size_of(text())) return;
     if (n == 0) {
-      block = nullptr;
+      let_go();
     } else if (n > capacity()) {
       replace(text(), n);
     }
@@ -1424,15 +2380,23 @@ class Model {
   void unshare() {
     if (refs() > 1) replace(text(), size_of(text()));
   }
-  void clear() { block = nullptr; }
+  void clear() {
+    if (inside)
+      block->text.clear();
+    else
+      block = nullptr;
+  }
   void set(std::size_t i, char byte) {
     unshare();
     block->text[i] = byte;
   }
+  // What is written through the pointer of an unshared string with a block.
+  void write(const std::string& text) { block->text = text; }
   void fold(char first, int distance) {
-    for (std::size_t i = 0; i < text().size(); ++i)
-      if (text()[i] >= first && text()[i] < first + 26)
-        set(i, static_cast<char>(text()[i] + distance));
+    const std::string before = text();
+    for (std::size_t i = 0; i < before.size(); ++i)
+      if (before[i] >= first && before[i] < first + 26)
+        set(i, static_cast<char>(before[i] + distance));
   }
   // A concatenation of two strings.
   static Model sum(const Model& a, const Model& b) {
@@ -1443,8 +2407,15 @@ class Model {
       result.build(a.text() + b.text());
     return result;
   }
+  static Model of(const std::string& text) {
+    Model result;
+    result.build(text);
+    return result;
+  }
 
  private:
+  static constexpr std::int64_t k_room = 100;
+
   struct Block {
     std::string text;
     std::int64_t capacity;
@@ -1452,11 +2423,15 @@ class Model {
   static std::int64_t size_of(const std::string& text) {
     return static_cast<std::int64_t>(text.size());
   }
+  // The block stays where it is if it is this string's alone, but for the
+  // inner room, which does not grow.
   void replace(const std::string& text, std::int64_t capacity) {
-    if (refs() == 1)
+    if (inside ? capacity == k_room : refs() == 1) {
       *block = {text, capacity};
-    else
+    } else {
       block = std::make_shared<Block>(Block{text, capacity});
+      inside = false;
+    }
   }
   void append(const std::string& more, std::int64_t grown_capacity) {
     const std::string sum = text() + more;
@@ -1464,23 +2439,28 @@ class Model {
   }
 
   std::shared_ptr<Block> block;  // null: the shared empty one
+  bool inside = false;
 };
 
-// Strings and models that go through the same changes.
+zxStr passed_by_value(zxStr text) { return text; }
+
+// Strings and models that go through the same changes.  The second half of
+// the strings are made with room inside.
 class Pairs {
  public:
-  explicit Pairs(unsigned seed) : random(seed) {}
+  explicit Pairs(unsigned seed) : random(seed) {
+    for (std::size_t i = k_plain; i < k_all; ++i) model[i] = Model(true);
+  }
 
   void step() {
-    const std::size_t i = pick(k_pairs);
-    const std::size_t j = pick(k_pairs);
-    zxStr& s = real[i];
+    const std::size_t i = pick(k_all);
+    const std::size_t j = pick(k_all);
+    zxStr& s = real(i);
     Model& m = model[i];
     const std::string more = any_text();
-    const auto length = static_cast<std::int32_t>(m.text().size());
-    switch (pick(20)) {
+    switch (pick(28)) {
       case 0:
-        s = real[j];
+        s = real(j);
         m.assign(model[j]);
         break;
       case 1:
@@ -1492,7 +2472,7 @@ class Pairs {
         m.build("b");
         break;
       case 3:
-        s.append(real[j]);
+        s.append(real(j));
         m.append_text(model[j].text());
         break;
       case 4:
@@ -1500,8 +2480,7 @@ class Pairs {
         m.append_text(more.c_str());
         break;
       case 5:
-        s += 'b';
-        m.append_byte('b');
+        append_bytes(s, m);
         break;
       case 6:
         s.append(more.data(), zx_count(more.size()));
@@ -1516,10 +2495,10 @@ class Pairs {
         m.unshare();
         break;
       case 9:
-        resize(s, m, length);
+        resize(s, m);
         break;
       case 10:
-        reserve(s, m, length);
+        reserve(s, m);
         break;
       case 11:
         s.to_upper();
@@ -1542,41 +2521,81 @@ class Pairs {
         build_from_own_parts(s, m);
         break;
       case 17:
-        concatenate(s, m, j);
+        assign_own_part(s, m);
         break;
-      case 18: {
-        const zxStr copy(real[j]);
-        Model model_copy;
-        model_copy.assign(model[j]);
-        s = copy;
-        m.assign(model_copy);
+      case 18:
+        move(i, j);
+        break;
+      case 19:
+        swap(i, j);
+        break;
+      case 20: {
+        s = passed_by_value(real(j));
+        Model passed;
+        passed.assign(model[j]);
+        m.assign(passed);
         break;
       }
+      case 21: {
+        const Model sum = Model::sum(Model::sum(m, model[j]), model[i]);
+        s = s + real(j) + s;
+        m.assign(sum);
+        break;
+      }
+      case 22:
+        add_texts(s, m, more.c_str());
+        break;
+      case 23:
+      case 24:
+      case 25:
+      case 26:
+        make_anew(i, j, more);
+        break;
       default:
         s.build(more.data(), zx_count(more.size()));
         m.build(more);
     }
-    if (s.length() > 3000) {
-      s.clear();
-      m.clear();
-    }
+    if (real(i).length() > 1500) make_empty(i);
   }
 
   void check() const {
-    for (std::size_t i = 0; i < k_pairs; ++i) {
-      ASSERT_EQ(text_of(real[i]), model[i].text());
-      ASSERT_EQ(real[i].capacity(), model[i].capacity());
-      ASSERT_EQ(refs(real[i]), model[i].refs());
-      ASSERT_EQ(real[i].c_str()[real[i].length()], '\0');
-      for (std::size_t j = 0; j < i; ++j) {
-        ASSERT_EQ(share(real[i], real[j]), model[i].shares(model[j]));
-        ASSERT_EQ(real[i] == real[j], model[i].text() == model[j].text());
+    for (std::size_t i = 0; i < k_all; ++i) {
+      const zxStr& s = real(i);
+      const Model& m = model[i];
+      ASSERT_EQ(s.view(), m.text());
+      ASSERT_EQ(s.capacity(), m.capacity());
+      ASSERT_EQ(refs(s), m.refs());
+      ASSERT_EQ(s.c_str()[s.length()], '\0');
+      ASSERT_EQ(i >= k_plain && is_inside(roomy[i - k_plain]), m.is_inside());
+      ASSERT_EQ(is_shared_empty(s), m.capacity() == 0 && m.refs() == 0);
+      std::int32_t holders = 0;
+      for (std::size_t j = 0; j < k_all; ++j) {
+        holders += share(s, real(j));
+        ASSERT_EQ(share(s, real(j)), i == j || m.shares(model[j]));
       }
+      if (refs(s) != 0) {
+        ASSERT_EQ(refs(s), holders);
+      }
+    }
+    const std::size_t i = steps++ % k_all;
+    for (std::size_t j = 0; j < k_all; ++j) {
+      const std::string a = model[i].text();
+      const std::string b = model[j].text();
+      ASSERT_EQ(real(i) == real(j), a == b);
+      ASSERT_EQ(real(i) <=> real(j), slow_order(a, b));
     }
   }
 
  private:
-  static constexpr std::size_t k_pairs = 6;
+  static constexpr std::size_t k_plain = 4;
+  static constexpr std::size_t k_all = 8;
+
+  zxStr& real(std::size_t i) {
+    return i < k_plain ? plain[i] : roomy[i - k_plain];
+  }
+  const zxStr& real(std::size_t i) const {
+    return i < k_plain ? plain[i] : roomy[i - k_plain];
+  }
 
   std::size_t pick(std::size_t count) { return random() % count; }
 
@@ -1588,15 +2607,22 @@ class Pairs {
     for (char& byte : text) byte = k_bytes[pick(k_bytes.size())];
     return text;
   }
-  void resize(zxStr& s, Model& m, std::int32_t length) {
+  void append_bytes(zxStr& s, Model& m) {
+    for (std::size_t left = 1 + pick(pick(8) == 0 ? 110 : 3); left > 0;
+         --left) {
+      s += 'b';
+      m.append_byte('b');
+    }
+  }
+  void resize(zxStr& s, Model& m) {
     const std::int32_t n =
-        pick(3) == 0 ? length : static_cast<std::int32_t>(pick(200));
+        pick(3) == 0 ? s.length() : static_cast<std::int32_t>(pick(200));
     s.set_length(n);
     m.set_length(n);
   }
-  void reserve(zxStr& s, Model& m, std::int32_t length) {
+  void reserve(zxStr& s, Model& m) {
     const std::int32_t n =
-        pick(3) == 0 ? length : static_cast<std::int32_t>(pick(400));
+        pick(3) == 0 ? s.length() : static_cast<std::int32_t>(pick(400));
     s.reserve(n);
     m.reserve(n);
   }
@@ -1616,7 +2642,7 @@ class Pairs {
     s.sync_length();
     m.set_length(static_cast<std::int64_t>(room));
     m.unshare();
-    m.build(std::string(used, 'f'));
+    m.write(std::string(used, 'f'));
   }
   void append_own_part(zxStr& s, Model& m) {
     const std::size_t from = pick(m.text().size() + 1);
@@ -1632,16 +2658,131 @@ class Pairs {
             zx_count(text.size() - b));
     m.build(text.substr(a) + text.substr(b));
   }
-  void concatenate(zxStr& s, Model& m, std::size_t j) {
-    const zxStr sum = s + real[j];
-    const Model model_sum = Model::sum(m, model[j]);
-    s = sum;
-    m.assign(model_sum);
+  void assign_own_part(zxStr& s, Model& m) {
+    const std::string text = m.text();
+    const std::size_t from = pick(text.size() + 1);
+    s = s.c_str() + from;
+    m.build(text.c_str() + from);
+  }
+  void add_texts(zxStr& s, Model& m, const char* more) {
+    const Model as_model = *more != '\0' ? Model::of(more) : Model();
+    Model sum = Model::sum(m, as_model);
+    switch (pick(4)) {
+      case 0:
+        s = s + more;
+        break;
+      case 1:
+        s = more + s;
+        sum = Model::sum(as_model, m);
+        break;
+      case 2:
+        s = s + 'c';
+        sum = Model::of(m.text() + 'c');
+        break;
+      default:
+        s = 'c' + s;
+        sum = Model::of('c' + m.text());
+    }
+    m.assign(sum);
+  }
+
+  // A string that was moved from is as it was, or the shared empty one.
+  void let_go_if(const zxStr& from, Model& from_model) {
+    if (is_shared_empty(from)) from_model.let_go();
+  }
+  void move(std::size_t to, std::size_t from) {
+    model[to].assign(model[from]);
+    if (to >= k_plain && from >= k_plain && pick(2) == 0)
+      roomy[to - k_plain] = std::move(roomy[from - k_plain]);
+    else
+      real(to) = std::move(real(from));
+    if (to != from) let_go_if(real(from), model[from]);
+  }
+  void swap(std::size_t i, std::size_t j) {
+    zxStr kept(std::move(real(i)));
+    Model kept_model;
+    kept_model.assign(model[i]);
+    let_go_if(real(i), model[i]);
+    move(i, j);
+    model[j].assign(kept_model);
+    real(j) = std::move(kept);
+  }
+
+  void make_empty(std::size_t i) {
+    if (i < k_plain) {
+      std::destroy_at(&plain[i]);
+      std::construct_at(&plain[i]);
+    } else {
+      std::destroy_at(&roomy[i - k_plain]);
+      std::construct_at(&roomy[i - k_plain]);
+    }
+    model[i] = Model(i >= k_plain);
+  }
+  // In place of one string another is made, from string j or from a text.
+  void make_anew(std::size_t i, std::size_t j, const std::string& text) {
+    make_empty(i);
+    if (i == j) return;
+    if (i < k_plain)
+      make_plain(i, j, text);
+    else
+      make_roomy(i, j, text);
+  }
+  void make_plain(std::size_t i, std::size_t j, const std::string& text) {
+    zxStr* place = &plain[i];
+    std::destroy_at(place);
+    switch (pick(4)) {
+      case 0:
+        std::construct_at(place, std::as_const(real(j)));
+        model[i].assign(model[j]);
+        break;
+      case 1:
+        std::construct_at(place, std::move(real(j)));
+        model[i].assign(model[j]);
+        let_go_if(real(j), model[j]);
+        break;
+      case 2:
+        std::construct_at(place, text[0]);
+        model[i].build(text.substr(0, 1));
+        break;
+      default:
+        std::construct_at(place, text.data(), zx_count(text.size()));
+        model[i].build(text);
+    }
+  }
+  void make_roomy(std::size_t i, std::size_t j, const std::string& text) {
+    zxIStr* place = &roomy[i - k_plain];
+    std::destroy_at(place);
+    switch (pick(4)) {
+      case 0:
+        std::construct_at(place, std::as_const(real(j)));
+        model[i].assign(model[j]);
+        break;
+      case 1:
+        if (j >= k_plain)
+          std::construct_at(place, roomy[j - k_plain]);
+        else
+          std::construct_at(place, plain[j]);
+        model[i].assign(model[j]);
+        break;
+      case 2:
+        if (j >= k_plain)
+          std::construct_at(place, std::move(roomy[j - k_plain]));
+        else
+          std::construct_at(place, std::move(plain[j]));
+        model[i].assign(model[j]);
+        let_go_if(real(j), model[j]);
+        break;
+      default:
+        std::construct_at(place, text.data(), zx_count(text.size()));
+        model[i].assign(Model::of(text));
+    }
   }
 
   std::mt19937 random;
-  std::array<zxStr, k_pairs> real;
-  std::array<Model, k_pairs> model;
+  mutable std::size_t steps = 0;
+  std::array<zxStr, k_plain> plain;
+  std::array<zxIStr, k_all - k_plain> roomy;
+  std::array<Model, k_all> model;
 };
 
 void run_pairs(unsigned seed, int steps) {
