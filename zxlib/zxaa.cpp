@@ -107,17 +107,13 @@ void SlotOrder::start(std::int32_t slots) {
   map = SlotMap(memory.map, slots);
 }
 
-bool SlotOrder::place(std::int32_t entry) {
-  const std::int32_t slot = map.first_free(home_of(memory.hashes[entry]));
+bool SlotOrder::add(std::int32_t entry, std::uint32_t hash) {
+  const std::int32_t slot = map.first_free(home_of(hash));
   if (slot < 0) return false;
   map.take(slot);
   memory.entries_above[slot] = entry + 1;
-  return true;
-}
-
-bool SlotOrder::add(std::int32_t entry, std::uint32_t hash) {
   memory.hashes[entry] = hash;
-  return place(entry);
+  return true;
 }
 
 void SlotOrder::grow(std::int32_t slots) {
@@ -127,7 +123,7 @@ void SlotOrder::grow(std::int32_t slots) {
   const std::uint32_t old_size = size;
   start(slots);
   for (std::uint32_t i = 0; i < old_size; ++i)
-    if (old[i] != 0) place(old[i] - 1);
+    if (old[i] != 0) add(old[i] - 1, memory.hashes[old[i] - 1]);
   zx_realloc(old, 0);
 }
 

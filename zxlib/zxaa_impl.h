@@ -201,7 +201,6 @@ class SlotOrder {
   std::int32_t next(std::int32_t slot) const {
     return static_cast<std::uint32_t>(slot) + 1 == size ? 0 : slot + 1;
   }
-  bool place(std::int32_t entry);
 
   Memory memory = {};
   std::uint32_t size = 0;
