@@ -152,6 +152,7 @@ class zxAA {
     ::new (static_cast<void*>(&entry->value)) V(value);
     grow(0);
   }
+
   // Removes a key; one that is not there: message 2204.
   void erase(const K& key) {
     if (!check_with(key)) return;

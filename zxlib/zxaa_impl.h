@@ -88,7 +88,7 @@ struct Cell {
   std::int32_t entry_above;  // the entry plus one; 0 marks an empty cell
 };
 
-// The cells: open addressing, filled to a half at most.
+// The cells: open addressing, filled to little more than a half at most.
 class Index {
  public:
   Index() = default;
