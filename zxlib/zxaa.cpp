@@ -100,7 +100,7 @@ std::int32_t SlotMap::first_free_from(std::size_t word) const {
 
 void SlotOrder::start(std::int32_t slots) {
   size = static_cast<std::uint32_t>(slots);
-  mask = std::has_single_bit(size) ? size - 1 : 0;
+  mask = mask_of(size);
   std::memset(memory.entries_above, 0, size * sizeof(std::int32_t));
   std::memset(memory.map, 0,
               SlotMap::word_count(slots) * sizeof(std::uint64_t));

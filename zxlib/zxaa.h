@@ -374,7 +374,8 @@ class zxAA {
     else
       h.log[h.growths++] = {count, size};
     capacity = size;
-    mask = (size & (size - 1)) == 0 ? size - 1 : 0;
+    mask = static_cast<std::int32_t>(
+        zxaa_impl::mask_of(static_cast<std::uint32_t>(size)));
   }
 
   // Moves to a block with room for `size` slots, or for twice as many as so

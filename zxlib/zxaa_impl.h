@@ -155,6 +155,11 @@ class SlotMap {
   std::uint64_t* full = nullptr;  // a bit for each word: all of it is taken
 };
 
+// What masks a hash to its home slot; 0 if that takes a division.
+inline std::uint32_t mask_of(std::uint32_t slots) {
+  return std::has_single_bit(slots) ? slots - 1 : 0;
+}
+
 // Which entry lies in which slot.
 class SlotOrder {
  public:
@@ -204,7 +209,7 @@ class SlotOrder {
 
   Memory memory = {};
   std::uint32_t size = 0;
-  std::uint32_t mask = 0;  // size - 1 for a power of two, else 0
+  std::uint32_t mask = 0;
   SlotMap map;
 };
 

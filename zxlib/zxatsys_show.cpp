@@ -23,9 +23,6 @@ constexpr std::size_t k_caption_room = 2 * k_shown_name + 64;
 // of the screen.
 constexpr std::size_t k_one_line = 65;
 
-// One button "OK", the sign of an error, ahead of every other window.
-constexpr std::uint32_t k_box_style = 0x1010;
-
 // The word on the stack by which the dump knows its own frame.
 constexpr std::uint32_t k_dump_check = 0x1234;
 
@@ -44,7 +41,7 @@ void show_box(std::string_view message) {
   caption.add(" FATAL ERROR (");
   caption.add(bail_hooks.program_version(), k_shown_name);
   caption.add(")");
-  zxplat::process.message_box(bail_box_text, bail_caption, k_box_style);
+  zxplat::process.message_box(bail_box_text, bail_caption, zxplat::k_error_box);
 }
 
 // Turns the Hebrew letters of windows into those of the console.

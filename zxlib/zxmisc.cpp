@@ -36,9 +36,6 @@ std::size_t write_shown_name(const char* name) {
   return shown;
 }
 
-// One button "OK", the sign of an error, ahead of every other window.
-constexpr std::uint32_t k_box_style = 0x1010;
-
 // No caller can go on without the block, not even while another failure is
 // being handled.
 [[gnu::cold]] void fail_for_memory() {
@@ -49,7 +46,7 @@ constexpr std::uint32_t k_box_style = 0x1010;
 
 [[gnu::cold]] void fail_for_early_use() {
   zxplat::process.message_box("Using static string/array in a ZXL.",
-                              "fatal init error", k_box_style);
+                              "fatal init error", zxplat::k_error_box);
   zxplat::process.exit(k_exit_early_allocation);
 }
 
@@ -75,7 +72,7 @@ void* zx_realloc_after_cleanup(void* block, std::size_t) {
   if (block == nullptr) return nullptr;
   zxplat::process.message_box(
       "Using static string/array in a ZXL - realloc called after cleanup",
-      "fatal cleanup error", k_box_style);
+      "fatal cleanup error", zxplat::k_error_box);
   zxplat::process.debug_break();
   return nullptr;
 }

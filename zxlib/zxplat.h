@@ -165,6 +165,10 @@ std::size_t temp_directory(std::span<char> out);
 
 // -------------------------------------------------------------- process --
 
+// The style of a message box with one button "OK" and the sign of an error,
+// ahead of every other window.
+inline constexpr std::uint32_t k_error_box = 0x1010;
+
 // The calls on the process and its clocks that a test can replace.
 struct ProcessCalls {
   // Ends the process through its exit handlers; comes back only in tests.

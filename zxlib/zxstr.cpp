@@ -138,9 +138,6 @@ zxStr::zxStr(char byte) : zxStr(&byte, 1) {}
 zxStr::zxStr(std::string_view text)
     : zxStr(text.empty() ? "" : text.data(), zx_count(text.size())) {}
 
-// What is empty or cannot be shared.
-void zxStr::copy_unshareable(const zxStr& other) { *this = other; }
-
 zxStr& zxStr::operator=(const zxStr& other) {
   if (this == &other) return *this;
   if (!check() || !other.check() || rep == other.rep) return *this;
@@ -264,11 +261,10 @@ zxIStr::zxIStr(const char* characters, std::int32_t length) {
 
 void zxIStr::start_with(const char* characters, std::int32_t length) {
   start_inside();
-  if (!ZX_ASSERT(characters != nullptr && length >= 0)) return;
-  if (length <= k_room)
+  if (characters != nullptr && zx_wide(length) <= k_room)
     fill_inner(characters, length);
   else
-    build(characters, length);
+    build(characters, length);  // which refuses what is no text
 }
 
 // ---- sizing

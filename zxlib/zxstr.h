@@ -71,7 +71,7 @@ class zxStr {
     if (other.check() && other.rep->refs > 0 && other.rep->length > 0)
       share(other);
     else
-      copy_unshareable(other);
+      *this = other;  // empty, or not to be shared
   }
   zxStr(zxStr&& other) noexcept : rep(&zx_empty_rep) {
     *this = static_cast<zxStr&&>(other);
@@ -223,7 +223,6 @@ class zxStr {
     ++rep->refs;
   }
   void start(const char* characters, std::int32_t length);
-  void copy_unshareable(const zxStr& other);
   void release() {
     if (rep->refs != 0 && --rep->refs == 0) zx_realloc(rep, 0);
   }

@@ -17,6 +17,7 @@
 
 #include "hvldec.h"
 #include "kit/cases.h"
+#include "kit/failure_road.h"
 #include "kit/faults.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
@@ -26,7 +27,6 @@
 #include "zxatsys.h"
 #include "zxbfile.h"
 #include "zxdate.h"
-#include "zxlib/failure_road.h"
 #include "zxmainf.h"
 #include "zxp2l.h"
 #include "zxpkg.h"
@@ -41,9 +41,9 @@ namespace {
 
 namespace fs = std::filesystem;
 
-using failure_road::say;
-using failure_road::screen;
-using failure_road::start;
+using kit::say;
+using kit::screen;
+using kit::start;
 
 // ------------------------------------------------------- what is expected --
 
@@ -536,11 +536,10 @@ void expect_to_go_on(const std::vector<std::string>& arguments) {
   kit::ProcessOptions options;
   options.directory = folder.path();
   options.variables = {{"ZX_BOX_OUT", folder.file("box")}};
-  failure_road::expect_end(
-      kit::run_case("failure_e2e_goes_on", arguments, options),
-      "checked everything" +
-          screen("1010: close: 'the first' failed (7: and only)",
-                 "[1010-1010-7/0-0/0/the first/and only]"));
+  kit::expect_end(kit::run_case("failure_e2e_goes_on", arguments, options),
+                  "checked everything" +
+                      screen("1010: close: 'the first' failed (7: and only)",
+                             "[1010-1010-7/0-0/0/the first/and only]"));
   EXPECT_FALSE(fs::exists(folder.file("box")));
   EXPECT_NE(kit::read_file(folder.file("P.dmp"))
                 .find("@ERR:1010: close: 'the first' failed (7: and only) "),

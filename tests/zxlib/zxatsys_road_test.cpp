@@ -12,22 +12,22 @@
 #include <vector>
 
 #include "kit/cases.h"
+#include "kit/failure_road.h"
 #include "kit/tempdir.h"
 #include "zxatsys.h"
 #include "zxatsys_impl.h"
-#include "zxlib/failure_road.h"
 #include "zxplat.h"
 #include "zxsfmt.h"
 
 namespace {
 
-using failure_road::expect_end;
-using failure_road::Outcome;
-using failure_road::outcome_of;
-using failure_road::Recorder;
-using failure_road::say;
-using failure_road::screen;
-using failure_road::start;
+using kit::expect_end;
+using kit::Outcome;
+using kit::outcome_of;
+using kit::Recorder;
+using kit::say;
+using kit::screen;
+using kit::start;
 
 using Events = std::vector<std::string>;
 

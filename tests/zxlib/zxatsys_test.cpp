@@ -21,15 +21,15 @@
 
 #include "kit/cases.h"
 #include "kit/failure.h"
+#include "kit/failure_road.h"
 #include "kit/tempdir.h"
 #include "zxatsys_impl.h"
-#include "zxlib/failure_road.h"
 #include "zxplat.h"
 #include "zxsfmt.h"
 
 namespace {
 
-using failure_road::Recorder;
+using kit::Recorder;
 using namespace std::string_literals;
 using namespace std::string_view_literals;
 

@@ -15,22 +15,22 @@
 
 #include "kit/cases.h"
 #include "kit/failure.h"
+#include "kit/failure_road.h"
 #include "zxatsys.h"
 #include "zxatsys_impl.h"
-#include "zxlib/failure_road.h"
 #include "zxplat.h"
 #include "zxsfmt.h"
 #include "zxstr.h"
 
 namespace {
 
-using failure_road::expect_end;
-using failure_road::Outcome;
-using failure_road::outcome_of;
-using failure_road::Recorder;
-using failure_road::say;
-using failure_road::screen;
-using failure_road::start;
+using kit::expect_end;
+using kit::Outcome;
+using kit::outcome_of;
+using kit::Recorder;
+using kit::say;
+using kit::screen;
+using kit::start;
 
 // More than any address space has, and no overflow in itself.
 constexpr std::size_t k_absurd_size = SIZE_MAX / 2;

@@ -1,7 +1,7 @@
-// failure_road.h - what the tests of the whole road of a failure share: a
-// recorder in the place of the system, and cases that fail for real.
-#ifndef FAILURE_ROAD_H
-#define FAILURE_ROAD_H
+// failure_road.h - the test kit: what the tests of the whole road of a failure
+// share: a recorder in the place of the system, and cases that fail for real.
+#ifndef KIT_FAILURE_ROAD_H
+#define KIT_FAILURE_ROAD_H
 
 #include <gtest/gtest.h>
 
@@ -20,7 +20,7 @@
 #include "zxmainf.h"
 #include "zxplat.h"
 
-namespace failure_road {
+namespace kit {
 
 // Puts recorders in the place of print, dump, boxes, debugger, clock, sleep
 // and process exit, which comes back here.  Time passes by a millisecond with
@@ -165,6 +165,6 @@ inline void expect_end(const kit::ProcessResult& process,
   EXPECT_EQ(process.err, "");
 }
 
-}  // namespace failure_road
+}  // namespace kit
 
-#endif  // FAILURE_ROAD_H
+#endif  // KIT_FAILURE_ROAD_H
