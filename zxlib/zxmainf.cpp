@@ -74,8 +74,9 @@ zxStr name_from_file(zxStr name) {
 void set_program_values(const char* path) {
   program_path = path;
   program_version = program_version_text ? program_version_text : "v0";
-  program_name = name_from_file(file_part(program_path));
-  current_dir = working_directory();
+  if (!program_path.is_empty())
+    program_name = name_from_file(file_part(program_path));
+  current_dir = with_slash(get_cwd());
 }
 
 void bind_standard_streams() {

@@ -76,6 +76,7 @@ enum class OpenMode {
   read_write,      // existing file, both; refused without the right to write
   append,          // writing, always at the end; made if it is missing.  The
                    // position after opening is the end.
+  read_append,     // as append, and reading
 };
 
 enum class Whence { start, current, end };
@@ -84,6 +85,13 @@ enum class RenameResult {
   done,
   other_device,  // the two names lie on different devices (17)
   failed,        // for the reason in last_error()
+};
+
+// The room on a disk, as the system counts it.
+struct DiskSpace {
+  std::uint64_t free_clusters;  // those that the caller may use
+  std::uint64_t sectors_per_cluster;
+  std::uint64_t bytes_per_sector;
 };
 
 // The calls on files that a test can make fail.
@@ -119,6 +127,19 @@ struct FileCalls {
   // Deletes a file.  A folder fails with 5, and so do a device and a file
   // without any write permission.
   bool (*remove)(std::string_view name);
+
+  // Makes a folder; a name that is taken fails with 183.
+  bool (*make_folder)(std::string_view name);
+
+  // Deletes a folder; one that is not empty fails with 145.
+  bool (*remove_folder)(std::string_view name);
+
+  // Makes the number `to` stand for what `from` stands for, in place of what
+  // it stood for before; `from` stays.
+  bool (*bind)(Fd from, Fd to);
+
+  // The room on the disk of a drive, 0 for the current one.
+  bool (*disk_space)(char letter, DiskSpace& space);
 };
 
 // The system's own calls, and the table in force, which starts as a copy of
@@ -139,6 +160,19 @@ enum class NameKind {
 };
 NameKind kind_of(std::string_view name);
 
+// What the system knows of a name.  Links are followed.
+struct FileStatus {
+  NameKind kind;
+  std::int64_t size;      // in bytes; 0 for what is no regular file
+  std::int64_t modified;  // seconds since 1970-01-01 00:00 UTC
+  bool is_executable;     // for its owner; the runtime's guess on Windows
+};
+FileStatus status_of(std::string_view name);
+
+// True if the name is that of a whole volume: a drive or, on Windows, a
+// shared folder of another computer.
+bool is_volume(std::string_view name);
+
 // True if something has this name, be it a link that leads nowhere.  False
 // with 2 in last_error() says that the name is free; with any other number,
 // that it cannot be told.
@@ -151,8 +185,12 @@ bool same_file(std::string_view a, std::string_view b);
 // would have to cross devices; true otherwise, also when it cannot be told.
 bool on_one_device(std::string_view from, std::string_view to);
 
-// Gives the file `to` the modification time and the permissions of `from`.
-bool copy_attributes(std::string_view from, std::string_view to);
+// Gives the file `to` the permissions of `from`.
+bool copy_permissions(std::string_view from, std::string_view to);
+
+// Gives the file `to` the modification time of `from`, as its access time as
+// well.
+bool copy_time(std::string_view from, std::string_view to);
 
 // The working directory and the system's directory for temporary files, in
 // Win32 form.  Each returns the length of the text and stores it with a NUL
@@ -162,6 +200,42 @@ bool copy_attributes(std::string_view from, std::string_view to);
 // "\tmp\"; it ends in a backslash.
 std::size_t current_directory(std::span<char> out);
 std::size_t temp_directory(std::span<char> out);
+
+// Changes the working directory.
+bool set_current_directory(std::string_view name);
+
+// An entry of a folder.
+struct FolderEntry {
+  std::string_view name;  // lasts until the next entry is asked for
+  bool is_folder;         // or a link to one
+  bool is_link;           // it leads somewhere else
+};
+
+// Reads a folder's entries, in the system's order and without "." and "..".
+// Entries whose names cannot be names here, such as those that hold a
+// wildcard or a backslash, are left out.
+//
+//   FolderReader reader("data");
+//   for (FolderEntry entry; reader.next(entry);) ...
+class FolderReader {
+ public:
+  // A folder that cannot be read has no entries; the reason is in
+  // last_error().  An empty name is the working directory.
+  explicit FolderReader(std::string_view folder);
+  ~FolderReader();
+  FolderReader(const FolderReader&) = delete;
+  FolderReader& operator=(const FolderReader&) = delete;
+
+  // The next entry; false at the end.
+  bool next(FolderEntry& entry);
+
+ private:
+  // The system's handle, and what it has delivered ahead.
+  std::intptr_t handle;
+  std::size_t at = 0;
+  std::size_t size = 0;
+  alignas(8) char room[8192];
+};
 
 // -------------------------------------------------------------- process --
 

@@ -128,6 +128,12 @@ std::size_t current_directory(std::span<char> out) {
   return path.size();
 }
 
+bool set_current_directory(std::string_view name) {
+  posix::Path path;
+  if (!posix::to_path(name, path)) return false;
+  return posix::on_existing(path, ::chdir) == 0 || posix::fail_on(path);
+}
+
 std::size_t temp_directory(std::span<char> out) {
   const char* value = temp_variable();
   const std::string_view path = value != nullptr ? value : "/tmp/";

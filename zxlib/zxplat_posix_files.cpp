@@ -126,15 +126,19 @@ int open_as(Path& path, OpenMode mode) {
       return open_existing(path, O_RDWR);
     case OpenMode::append:
       return at_end(open_or_make(path, O_WRONLY | O_APPEND));
+    case OpenMode::read_append:
+      return at_end(open_or_make(path, O_RDWR | O_APPEND));
   }
   errno = EINVAL;
   return k_no_fd;
 }
 
 Fd open_null_device(OpenMode mode) {
-  const int flags = mode == OpenMode::read         ? O_RDONLY
-                    : mode == OpenMode::read_write ? O_RDWR
-                                                   : O_WRONLY;
+  const bool both =
+      mode == OpenMode::read_write || mode == OpenMode::read_append;
+  const int flags = mode == OpenMode::read ? O_RDONLY
+                    : both                 ? O_RDWR
+                                           : O_WRONLY;
   const Fd fd = open_path("/dev/null", flags);
   if (fd == k_no_fd) fail();
   return fd;
@@ -350,15 +354,42 @@ bool crosses_devices(std::string_view from, std::string_view to) {
          mounts_differ(source.text, folder_path.text);
 }
 
-bool set_attributes(const char* path, const Status& status) {
-  const timespec times[2] = {{0, UTIME_OMIT}, status.st_mtim};
-  return ::utimensat(AT_FDCWD, path, times, 0) == 0 &&
-         ::chmod(path, status.st_mode & k_permissions) == 0;
+// Has a call carried out on the path of `to`, with the status of `from`.
+template <typename Call>
+bool copy_from(std::string_view from, std::string_view to, const Call& call) {
+  Path path;
+  Status source;
+  Status target;
+  if (!status_of_file(from, path, source)) return false;
+  if (!status_of_file(to, path, target)) return false;
+  return call(static_cast<const char*>(path.text), source) == 0 ||
+         fail_on(path);
+}
+
+NameKind kind_of_mode(mode_t mode) {
+  if (S_ISREG(mode)) return NameKind::file;
+  if (S_ISDIR(mode)) return NameKind::directory;
+  return S_ISCHR(mode) ? NameKind::device : NameKind::other;
+}
+
+bool bind_to(Fd from, Fd to) {
+  return retry([&] { return ::dup2(from, to); }) != -1 || fail();
 }
 
 constexpr FileCalls k_calls = {
-    open_file, read_bytes, write_bytes, seek_to,     flush_file,
-    size_of,   close_file, rename_file, remove_file,
+    open_file,
+    read_bytes,
+    write_bytes,
+    seek_to,
+    flush_file,
+    size_of,
+    close_file,
+    rename_file,
+    remove_file,
+    posix::make_folder,
+    posix::remove_folder,
+    bind_to,
+    posix::disk_space,
 };
 
 }  // namespace
@@ -366,13 +397,16 @@ constexpr FileCalls k_calls = {
 const FileCalls system_files = k_calls;
 constinit FileCalls files = k_calls;
 
-NameKind kind_of(std::string_view name) {
+NameKind kind_of(std::string_view name) { return status_of(name).kind; }
+
+FileStatus status_of(std::string_view name) {
   Path path;
   Status status;
-  if (!status_of_file(name, path, status)) return NameKind::missing;
-  if (S_ISREG(status.st_mode)) return NameKind::file;
-  if (S_ISDIR(status.st_mode)) return NameKind::directory;
-  return S_ISCHR(status.st_mode) ? NameKind::device : NameKind::other;
+  if (!status_of_file(name, path, status))
+    return {NameKind::missing, 0, 0, false};
+  const NameKind kind = kind_of_mode(status.st_mode);
+  return {kind, kind == NameKind::file ? status.st_size : 0,
+          status.st_mtim.tv_sec, (status.st_mode & S_IXUSR) != 0};
 }
 
 bool name_taken(std::string_view name) {
@@ -398,13 +432,17 @@ bool on_one_device(std::string_view from, std::string_view to) {
   return !crosses;
 }
 
-bool copy_attributes(std::string_view from, std::string_view to) {
-  Path path;
-  Status source;
-  Status target;
-  if (!status_of_file(from, path, source)) return false;
-  if (!status_of_file(to, path, target)) return false;
-  return set_attributes(path.text, source) || fail_on(path);
+bool copy_permissions(std::string_view from, std::string_view to) {
+  return copy_from(from, to, [](const char* path, const Status& source) {
+    return ::chmod(path, source.st_mode & k_permissions);
+  });
+}
+
+bool copy_time(std::string_view from, std::string_view to) {
+  return copy_from(from, to, [](const char* path, const Status& source) {
+    const timespec times[2] = {source.st_mtim, source.st_mtim};
+    return ::utimensat(AT_FDCWD, path, times, 0);
+  });
 }
 
 }  // namespace zxplat

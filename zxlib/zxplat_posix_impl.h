@@ -29,6 +29,9 @@ bool is_null_device(std::string_view name);
 // True for a name of the printer, which this system has none of.
 bool is_printer(std::string_view name);
 
+// True for the one drive there is, as in "C:" and "c:\\".
+bool is_drive_form(std::string_view name);
+
 // Turns a name into a path: slashes, and no drive.  False with the number
 // set if no file can have that name; the null device is none.
 bool to_path(std::string_view name, Path& path);
@@ -69,6 +72,11 @@ auto on_existing(Path& path, const Call& call) {
   }
   return call(static_cast<const char*>(path.text));
 }
+
+// The calls of FileCalls on folders and disks.
+bool make_folder(std::string_view name);
+bool remove_folder(std::string_view name);
+bool disk_space(char letter, DiskSpace& space);
 
 // Stops in the debugger if one is attached.
 void break_into_debugger();

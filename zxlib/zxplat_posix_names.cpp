@@ -59,14 +59,19 @@ constexpr char fold(char c) {
   return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
 }
 
+constexpr bool is_letter(char c) { return fold(c) >= 'a' && fold(c) <= 'z'; }
+
+constexpr char raise(char c) {
+  return is_letter(c) ? static_cast<char>(fold(c) - 'a' + 'A') : c;
+}
+
 bool folds_alike(std::string_view a, std::string_view b) {
   return std::equal(a.begin(), a.end(), b.begin(), b.end(),
                     [](char x, char y) { return fold(x) == fold(y); });
 }
 
 bool has_drive(std::string_view name) {
-  return name.size() >= 2 && name[1] == ':' && fold(name[0]) >= 'a' &&
-         fold(name[0]) <= 'z';
+  return name.size() >= 2 && name[1] == ':' && is_letter(name[0]);
 }
 
 bool is_unc(std::string_view name) {
@@ -127,12 +132,81 @@ int find_in_folder(const char* folder, std::string_view wanted, char* best) {
   return error;
 }
 
-// Respells the component [begin, end) of `text`, which is not there as it
-// stands; the component ends in a NUL for the time being.
-int respell(char* text, std::size_t begin, std::size_t end) {
+bool is_there(const char* path) {
+  struct stat status;
+  return ::lstat(path, &status) == 0;
+}
+
+// The last path that was found in another spelling, as it was asked for and
+// as it is on the disk: else a walk over the files of a folder would list
+// the folders above it once for each.
+struct Respelling {
+  char asked[k_max_name + 1];
+  char found[k_max_name + 1];
+  std::size_t length;
+
+  void remember(const char* asked_path, const char* path, std::size_t size) {
+    std::memcpy(asked, asked_path, size);
+    std::memcpy(found, path, size);
+    asked[size] = '\0';
+    length = size;
+  }
+
+  // True if both paths begin with the path up to `end`, a component's.
+  bool knows(const char* asked_path, std::size_t end) const {
+    const bool is_end = asked[end] == '/' || asked[end] == '\0';
+    return end <= length && is_end && std::memcmp(asked, asked_path, end) == 0;
+  }
+};
+constinit Respelling last_respelling = {};
+
+// A path on its way to the spelling on the disk, and as it was asked for.
+struct Search {
+  char* text;
+  char asked[k_max_name + 1];
+  bool is_respelled = false;
+
+  explicit Search(Path& path) : text(path.text) {
+    std::memcpy(asked, path.text, path.length + 1);
+  }
+
+  // These look for another spelling of the component [begin, end), which is
+  // not there as it stands and ends in a NUL for the time being.
+  bool try_spelling(const char* spelling, std::size_t begin, std::size_t end);
+  bool try_capitals(std::size_t begin, std::size_t end);
+  bool try_last_time(std::size_t begin, std::size_t end);
+  int list(std::size_t begin, std::size_t end);
+  int respell(std::size_t begin, std::size_t end);
+
+  int find_component(std::size_t begin, std::size_t end);
+};
+
+bool Search::try_spelling(const char* spelling, std::size_t begin,
+                          std::size_t end) {
+  char wanted[NAME_MAX + 1];
+  std::memcpy(wanted, text + begin, end - begin);
+  std::memcpy(text + begin, spelling, end - begin);
+  if (is_there(text)) return true;
+  std::memcpy(text + begin, wanted, end - begin);
+  return false;
+}
+
+// Capitals are the first spelling in byte order, and that of old disks.
+bool Search::try_capitals(std::size_t begin, std::size_t end) {
+  char capitals[NAME_MAX + 1];
+  std::transform(text + begin, text + end, capitals, raise);
+  return try_spelling(capitals, begin, end);
+}
+
+bool Search::try_last_time(std::size_t begin, std::size_t end) {
+  const Respelling& last = last_respelling;
+  return last.knows(asked, end) && std::memcmp(text, last.found, begin) == 0 &&
+         try_spelling(last.found + begin, begin, end);
+}
+
+int Search::list(std::size_t begin, std::size_t end) {
   char wanted[NAME_MAX + 1];
   char best[NAME_MAX + 1] = "";
-  if (end - begin > NAME_MAX) return ENAMETOOLONG;
   std::memcpy(wanted, text + begin, end - begin);
   text[begin] = '\0';
   const int error =
@@ -141,12 +215,21 @@ int respell(char* text, std::size_t begin, std::size_t end) {
   return error;
 }
 
-int find_component(char* text, std::size_t begin, std::size_t end) {
-  struct stat status;
+int Search::respell(std::size_t begin, std::size_t end) {
+  if (end - begin > NAME_MAX) return ENAMETOOLONG;
+  if (std::none_of(text + begin, text + end, is_letter)) return ENOENT;
+  if (try_capitals(begin, end) || try_last_time(begin, end)) return 0;
+  return list(begin, end);
+}
+
+int Search::find_component(std::size_t begin, std::size_t end) {
   const char kept = text[end];
   text[end] = '\0';
-  int error = ::lstat(text, &status) == 0 ? 0 : errno;
-  if (error == ENOENT) error = respell(text, begin, end);
+  int error = is_there(text) ? 0 : errno;
+  if (error == ENOENT) {
+    error = respell(begin, end);
+    if (error == 0) is_respelled = true;
+  }
   text[end] = kept;
   return error;
 }
@@ -164,6 +247,11 @@ bool is_printer(std::string_view name) {
   return folds_alike(name, "prn") || folds_alike(name, "lpt1");
 }
 
+bool is_drive_form(std::string_view name) {
+  if (!has_drive(name) || fold(name[0]) != 'c') return false;
+  return name.size() == 2 || (name.size() == 3 && is_slash(name[2]));
+}
+
 bool to_path(std::string_view name, Path& path) {
   if (const int number = refusal(name)) return fail_with(number);
   if (has_drive(name)) name.remove_prefix(2);
@@ -173,15 +261,21 @@ bool to_path(std::string_view name, Path& path) {
 }
 
 int find(Path& path) {
+  Search search(path);
   const std::string_view text(path.text, path.length);
+  std::size_t found = 0;
+  int error = 0;
   std::size_t begin = text.find_first_not_of('/');
   while (begin != text.npos) {
     const std::size_t end = std::min(text.find('/', begin), text.size());
-    const int error = find_component(path.text, begin, end);
-    if (error != 0) return error;
+    error = search.find_component(begin, end);
+    if (error != 0) break;
+    found = end;
     begin = text.find_first_not_of('/', end);
   }
-  return 0;
+  if (search.is_respelled)
+    last_respelling.remember(search.asked, path.text, found);
+  return error;
 }
 
 std::size_t last_component(const Path& path) {

@@ -50,6 +50,8 @@ int open_flags(OpenMode mode) {
       return _O_RDWR;
     case OpenMode::append:
       return _O_WRONLY | _O_CREAT | _O_APPEND;
+    case OpenMode::read_append:
+      return _O_RDWR | _O_CREAT | _O_APPEND;
   }
   return _O_RDONLY;
 }
@@ -70,9 +72,13 @@ bool is_read_only(const char* path) {
          (attributes & FILE_ATTRIBUTE_READONLY) != 0;
 }
 
+bool is_appending(OpenMode mode) {
+  return mode == OpenMode::append || mode == OpenMode::read_append;
+}
+
 bool is_overwriting(OpenMode mode) {
   return mode == OpenMode::create || mode == OpenMode::read_write ||
-         mode == OpenMode::append;
+         is_appending(mode);
 }
 
 Fd open_null_device(OpenMode mode) {
@@ -95,7 +101,7 @@ Fd open_file(std::string_view name, OpenMode mode) {
   }
   const Attempt attempt;
   const Fd fd = open_path(text.text, open_flags(mode));
-  if (fd != k_no_fd && mode == OpenMode::append) go_to_end(fd);
+  if (fd != k_no_fd && is_appending(mode)) go_to_end(fd);
   return attempt.settle(fd, fd != k_no_fd);
 }
 
@@ -249,15 +255,69 @@ DWORD attributes_to_set(const Information& information) {
 }
 
 bool set_attributes(const char* path, const Information& source) {
+  return ::SetFileAttributesA(path, attributes_to_set(source)) != 0;
+}
+
+bool set_times(const char* path, const Information& source) {
+  const FILETIME& time = source.ftLastWriteTime;
   const Handle file(path, FILE_WRITE_ATTRIBUTES);
-  return file.is_open() &&
-         ::SetFileTime(file.get(), nullptr, nullptr, &source.ftLastWriteTime) &&
-         ::SetFileAttributesA(path, attributes_to_set(source));
+  return file.is_open() && ::SetFileTime(file.get(), nullptr, &time, &time);
+}
+
+// Has a call carried out on the path of `to`, with the information on `from`.
+bool copy_from(std::string_view from, std::string_view to,
+               bool (*call)(const char*, const Information&)) {
+  Name source;
+  Name target;
+  Information information;
+  if (!to_name(from, source) || !to_name(to, target)) return false;
+  const Attempt attempt;
+  return attempt.settle(information_of(source.text, information) &&
+                        call(target.text, information));
+}
+
+// The system counts tenths of microseconds from 1601-01-01.
+std::int64_t seconds_of(const FILETIME& time) {
+  constexpr std::int64_t k_per_second = 10'000'000;
+  constexpr std::int64_t k_1970 = 11'644'473'600;  // in seconds
+  const auto high = static_cast<std::int64_t>(time.dwHighDateTime);
+  return (high << 32 | time.dwLowDateTime) / k_per_second - k_1970;
+}
+
+// What an answer of the system on a file comes to; the two structures that
+// it answers in have these fields alike.
+template <typename Answer>
+FileStatus status_from(const char* path, const Answer& answer) {
+  const bool is_folder =
+      (answer.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
+  const auto high = static_cast<std::int64_t>(answer.nFileSizeHigh);
+  struct __stat64 guess;
+  const bool is_executable =
+      ::_stat64(path, &guess) == 0 && (guess.st_mode & _S_IEXEC) != 0;
+  return {is_folder ? NameKind::directory : NameKind::file,
+          is_folder ? 0 : high << 32 | answer.nFileSizeLow,
+          seconds_of(answer.ftLastWriteTime), is_executable};
+}
+
+bool bind_to(Fd from, Fd to) {
+  const Attempt attempt;
+  return attempt.settle(::_dup2(from, to) == 0);
 }
 
 constexpr FileCalls k_calls = {
-    open_file, read_bytes, write_bytes, seek_to,     flush_file,
-    size_of,   close_file, rename_file, remove_file,
+    open_file,
+    read_bytes,
+    write_bytes,
+    seek_to,
+    flush_file,
+    size_of,
+    close_file,
+    rename_file,
+    remove_file,
+    win32::make_folder,
+    win32::remove_folder,
+    bind_to,
+    win32::disk_space,
 };
 
 }  // namespace
@@ -265,16 +325,24 @@ constexpr FileCalls k_calls = {
 const FileCalls system_files = k_calls;
 constinit FileCalls files = k_calls;
 
-NameKind kind_of(std::string_view name) {
+NameKind kind_of(std::string_view name) { return status_of(name).kind; }
+
+// Through a handle, which follows links; what cannot be opened even for this
+// is asked for by name.
+FileStatus status_of(std::string_view name) {
+  constexpr FileStatus k_missing = {NameKind::missing, 0, 0, false};
   Name text;
-  if (!to_name(name, text)) return NameKind::missing;
+  if (!to_name(name, text)) return k_missing;
   const Attempt attempt;
-  const DWORD attributes = ::GetFileAttributesA(text.text);
-  if (!attempt.settle(attributes != INVALID_FILE_ATTRIBUTES)) {
-    return NameKind::missing;
+  FileStatus status = k_missing;
+  Information information;
+  WIN32_FILE_ATTRIBUTE_DATA data;
+  if (information_of(text.text, information)) {
+    status = status_from(text.text, information);
+  } else if (::GetFileAttributesExA(text.text, GetFileExInfoStandard, &data)) {
+    status = status_from(text.text, data);
   }
-  const bool is_folder = (attributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
-  return is_folder ? NameKind::directory : NameKind::file;
+  return attempt.settle(status, status.kind != NameKind::missing);
 }
 
 bool name_taken(std::string_view name) {
@@ -305,14 +373,12 @@ bool on_one_device(std::string_view from, std::string_view to) {
   return !crosses;
 }
 
-bool copy_attributes(std::string_view from, std::string_view to) {
-  Name source;
-  Name target;
-  Information information;
-  if (!to_name(from, source) || !to_name(to, target)) return false;
-  const Attempt attempt;
-  return attempt.settle(information_of(source.text, information) &&
-                        set_attributes(target.text, information));
+bool copy_permissions(std::string_view from, std::string_view to) {
+  return copy_from(from, to, set_attributes);
+}
+
+bool copy_time(std::string_view from, std::string_view to) {
+  return copy_from(from, to, set_times);
 }
 
 }  // namespace zxplat

@@ -47,6 +47,11 @@ bool is_null_device(std::string_view name);
 // that name; the null device is none.
 bool to_name(std::string_view name, Name& out);
 
+// The calls of FileCalls on folders and disks.
+bool make_folder(std::string_view name);
+bool remove_folder(std::string_view name);
+bool disk_space(char letter, DiskSpace& space);
+
 // Stops in the debugger if one is attached.
 void break_into_debugger();
 

@@ -480,6 +480,24 @@ zxStr operator+(char a, const zxStr& b) {
   return zxStr::joined(&a, 1, b.c_str(), b.length());
 }
 
+void trim(zxStr& text) {
+  const char* first = text.begin();
+  const char* last = text.end();
+  while (first < last && zx_is_space(*first)) ++first;
+  while (first < last && zx_is_space(last[-1])) --last;
+  if (first == last) return text.clear();
+  if (last - first < text.length())
+    text.build(first, static_cast<std::int32_t>(last - first));
+}
+
+void strip_line_end(zxStr& text) {
+  std::int32_t length = text.length();
+  if (!text.view().ends_with('\n')) return;
+  --length;
+  if (length > 0 && text[length - 1] == '\r') --length;
+  text.set_length(length);
+}
+
 void bail_code(std::int32_t number, const zxStr& text,
                const BailDetail& detail) {
   bail_code(number, text.c_str(), detail);

@@ -292,6 +292,12 @@ zxStr operator+(const zxStr& a, char b);
 zxStr operator+(const char* a, const zxStr& b);
 zxStr operator+(char a, const zxStr& b);
 
+// Removes white space (class k_class_space) at both ends.
+void trim(zxStr& text);
+
+// Removes one line feed, and a carriage return ahead of it, from the end.
+void strip_line_end(zxStr& text);
+
 // The failure entries for texts held in a string.
 void bail_code(std::int32_t number, const zxStr& text,
                const BailDetail& detail = no_detail);

@@ -1,21 +1,19 @@
-// zxsys2.cpp - operations on whole files by name.
+// zxsys2.cpp - copying, moving, deleting, folders, disks, the environment.
 // Tests: tests/zxlib/zxsys2_test.cpp.
 #include "zxsys2.h"
 
-#include "zxbfile.h"
+#include <algorithm>
+#include <cstdlib>
+
+#include "zxisfile.h"
 #include "zxplat.h"
-#include "zxtext.h"
 
 namespace {
 
-struct State {
-  zxStr temp_directory;
-  std::uint32_t names_made = 0;
-};
-constinit State state;
+constinit zxStr temp_directory;
 
-constexpr int k_name_tries = 30;
-constexpr std::int32_t k_copy_block = 49152;
+// What a directory must have free to count as one with space.
+constexpr std::int32_t k_least_space = 512000;
 
 // The text that a platform query leaves in a buffer, which is made larger
 // until the text fits; an assertion with the given line fails without one.
@@ -34,90 +32,46 @@ zxStr text_of(std::size_t (*query)(std::span<char>), std::int32_t line) {
   }
 }
 
-// True if a name begins with a drive, as in "C:".
-bool is_drive(const zxStr& path) {
-  return zx_is(path.c_str()[0], k_class_latin) && path.c_str()[1] == ':';
-}
+// ---- copying and moving
 
-// How far the directory of a name reaches.
-std::int32_t dir_length(const zxStr& path) {
-  std::int32_t n = path.length();
-  for (; n > 0; --n) {
-    const char last = path.c_str()[n - 1];
-    if (last == '\\' || last == '/') return n;
-    if (n == 2 && is_drive(path)) return n;
-  }
-  return 0;
-}
-
-// A candidate for a unique name: a number from the clock and a counter.
-zxStr candidate_name(const zxStr& directory, const char* extension) {
-  ++state.names_made;
-  const std::uint32_t number =
-      (zxplat::process.ticks() * 9876553U + state.names_made) % 99991U;
-  char room[12];
-  zxText digits(room);
-  digits.add_int(static_cast<std::int32_t>(number));
-  zxStr name = with_slash(directory) + "tmp";
-  name.append(room);
-  name.append('.').append(extension == nullptr ? "tmp" : extension);
-  const std::int32_t last = name.length() - 1;
-  if (name[last] == '.') name.set_length(last);
-  return name;
-}
-
-bool is_free(const zxStr& name) {
-  return !zxplat::name_taken(name.view()) &&
-         zxplat::last_error() == zxplat::k_err_not_found;
-}
-
-// Copies to the end of `in`.
-void copy_rest(zxBFile& in, zxBFile& out) {
-  zxStr block;
-  char* const room = block.buffer(k_copy_block);
-  std::int32_t got = 0;
-  while (in.read(room, k_copy_block, &got)) out.write(room, got);
-}
-
-// Creates a file under a unique name by `create`, a member of zxBFile that
-// refuses a name that is taken: another process may have taken it since it
-// was found free, and then the next one is tried.  The name, also on failure.
-zxStr create_unique(zxBFile& file, bool (zxBFile::*create)(const zxStr&),
-                    const zxStr& directory, const char* extension) {
+// As create_unique(), fatal on failure.
+zxStr create_unique_or_die(zxBFile& file, zxCreateNew create,
+                           const zxStr& directory, const char* extension) {
   zxStr name;
-  for (int i = 0; i < k_name_tries; ++i) {
-    name = uniqfile(directory, extension);
-    if ((file.*create)(name)) return name;
-    if (zxplat::last_error() != zxplat::k_err_exists_on_create) break;
+  switch (create_unique(file, create, directory, extension, name)) {
+    case zxUnique::created:
+      break;
+    case zxUnique::no_name:
+      bail_code(1037, name);
+      break;
+    case zxUnique::not_created:
+      bail_code(1004, name);
+      break;
   }
-  bail_code(1004, name);
   return name;
 }
 
-// Copies `from` into a new file beside `to`, down to the device, and for its
-// owner alone: it must never be more readable than its source.  The name of
-// the copy; empty if a failure was dropped on the way.
-zxStr copy_beside(const zxStr& from, const zxStr& to) {
+// Whether a copy has to be on the device before its source may go.
+enum class Safety { source_stays, source_goes };
+
+// Copies `from` into a new file beside `to`, for its owner alone: it must
+// never be more readable than its source.  The name of the copy; empty if a
+// failure was dropped on the way.
+zxStr copy_beside(const zxStr& from, const zxStr& to, Safety safety) {
   zxBFile in;
   in.open_or_die(from);
   if (!in.is_open()) return {};
   zxBFile out;
-  const zxStr name =
-      create_unique(out, &zxBFile::try_create_private, dir_part(to), "cpy");
+  const zxStr name = create_unique_or_die(out, &zxBFile::try_create_private,
+                                          dir_part(to), "cpy");
   if (!out.is_open()) return {};
-  copy_rest(in, out);
-  out.sync(no_detail);
+  copy_stream(in, out);
+  if (safety == Safety::source_goes) out.sync(no_detail);
   const bool all_read = !in.handle->error();
   in.close(no_detail);
   if (out.close()) return all_read ? name : zxStr();
   bail_code(1010, name);
   return {};
-}
-
-bool crosses_devices(zxplat::RenameResult result) {
-  return result == zxplat::RenameResult::other_device ||
-         (result == zxplat::RenameResult::failed &&
-          zxplat::last_error() == zxplat::k_err_not_found);
 }
 
 // Deletes a copy that cannot take its place; the failure shows its own cause.
@@ -130,85 +84,63 @@ bool give_copy_up(const zxStr& copy, std::int32_t message, const zxStr& to) {
 }
 
 // The whole of cpfile(); true if the copy stands under its name.
-bool copy_file(const zxStr& from, const zxStr& to) {
-  const zxStr copy = copy_beside(from, to);
+bool copy_file(const zxStr& from, const zxStr& to, Safety safety) {
+  const zxStr copy = copy_beside(from, to, safety);
   if (copy.is_empty()) return false;
-  zxplat::copy_attributes(from.view(), copy.view());
+  copy_time(from, copy);
+  zxplat::copy_permissions(from.view(), copy.view());
   if (!try_delete(to)) return give_copy_up(copy, 1027, to);
   const bool renamed = zxplat::files.rename(copy.view(), to.view()) ==
                        zxplat::RenameResult::done;
   return renamed || give_copy_up(copy, 1038, to);
 }
 
+bool crosses_devices(zxplat::RenameResult result) {
+  return result == zxplat::RenameResult::other_device ||
+         (result == zxplat::RenameResult::failed &&
+          zxplat::last_error() == zxplat::k_err_not_found);
+}
+
 // The source goes only when the copy stands under the name `to`.
 void move_by_copy(const zxStr& from, const zxStr& to) {
-  if (copy_file(from, to)) delfile(from);
+  if (copy_file(from, to, Safety::source_goes)) delfile(from);
+}
+
+// Carries an operation out for each file of a walk, the target being the
+// same name in another directory.
+void each_to_dir(const zxStr& pattern, const zxStr& dir, std::int32_t message,
+                 void (*operation)(const zxStr&, const zxStr&)) {
+  if (!isfile(with_slash(dir), "d")) return bail_code(message, dir);
+  zxQVA<zxStr> list;
+  list.append(pattern);
+  for (zxStr name; next_file(list, name);)
+    operation(name, path_join(dir, file_part(name)));
+}
+
+// ---- folders
+
+bool ends_in_separator(const zxStr& path) {
+  return path.view().ends_with('\\') || path.view().ends_with('/');
+}
+
+// The name without separators at its end, as far as it is no root.
+zxStr without_final_separators(zxStr path) {
+  const std::string_view text = path.view();
+  const bool has_drive =
+      text.size() > 1 && zx_is(text[0], k_class_latin) && text[1] == ':';
+  const std::int32_t shortest = has_drive ? 3 : 1;
+  while (path.length() > shortest && ends_in_separator(path))
+    path.set_length(path.length() - 1);
+  return path;
 }
 
 }  // namespace
 
-zxStr with_slash(const zxStr& directory) {
-  const std::int32_t n = directory.length();
-  if (n == 0) return directory;
-  const char last = directory.c_str()[n - 1];
-  if (last == '\\' || (n == 2 && is_drive(directory))) return directory;
-  if (last != '/') return directory + '\\';
-  zxStr result = directory;
-  result.at(n - 1) = '\\';
-  return result;
+// ---- copying and moving
+
+void cpfile(const zxStr& from, const zxStr& to) {
+  copy_file(from, to, Safety::source_stays);
 }
-
-zxStr dir_part(const zxStr& path) { return {path.c_str(), dir_length(path)}; }
-
-zxStr file_part(const zxStr& path) {
-  const std::int32_t start = dir_length(path);
-  return {path.c_str() + start, path.length() - start};
-}
-
-zxStr working_directory() {
-  return with_slash(text_of(zxplat::current_directory, 398));
-}
-
-const zxStr& temp_path() {
-  if (state.temp_directory.is_empty())
-    state.temp_directory = with_slash(text_of(zxplat::temp_directory, 575));
-  return state.temp_directory;
-}
-
-void clear_temp_path() { state.temp_directory.clear(); }
-
-zxStr uniqfile(const zxStr& directory, const char* extension) {
-  zxStr name;
-  for (int i = 0; i < k_name_tries; ++i) {
-    name = candidate_name(directory, extension);
-    if (is_free(name)) return name;
-  }
-  bail_code(1037, name);
-  return name;
-}
-
-zxStr unique_temp_name(const char* extension) {
-  return uniqfile(temp_path(), extension);
-}
-
-zxStr create_temp_file(zxBFile& file, const char* extension) {
-  return create_unique(file, &zxBFile::try_create_new, temp_path(), extension);
-}
-
-bool try_delete(const zxStr& name) {
-  return zxplat::files.remove(name.view()) ||
-         zxplat::last_error() == zxplat::k_err_not_found;
-}
-
-void delefile(const zxStr& name) {
-  if (!try_delete(name)) bail_code(1027, name);
-}
-
-void delfile(const zxStr& name) {
-  if (!zxplat::files.remove(name.view())) bail_code(1026, name);
-}
-
-void cpfile(const zxStr& from, const zxStr& to) { copy_file(from, to); }
 
 void move_file(const zxStr& from, const zxStr& to) {
   const bool same = from == to || zxplat::same_file(from.view(), to.view());
@@ -228,4 +160,157 @@ void move_file(const zxStr& from, const zxStr& to) {
   if (result == zxplat::RenameResult::done) return;
   if (crosses_devices(result)) return move_by_copy(from, to);
   bail_code(1036, from + " to " + to);
+}
+
+void cpfiles2dir(const zxStr& pattern, const zxStr& dir) {
+  each_to_dir(pattern, dir, 1034, cpfile);
+}
+
+void mvfiles2dir(const zxStr& pattern, const zxStr& dir) {
+  each_to_dir(pattern, dir, 1035, move_file);
+}
+
+void copy_time(const zxStr& from, const zxStr& to) {
+  const bool is_known =
+      zxplat::kind_of(from.view()) != zxplat::NameKind::missing;
+  if (!ZX_ASSERT_AT(is_known, "zxsys2", 174)) return;
+  ZX_ASSERT_AT(zxplat::copy_time(from.view(), to.view()), "zxsys2", 177);
+}
+
+// ---- deleting
+
+bool try_delete(const zxStr& name) {
+  return zxplat::files.remove(name.view()) ||
+         zxplat::last_error() == zxplat::k_err_not_found;
+}
+
+void delefile(const zxStr& name) {
+  if (!try_delete(name)) bail_code(1027, name);
+}
+
+void delfile(const zxStr& name) {
+  if (!zxplat::files.remove(name.view())) bail_code(1026, name);
+}
+
+void delfiles(const zxStr& pattern) {
+  zxQVA<zxStr> list;
+  list.append(pattern);
+  for (zxStr name; next_file(list, name);) delefile(name);
+}
+
+// ---- directories
+
+bool try_createdir(const zxStr& name) {
+  return !name.is_empty() &&
+         zxplat::files.make_folder(without_final_separators(name).view());
+}
+
+void createdir(const zxStr& name) {
+  if (!try_createdir(name)) bail_code(1030, name);
+}
+
+bool make_path(const zxStr& name) {
+  if (name.is_empty()) return false;
+  zxQVA<zxStr> missing;  // the innermost first
+  zxStr path = without_final_separators(name);
+  while (!isfile(path, "d")) {
+    if (ends_in_separator(path)) return false;  // a root that is not there
+    missing.append(path);
+    const zxStr above = zxPath(path).dir;
+    if (above.is_empty()) return false;
+    path = without_final_separators(above);
+    if (path.length() >= missing.last().length()) return false;
+  }
+  while (missing.length() > 0)
+    if (!try_createdir(missing.pop_last())) return false;
+  return true;
+}
+
+void make_path_or_die(const zxStr& name) {
+  if (!make_path(name)) bail_code(1032, name);
+}
+
+void deldir(const zxStr& name) {
+  if (!zxplat::files.remove_folder(name.view())) bail_code(1031, name);
+}
+
+zxStr get_cwd() { return text_of(zxplat::current_directory, 398); }
+
+zxStr chg_dir(const zxStr& name) {
+  const zxStr old = get_cwd();
+  if (name.is_empty()) return old;
+  const zxPath path(name, true);
+  if (!zxplat::set_current_directory(path.dir.view())) bail_code(1032, name);
+  return old;
+}
+
+// ---- disks
+
+std::int32_t diskfree(char drive_letter, std::uint32_t unit) {
+  if (!ZX_ASSERT(unit > 0)) return 0;
+  zxplat::DiskSpace space;
+  if (!zxplat::files.disk_space(drive_letter, space)) {
+    bail_code(1028);
+    return 0;
+  }
+  const std::uint64_t sectors = space.free_clusters * space.sectors_per_cluster;
+  const std::uint64_t units = sectors / unit * space.bytes_per_sector;
+  return static_cast<std::int32_t>(std::min<std::uint64_t>(units, INT32_MAX));
+}
+
+std::int32_t disk_bytes(char drive_letter) { return diskfree(drive_letter, 1); }
+
+std::int32_t disk_kb(char drive_letter) { return diskfree(drive_letter, 1024); }
+
+bool drive_ok(char drive_letter) {
+  if (!ZX_ASSERT_AT(zx_is(drive_letter, k_class_latin), "zxsys2", 519))
+    return false;
+  zxplat::DiskSpace space;
+  return zxplat::files.disk_space(drive_letter, space);
+}
+
+bool space_for(const zxStr& path) {
+  const char letter = zxPath(path, true).drive_letter;
+  if (letter != '\0' && !drive_ok(letter)) return false;
+  return disk_bytes(letter) >= k_least_space && isfile(path, "dw");
+}
+
+// ---- temporary files, the environment
+
+const zxStr& temp_path() {
+  if (temp_directory.is_empty())
+    temp_directory = with_slash(text_of(zxplat::temp_directory, 575));
+  return temp_directory;
+}
+
+void clear_temp_path() { temp_directory.clear(); }
+
+zxStr uniqfile(const zxStr& directory, const char* extension) {
+  zxStr name;
+  if (!try_uniqfile(directory, extension, name)) bail_code(1037, name);
+  return name;
+}
+
+zxStr unique_temp_name(const char* extension) {
+  return uniqfile(temp_path(), extension);
+}
+
+zxStr create_temp_file(zxBFile& file, const char* extension) {
+  return create_unique_or_die(file, &zxBFile::try_create_new, temp_path(),
+                              extension);
+}
+
+zxStr get_env(const zxStr& name) {
+  const char* value = std::getenv(name.c_str());
+  return value != nullptr ? zxStr(value) : zxStr();
+}
+
+void redirect_stdout(const zxStr& name) {
+  constexpr zxplat::Fd k_out = zxplat::k_stdout_fd;
+  zx_standard_stream(k_out).flush();  // what was written goes where it was to
+  const zxplat::Fd fd =
+      zxplat::files.open(name.view(), zxplat::OpenMode::read_append);
+  if (!ZX_ASSERT_AT(fd != zxplat::k_no_fd, "zxsys2", 630)) return;
+  ZX_ASSERT_AT(zxplat::files.bind(fd, k_out), "zxsys2", 631);
+  ZX_ASSERT_AT(zxplat::files.close(fd), "zxsys2", 632);
 }
