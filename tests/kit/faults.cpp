@@ -10,8 +10,8 @@ namespace kit {
 namespace {
 
 constexpr std::array<const char*, k_calls> k_names = {
-    "open", "read",  "write",  "flush", "seek",
-    "size", "close", "rename", "remove"};
+    "open",     "read", "write",  "flush", "seek",   "size",
+    "set_size", "lock", "unlock", "close", "rename", "remove"};
 
 struct Plan {
   int calls = 0;
@@ -63,6 +63,22 @@ const zxplat::FileCalls k_failing = {
     .size =
         [](zxplat::Fd fd) {
           return fails(Call::size) ? std::int64_t{-1} : real().size(fd);
+        },
+    .set_size =
+        [](zxplat::Fd fd, std::int64_t size) {
+          return !fails(Call::set_size) && real().set_size(fd, size);
+        },
+    .lock =
+        [](zxplat::Fd fd, std::int64_t start, std::int64_t size) {
+          return !fails(Call::lock) && real().lock(fd, start, size);
+        },
+    .unlock =
+        [](zxplat::Fd fd, std::int64_t start, std::int64_t size) {
+          return !fails(Call::unlock) && real().unlock(fd, start, size);
+        },
+    .set_mode =
+        [](zxplat::Fd fd, zxplat::StreamMode mode) {
+          return real().set_mode(fd, mode);
         },
     .close =
         [](zxplat::Fd fd) {
