@@ -1,4 +1,4 @@
-// zxbfile.cpp - the file class.
+// zxbfile.cpp - the file class; its lines of text are in zxbfile_text.cpp.
 // Tests: tests/zxlib/zxbfile_test.cpp.
 #include "zxbfile.h"
 
@@ -10,6 +10,7 @@ using zxplat::Whence;
 namespace {
 
 constexpr std::int32_t k_max_name = 254;
+constexpr std::int32_t k_bulk_buffer = 24576;
 
 // The message that reports opening an object that is open already.
 std::int32_t already_open_error(OpenMode mode) {
@@ -70,6 +71,18 @@ bool zxBFile::open_rw(const zxStr& file_name) {
   return open_as(file_name, OpenMode::read_write);
 }
 
+void zxBFile::open_rw_or_die(const zxStr& file_name, const BailDetail& detail) {
+  if (!open_rw(file_name)) bail_code(1006, file_name, detail);
+}
+
+bool zxBFile::try_append(const zxStr& file_name) {
+  return open_as(file_name, OpenMode::append);
+}
+
+void zxBFile::append(const zxStr& file_name, const BailDetail& detail) {
+  if (!try_append(file_name)) bail_code(1004, file_name, detail);
+}
+
 bool zxBFile::try_create(const zxStr& file_name) {
   return open_as(file_name, OpenMode::create);
 }
@@ -109,6 +122,22 @@ void zxBFile::close(const BailDetail& detail) {
   if (!close()) bail_code(1010, closed_name, detail);
 }
 
+zxStr zxBFile::get_name() const {
+  if (handle != nullptr) return name;
+  bail_code(1007);
+  return zxStr();
+}
+
+// ---- buffering
+
+bool zxBFile::set_buffer(std::int32_t size) {
+  return handle != nullptr && size > 0 && handle->set_buffer(zx_size(size));
+}
+
+void zxBFile::fastio() {
+  if (!set_buffer(k_bulk_buffer)) bail_code(1011, name);
+}
+
 // ---- reading and writing
 
 bool zxBFile::read(void* buffer, std::int32_t size, std::int32_t* got,
@@ -127,24 +156,61 @@ bool zxBFile::read(void* buffer, std::int32_t size, std::int32_t* got,
   return false;
 }
 
-bool zxBFile::read_all(void* buffer, std::int32_t size,
+bool zxBFile::try_read(void* buffer, std::int32_t size, std::int32_t* got) {
+  if (got != nullptr) *got = 0;
+  if (!ZX_ASSERT(size >= 0) || handle == nullptr) return false;
+  const std::int32_t count =
+      static_cast<std::int32_t>(handle->read(buffer, zx_size(size)));
+  if (got != nullptr) *got = count;
+  return count == size || (got != nullptr && count != 0);
+}
+
+bool zxBFile::read_all(void* buffer, std::size_t size,
                        const BailDetail& detail) {
-  if (read(buffer, size, nullptr, detail)) return true;
+  if (handle != nullptr && handle->read(buffer, size) == size) return true;
   bail_code(1014, name, detail);
   return false;
 }
 
-void zxBFile::write(const void* buffer, std::int32_t size,
+bool zxBFile::read_all(void* buffer, std::int32_t size,
+                       const BailDetail& detail) {
+  return ZX_ASSERT(size >= 0) && read_all(buffer, zx_size(size), detail);
+}
+
+bool zxBFile::read_str(zxStr& text, std::int32_t size) {
+  if (!ZX_ASSERT(size >= 0)) return false;
+  if (text.representation()->refs >= 2) text.clear();  // nothing to copy
+  char* const room = text.buffer(size);
+  std::int32_t got = 0;
+  const bool is_read = room != nullptr && read(room, size, &got);
+  text.set_length(got);
+  return is_read;
+}
+
+bool zxBFile::read_str_all(zxStr& text, std::int32_t size) {
+  return ZX_ASSERT_AT(read_str(text, size), "zxbfile", 222);
+}
+
+void zxBFile::write(const void* buffer, std::size_t size,
                     const BailDetail& detail) {
-  if (!ZX_ASSERT(size >= 0)) return;
-  if (handle == nullptr || !handle->write(buffer, zx_size(size)))
+  if (handle == nullptr || !handle->write(buffer, size))
     bail_code(1016, name, detail);
 }
 
-void zxBFile::puts(const zxStr& text) {
-  if (handle == nullptr) return bail_code(1024);
-  write(text.c_str(), text.length());
-  ++lines;
+void zxBFile::write(const void* buffer, std::int32_t size,
+                    const BailDetail& detail) {
+  if (ZX_ASSERT(size >= 0)) write(buffer, zx_size(size), detail);
+}
+
+bool zxBFile::try_write(const void* buffer, std::int32_t size) {
+  if (!ZX_ASSERT(size >= 0)) return false;
+  if (handle != nullptr) return handle->write(buffer, zx_size(size));
+  bail_code(1016);
+  return false;
+}
+
+void zxBFile::flush(const BailDetail& detail) {
+  if (handle == nullptr || !handle->flush()) bail_code(1020, name, detail);
 }
 
 void zxBFile::sync(const BailDetail& detail) {
@@ -153,14 +219,22 @@ void zxBFile::sync(const BailDetail& detail) {
 
 // ---- positions
 
-bool zxBFile::seek(std::int32_t position, const BailDetail& detail) {
-  if (!ZX_ASSERT(handle != nullptr && position >= 0)) return false;
-  if (!handle->seek(position, Whence::start)) {
-    bail_code(1012, name, detail);
-    return false;
-  }
+bool zxBFile::seek_as_told(std::int32_t position) {
+  if (!handle->seek(position, Whence::start)) return false;
   if (position == 0) lines = 0;
   return true;
+}
+
+bool zxBFile::seek(std::int32_t position, const BailDetail& detail) {
+  if (!ZX_ASSERT(handle != nullptr && position >= 0)) return false;
+  if (seek_as_told(position)) return true;
+  bail_code(1012, name, detail);
+  return false;
+}
+
+bool zxBFile::try_seek(std::int32_t position) {
+  return ZX_ASSERT(handle != nullptr && position >= 0) &&
+         seek_as_told(position);
 }
 
 bool zxBFile::seek_end(const BailDetail& detail) {
@@ -174,4 +248,55 @@ std::int32_t zxBFile::tell(const BailDetail& detail) {
   if (at >= 0 && at <= INT32_MAX) return static_cast<std::int32_t>(at);
   bail_code(1013, name, detail);
   return -1;
+}
+
+// ---- the file's size
+
+std::int32_t zxBFile::length() const {
+  if (handle == nullptr) {
+    bail_code(1018);
+    return -1;
+  }
+  const std::int64_t size = handle->size();
+  return size > INT32_MAX ? -1 : static_cast<std::int32_t>(size);
+}
+
+std::int32_t zxBFile::length(const BailDetail& detail) const {
+  const std::int32_t size = handle == nullptr ? -1 : length();
+  if (size < 0) bail_code(1019, name, detail);
+  return size;
+}
+
+void zxBFile::chsize(std::int32_t size, const BailDetail& detail) {
+  if (handle == nullptr || !handle->set_size(size))
+    bail_code(1023, name, detail);
+}
+
+// ---- locks
+
+// Nothing that was read before may be taken for what is there behind a lock.
+bool zxBFile::prepare_lock(std::int32_t position, std::int32_t error,
+                           const BailDetail& detail) {
+  if (handle == nullptr || !handle->flush()) {
+    bail_code(error, name, detail);
+    return false;
+  }
+  handle->drop_unread();
+  return seek(position, detail);
+}
+
+bool zxBFile::lock(std::int32_t position, std::int32_t size,
+                   const BailDetail& detail) {
+  if (!ZX_ASSERT(size >= 0) || !prepare_lock(position, 1033, detail))
+    return false;
+  if (size == 0 || handle->lock(position, size)) return true;
+  if (zxplat::last_error() != zxplat::k_err_lock) bail_code(1021, name, detail);
+  return false;
+}
+
+void zxBFile::unlock(std::int32_t position, std::int32_t size,
+                     const BailDetail& detail) {
+  if (!ZX_ASSERT(size >= 0) || !prepare_lock(position, 1092, detail)) return;
+  if (size > 0 && !handle->unlock(position, size))
+    bail_code(1022, name, detail);
 }

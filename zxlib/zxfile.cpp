@@ -10,10 +10,6 @@
 
 namespace {
 
-constexpr std::size_t k_buffer_size = 65536;
-// What is read at once behind a seek; it doubles up to the whole buffer.
-constexpr std::size_t k_first_read_ahead = 4096;
-
 constinit zxStream standard_streams[] = {zxStream(zxplat::k_stdin_fd),
                                          zxStream(zxplat::k_stdout_fd),
                                          zxStream(zxplat::k_stderr_fd)};
@@ -66,8 +62,8 @@ void zxStream::close_all() {
        stream = stream->older) {
     stream->flush();
     stream->close_descriptor();
-    stream->state = State::idle;
-    stream->next = stream->end = 0;
+    stream->go_idle();
+    stream->forget_held_ranges();
     stream->position = -1;
     stream->write_failed = false;
   }
@@ -77,16 +73,56 @@ bool zxStream::close(zxStream* stream) {
   const bool written = stream->flush() && !stream->write_failed;
   const bool closed = stream->close_descriptor();
   stream->leave_open_streams();
-  if (stream->buffer != nullptr) zx_realloc(stream->buffer, 0);
+  stream->forget_held_ranges();
+  stream->drop_buffer();
   stream->~zxStream();
   zx_realloc(stream, 0);
   return written && closed;
 }
 
+// ---- the buffer
+
 void zxStream::take_buffer() {
   next = end = 0;
   if (buffer == nullptr)
-    buffer = static_cast<char*>(zx_realloc(nullptr, k_buffer_size));
+    buffer = static_cast<char*>(zx_realloc(nullptr, capacity));
+  set_room_end();
+}
+
+// The byte that fills the buffer goes the long way: it is written down at
+// once.
+void zxStream::set_room_end() {
+  room_end = state == State::writing && !unbuffered ? capacity - 1 : 0;
+}
+
+void zxStream::go_idle() {
+  state = State::idle;
+  next = end = room_end = 0;
+}
+
+void zxStream::set_unbuffered() {
+  unbuffered = true;
+  set_room_end();
+}
+
+// Resizing the block keeps what is unread.
+bool zxStream::set_buffer(std::size_t size) {
+  if (fd == zxplat::k_no_fd || size == 0 || !flush()) return false;
+  if (size > capacity) {
+    capacity = size;
+    if (buffer != nullptr)
+      buffer = static_cast<char*>(zx_realloc(buffer, capacity));
+  }
+  first_read_ahead = size;
+  unbuffered = false;
+  set_room_end();
+  return true;
+}
+
+void zxStream::drop_buffer() {
+  go_idle();
+  if (buffer != nullptr) zx_realloc(buffer, 0);
+  buffer = nullptr;
 }
 
 // ---- reading
@@ -112,9 +148,21 @@ std::size_t zxStream::read_from_system(char* out, std::size_t size) {
 }
 
 void zxStream::fill() {
-  if (read_ahead < k_first_read_ahead) read_ahead = k_first_read_ahead;
+  if (read_ahead < first_read_ahead) read_ahead = first_read_ahead;
+  if (read_ahead > capacity) read_ahead = capacity;
   end = read_from_system(buffer, read_ahead);
-  if (read_ahead < k_buffer_size) read_ahead *= 2;
+  if (read_ahead < capacity) read_ahead *= 2;
+}
+
+std::string_view zxStream::unread_from_system() {
+  if (!begin_reading()) return {};
+  if (next == end) fill();
+  return {buffer + next, end - next};
+}
+
+int zxStream::get_from_system() {
+  if (unread_from_system().empty()) return -1;
+  return static_cast<unsigned char>(buffer[next++]);
 }
 
 // Hands out what is in the buffer, up to `size` bytes; the count.
@@ -133,7 +181,7 @@ std::size_t zxStream::read(void* out, std::size_t size) {
   while (done < size) {
     const std::size_t left = size - done;
     std::size_t count = 0;
-    if (left >= k_buffer_size) {
+    if (left >= capacity) {
       count = read_from_system(to + done, left);
     } else {
       fill();
@@ -143,6 +191,15 @@ std::size_t zxStream::read(void* out, std::size_t size) {
     done += count;
   }
   return done;
+}
+
+bool zxStream::drop_unread() {
+  if (state != State::reading) return true;
+  const bool is_at_position = give_back_unread();
+  if (!is_at_position) position = -1;
+  next = end = 0;
+  read_ahead = 0;
+  return is_at_position;
 }
 
 // Moves the descriptor back over the bytes that were read ahead.
@@ -191,10 +248,10 @@ bool zxStream::write_down(const char* bytes, std::size_t size) {
 bool zxStream::write(const void* bytes, std::size_t size) {
   if (!begin_writing()) return false;
   const char* from = static_cast<const char*>(bytes);
-  while (next + size >= k_buffer_size) {
-    const std::size_t piece = k_buffer_size - next;
+  while (next + size >= capacity) {
+    const std::size_t piece = capacity - next;
     std::memcpy(buffer + next, from, piece);
-    next = k_buffer_size;
+    next = capacity;
     from += piece;
     size -= piece;
     if (!flush()) return false;
@@ -251,4 +308,67 @@ std::int64_t zxStream::tell() {
   if (at < 0) return -1;
   if (state == State::writing) return at + static_cast<std::int64_t>(next);
   return at - static_cast<std::int64_t>(end - next);
+}
+
+// ---- the size
+
+bool zxStream::set_size(std::int64_t size) {
+  return flush() && drop_unread() && zxplat::files.set_size(fd, size);
+}
+
+// ---- locks
+
+struct zxStream::HeldRange {
+  std::int64_t start;
+  std::int64_t size;
+  HeldRange* next;
+};
+
+// The link to the range that is exactly this; null if none is held.
+zxStream::HeldRange** zxStream::find_held(std::int64_t start,
+                                          std::int64_t size) {
+  for (HeldRange** link = &held; *link != nullptr; link = &(*link)->next)
+    if ((*link)->start == start && (*link)->size == size) return link;
+  return nullptr;
+}
+
+bool zxStream::holds_any_of(std::int64_t start, std::int64_t size) const {
+  for (const HeldRange* range = held; range != nullptr; range = range->next)
+    if (start < range->start + range->size && range->start < start + size)
+      return true;
+  return false;
+}
+
+void zxStream::forget_held_ranges() {
+  while (held != nullptr) {
+    HeldRange* const range = held;
+    held = range->next;
+    zx_realloc(range, 0);
+  }
+}
+
+// The systems differ in what they make of a stream that meets its own locks,
+// so they are never asked.
+bool zxStream::lock(std::int64_t start, std::int64_t size) {
+  if (holds_any_of(start, size)) {
+    zxplat::set_last_error(zxplat::k_err_lock);
+    return false;
+  }
+  if (!zxplat::files.lock(fd, start, size)) return false;
+  held = ::new (zx_realloc(nullptr, sizeof(HeldRange)))
+      HeldRange{start, size, held};
+  return true;
+}
+
+bool zxStream::unlock(std::int64_t start, std::int64_t size) {
+  HeldRange** const link = find_held(start, size);
+  if (link == nullptr) {
+    zxplat::set_last_error(zxplat::k_err_not_locked);
+    return false;
+  }
+  if (!zxplat::files.unlock(fd, start, size)) return false;
+  HeldRange* const range = *link;
+  *link = range->next;
+  zx_realloc(range, 0);
+  return true;
 }

@@ -86,6 +86,16 @@ void bind_standard_streams() {
   attach_stream(g_stderr, name, zx_standard_stream(zxplat::k_stderr_fd));
 }
 
+// Leaves a standard stream written down and empty, and the descriptor as a
+// program without the library has it.
+void let_go(zxBFile& file, zxplat::Fd descriptor) {
+  zxStream& stream = zx_standard_stream(descriptor);
+  file.close();
+  stream.flush();  // another object may have written to it
+  stream.drop_buffer();
+  zxplat::files.set_mode(descriptor, zxplat::StreamMode::text);
+}
+
 // The order of clearing is fixed; other modules join it here.
 void clear_at_exit() {
   program_path.clear();
@@ -94,9 +104,9 @@ void clear_at_exit() {
   program_name.clear();
   g_args.clear();
   clear_temp_path();
-  g_stdin.close();
-  g_stdout.close();
-  g_stderr.close();
+  let_go(g_stdin, zxplat::k_stdin_fd);
+  let_go(g_stdout, zxplat::k_stdout_fd);
+  let_go(g_stderr, zxplat::k_stderr_fd);
   // Files that were open when a failure or the usage screen ended the process.
   zxStream::flush_all();
   // The strings of a module that are destroyed still later.
@@ -119,7 +129,13 @@ void init_zxlib_args(int argc, const char* const* argv) {
 
 void attach_stream(zxBFile& file, const zxStr& name, zxStream& stream) {
   const zxplat::Fd descriptor = stream.descriptor();
-  if (!ZX_ASSERT_AT(zxplat::set_binary(descriptor), "zxmainf", 44)) return;
+  if (!zxplat::has_stream(descriptor)) {
+    file.open_rw("nul");
+    return;
+  }
+  const bool is_binary =
+      zxplat::files.set_mode(descriptor, zxplat::StreamMode::binary);
+  if (!ZX_ASSERT_AT(is_binary, "zxmainf", 44)) return;
   if (descriptor == zxplat::k_stderr_fd || zxplat::is_terminal(descriptor))
     stream.set_unbuffered();
   file.handle = &stream;

@@ -159,7 +159,10 @@ void all_files_of(zxQVA<zxStr>& list, zxQVA<zxStr>& out) {
 bool open_next(zxBFile& file, zxQVA<zxStr>& list) {
   file.close(no_detail);
   for (zxStr name; next_file(list, name);) {
-    if (file.open(name)) return file.set_buffer(k_read_buffer);
+    if (file.open(name)) {
+      file.set_buffer(k_read_buffer);
+      return true;
+    }
     report_not_opened(name);
   }
   return false;

@@ -53,6 +53,7 @@ inline constexpr int k_err_bad_parameter = 87;
 inline constexpr int k_err_broken_pipe = 109;
 inline constexpr int k_err_disk_full = 112;
 inline constexpr int k_err_bad_name = 123;
+inline constexpr int k_err_not_locked = 158;
 inline constexpr int k_err_exists = 183;
 
 // The number of the last call of this module that failed, or what
@@ -80,6 +81,11 @@ enum class OpenMode {
 };
 
 enum class Whence { start, current, end };
+
+// What a descriptor does to the bytes that pass it: nothing, or what the
+// system does to text.  Only Windows does anything: a line feed becomes CR
+// LF on the way out, and the other way round.
+enum class StreamMode { binary, text };
 
 enum class RenameResult {
   done,
@@ -116,6 +122,23 @@ struct FileCalls {
 
   // The file's size in bytes, or -1.
   std::int64_t (*size)(Fd fd);
+
+  // Cuts the file, or widens it by zeros; the position stays, be it behind
+  // the new end.  A descriptor that is not open for writing fails with 5, a
+  // negative size with 87.
+  bool (*set_size)(Fd fd, std::int64_t size);
+
+  // Locks and unlocks `size` bytes, at least one, which need not exist.
+  // Nobody waits: bytes that another process, or another descriptor of this
+  // one, has locked fail with 33.  What is unlocked must be exactly what was
+  // locked.  Closing the descriptor unlocks all.  Natively a lock concerns
+  // only those who ask for one, and needs a descriptor that is open for
+  // writing (otherwise 5); Windows keeps others from reading and writing.
+  bool (*lock)(Fd fd, std::int64_t start, std::int64_t size);
+  bool (*unlock)(Fd fd, std::int64_t start, std::int64_t size);
+
+  // Switches a descriptor over; see set_binary().
+  bool (*set_mode)(Fd fd, StreamMode mode);
 
   // Gives the descriptor back.  It is gone whatever the result is; false
   // means that data may not have reached the file.
@@ -288,6 +311,9 @@ void prepare_process();
 
 // Switches a descriptor to bytes without translation; false if that fails.
 bool set_binary(Fd fd);
+
+// True if there is anything behind the descriptor.
+bool has_stream(Fd fd);
 
 // True if a person sits at the other end.
 bool is_terminal(Fd fd);

@@ -192,6 +192,46 @@ std::int64_t size_of(Fd fd) {
   return status.st_size;
 }
 
+// What the system says of a descriptor that was opened for reading differs
+// from call to call.
+bool check_writable(Fd fd) {
+  const int flags = ::fcntl(fd, F_GETFL);
+  if (flags == -1) return fail();
+  return (flags & O_ACCMODE) != O_RDONLY || fail_with(k_err_denied);
+}
+
+bool set_file_size(Fd fd, std::int64_t size) {
+  if (!check_writable(fd)) return false;
+  return retry([&] { return ::ftruncate(fd, size); }) == 0 || fail();
+}
+
+// -- locks --
+
+// Of the locks that the system has, these alone belong to the open file: two
+// descriptors of one process exclude each other, and closing one of them
+// leaves the locks of the other alone.
+bool change_lock(Fd fd, short type, std::int64_t start, std::int64_t size) {
+  struct flock range = {};
+  range.l_type = type;
+  range.l_whence = SEEK_SET;
+  range.l_start = start;
+  range.l_len = size;
+  if (::fcntl(fd, F_OFD_SETLK, &range) == 0) return true;
+  const bool is_held = errno == EAGAIN || errno == EACCES;
+  return is_held ? fail_with(k_err_lock) : fail();
+}
+
+bool lock_range(Fd fd, std::int64_t start, std::int64_t size) {
+  return check_writable(fd) && change_lock(fd, F_WRLCK, start, size);
+}
+
+bool unlock_range(Fd fd, std::int64_t start, std::int64_t size) {
+  return check_writable(fd) && change_lock(fd, F_UNLCK, start, size);
+}
+
+// There is but one kind of stream here.
+bool set_stream_mode(Fd fd, StreamMode) { return set_binary(fd); }
+
 // Not repeated after a signal: the descriptor is gone by then, and its
 // number may be another file's.
 bool close_file(Fd fd) { return ::close(fd) == 0 || fail(); }
@@ -377,25 +417,23 @@ bool bind_to(Fd from, Fd to) {
 }
 
 constexpr FileCalls k_calls = {
-    open_file,
-    read_bytes,
-    write_bytes,
-    seek_to,
-    flush_file,
-    size_of,
-    close_file,
-    rename_file,
-    remove_file,
-    posix::make_folder,
-    posix::remove_folder,
-    bind_to,
-    posix::disk_space,
+    open_file,       read_bytes,         write_bytes,
+    seek_to,         flush_file,         size_of,
+    set_file_size,   lock_range,         unlock_range,
+    set_stream_mode, close_file,         rename_file,
+    remove_file,     posix::make_folder, posix::remove_folder,
+    bind_to,         posix::disk_space,
 };
 
 }  // namespace
 
 const FileCalls system_files = k_calls;
 constinit FileCalls files = k_calls;
+
+bool has_stream(Fd fd) {
+  Status status;
+  return ::fstat(fd, &status) == 0 && status.st_mode != 0;
+}
 
 NameKind kind_of(std::string_view name) { return status_of(name).kind; }
 

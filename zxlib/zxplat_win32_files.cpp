@@ -133,9 +133,12 @@ std::int64_t seek_to(Fd fd, std::int64_t offset, Whence whence) {
   return attempt.settle(position, position >= 0);
 }
 
+HANDLE handle_of(Fd fd) {
+  return reinterpret_cast<HANDLE>(::_get_osfhandle(fd));
+}
+
 bool is_on_disk(Fd fd) {
-  const auto handle = reinterpret_cast<HANDLE>(::_get_osfhandle(fd));
-  return ::GetFileType(handle) == FILE_TYPE_DISK;
+  return ::GetFileType(handle_of(fd)) == FILE_TYPE_DISK;
 }
 
 // Only a disk is waited for: behind a pipe the system would wait until the
@@ -152,6 +155,58 @@ std::int64_t size_of(Fd fd) {
   if (::_get_osfhandle(fd) < 0) return attempt.settle(std::int64_t{-1}, false);
   const std::int64_t size = is_on_disk(fd) ? ::_filelengthi64(fd) : 0;
   return attempt.settle(size, size >= 0);
+}
+
+// The system cuts and widens at the position, which is put back.
+bool cut_at(HANDLE handle, LARGE_INTEGER end) {
+  LARGE_INTEGER position;
+  if (!::SetFilePointerEx(handle, {}, &position, FILE_CURRENT) ||
+      !::SetFilePointerEx(handle, end, nullptr, FILE_BEGIN))
+    return false;
+  const bool is_cut = ::SetEndOfFile(handle) != 0;
+  const DWORD error = ::GetLastError();
+  ::SetFilePointerEx(handle, position, nullptr, FILE_BEGIN);
+  ::SetLastError(error);
+  return is_cut;
+}
+
+bool set_file_size(Fd fd, std::int64_t size) {
+  if (size < 0) return fail_with(k_err_bad_parameter);
+  const Attempt attempt;
+  LARGE_INTEGER end;
+  end.QuadPart = size;
+  return attempt.settle(::_get_osfhandle(fd) >= 0 &&
+                        cut_at(handle_of(fd), end));
+}
+
+// -- locks --
+
+DWORD low_half(std::int64_t number) { return static_cast<DWORD>(number); }
+DWORD high_half(std::int64_t number) {
+  return static_cast<DWORD>(number >> 32);
+}
+
+bool lock_range(Fd fd, std::int64_t start, std::int64_t size) {
+  const Attempt attempt;
+  return attempt.settle(::_get_osfhandle(fd) >= 0 &&
+                        ::LockFile(handle_of(fd), low_half(start),
+                                   high_half(start), low_half(size),
+                                   high_half(size)));
+}
+
+bool unlock_range(Fd fd, std::int64_t start, std::int64_t size) {
+  const Attempt attempt;
+  return attempt.settle(::_get_osfhandle(fd) >= 0 &&
+                        ::UnlockFile(handle_of(fd), low_half(start),
+                                     high_half(start), low_half(size),
+                                     high_half(size)));
+}
+
+bool set_stream_mode(Fd fd, StreamMode mode) {
+  if (mode == StreamMode::binary) return set_binary(fd);
+  const Attempt attempt;
+  return attempt.settle(::_get_osfhandle(fd) >= 0 &&
+                        ::_setmode(fd, _O_TEXT) != -1);
 }
 
 bool close_file(Fd fd) {
@@ -305,25 +360,27 @@ bool bind_to(Fd from, Fd to) {
 }
 
 constexpr FileCalls k_calls = {
-    open_file,
-    read_bytes,
-    write_bytes,
-    seek_to,
-    flush_file,
-    size_of,
-    close_file,
-    rename_file,
-    remove_file,
-    win32::make_folder,
-    win32::remove_folder,
-    bind_to,
-    win32::disk_space,
+    open_file,       read_bytes,         write_bytes,
+    seek_to,         flush_file,         size_of,
+    set_file_size,   lock_range,         unlock_range,
+    set_stream_mode, close_file,         rename_file,
+    remove_file,     win32::make_folder, win32::remove_folder,
+    bind_to,         win32::disk_space,
 };
 
 }  // namespace
 
 const FileCalls system_files = k_calls;
 constinit FileCalls files = k_calls;
+
+bool has_stream(Fd fd) {
+  const Attempt attempt;
+  struct _stat64 status;
+  const bool is_there = ::_get_osfhandle(fd) >= 0 &&
+                        ::_fstat64(fd, &status) == 0 && status.st_mode != 0;
+  attempt.restore();
+  return is_there;
+}
 
 NameKind kind_of(std::string_view name) { return status_of(name).kind; }
 

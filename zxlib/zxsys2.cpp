@@ -201,8 +201,8 @@ void delfiles(const zxStr& pattern) {
 // ---- directories
 
 bool try_createdir(const zxStr& name) {
-  return !name.is_empty() &&
-         zxplat::files.make_folder(without_final_separators(name).view());
+  const zxStr folder = without_final_separators(name);
+  return zxplat::files.make_folder(folder.view());
 }
 
 void createdir(const zxStr& name) {

@@ -10,8 +10,9 @@ namespace kit {
 namespace {
 
 constexpr std::array<const char*, k_calls> k_names = {
-    "open", "read",  "write",  "flush", "seek",
-    "size", "close", "rename", "remove"};
+    "open",        "read",          "write",  "flush",     "seek",   "size",
+    "set_size",    "lock",          "unlock", "close",     "rename", "remove",
+    "make_folder", "remove_folder", "bind",   "disk_space"};
 
 struct Plan {
   int calls = 0;
@@ -64,6 +65,22 @@ const zxplat::FileCalls k_failing = {
         [](zxplat::Fd fd) {
           return fails(Call::size) ? std::int64_t{-1} : real().size(fd);
         },
+    .set_size =
+        [](zxplat::Fd fd, std::int64_t size) {
+          return !fails(Call::set_size) && real().set_size(fd, size);
+        },
+    .lock =
+        [](zxplat::Fd fd, std::int64_t start, std::int64_t size) {
+          return !fails(Call::lock) && real().lock(fd, start, size);
+        },
+    .unlock =
+        [](zxplat::Fd fd, std::int64_t start, std::int64_t size) {
+          return !fails(Call::unlock) && real().unlock(fd, start, size);
+        },
+    .set_mode =
+        [](zxplat::Fd fd, zxplat::StreamMode mode) {
+          return real().set_mode(fd, mode);
+        },
     .close =
         [](zxplat::Fd fd) {
           const bool closed = real().close(fd);
@@ -79,6 +96,22 @@ const zxplat::FileCalls k_failing = {
     .remove =
         [](std::string_view name) {
           return !fails(Call::remove) && real().remove(name);
+        },
+    .make_folder =
+        [](std::string_view name) {
+          return !fails(Call::make_folder) && real().make_folder(name);
+        },
+    .remove_folder =
+        [](std::string_view name) {
+          return !fails(Call::remove_folder) && real().remove_folder(name);
+        },
+    .bind =
+        [](zxplat::Fd from, zxplat::Fd to) {
+          return !fails(Call::bind) && real().bind(from, to);
+        },
+    .disk_space =
+        [](char letter, zxplat::DiskSpace& space) {
+          return !fails(Call::disk_space) && real().disk_space(letter, space);
         },
 };
 

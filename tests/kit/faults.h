@@ -9,8 +9,25 @@
 namespace kit {
 
 // The kinds of calls of zxplat::FileCalls.
-enum class Call { open, read, write, flush, seek, size, close, rename, remove };
-inline constexpr int k_calls = 9;
+enum class Call {
+  open,
+  read,
+  write,
+  flush,
+  seek,
+  size,
+  set_size,
+  lock,
+  unlock,
+  close,
+  rename,
+  remove,
+  make_folder,
+  remove_folder,
+  bind,
+  disk_space
+};
+inline constexpr int k_calls = 16;
 const char* name_of(Call call);
 
 // While one lives, calls are counted, and those that it was told to fail do.

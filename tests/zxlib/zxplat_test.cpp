@@ -190,7 +190,7 @@ TEST(zxplat, calls_that_succeed_leave_the_last_error_alone) {
   files.close(files.open("nul", OpenMode::create));
   EXPECT_EQ(last_error(), k_untouched) << "create again";
   files.close(files.open(other, OpenMode::create_new));
-  zxplat::copy_attributes(name, other);
+  zxplat::copy_time(name, other);
   EXPECT_EQ(last_error(), k_untouched) << "attributes";
   files.remove(other);
   files.rename(name, other);
@@ -631,8 +631,8 @@ void expect_refused_everywhere(std::string_view name, int number) {
   expect_false(zxplat::name_taken(name), "name_taken");
   expect_false(zxplat::same_file(good, name), "same_file");
   expect_false(zxplat::same_file(name, good), "same_file");
-  expect_false(zxplat::copy_attributes(good, name), "copy_attributes");
-  expect_false(zxplat::copy_attributes(name, good), "copy_attributes");
+  expect_false(zxplat::copy_time(good, name), "copy_attributes");
+  expect_false(zxplat::copy_time(name, good), "copy_attributes");
   EXPECT_TRUE(zxplat::on_one_device(name, good));
   EXPECT_TRUE(zxplat::on_one_device(good, name));
   EXPECT_EQ(last_error(), k_untouched);
@@ -1139,7 +1139,7 @@ TEST(zxplat, attributes_are_the_time_and_the_permissions) {
   fs::last_write_time(from,
                       fs::last_write_time(from) - std::chrono::hours(1000));
   make_read_only(from);
-  EXPECT_TRUE(zxplat::copy_attributes(dir.file("FROM"), dir.file("TO")))
+  EXPECT_TRUE(zxplat::copy_time(dir.file("FROM"), dir.file("TO")))
       << last_error();
   EXPECT_EQ(fs::last_write_time(to), fs::last_write_time(from));
   EXPECT_EQ(fs::status(to).permissions(), fs::status(from).permissions());
@@ -1151,7 +1151,7 @@ TEST(zxplat, attributes_replace_those_of_a_file_without_write_permission) {
   kit::write_file(dir.file("a"), "");
   kit::write_file(dir.file("b"), "");
   make_read_only(dir.file("b"));
-  EXPECT_TRUE(zxplat::copy_attributes(dir.file("a"), dir.file("b")))
+  EXPECT_TRUE(zxplat::copy_time(dir.file("a"), dir.file("b")))
       << last_error();
   EXPECT_TRUE(files.remove(dir.file("b"))) << last_error();
 }
@@ -1159,9 +1159,9 @@ TEST(zxplat, attributes_replace_those_of_a_file_without_write_permission) {
 TEST(zxplat, attributes_need_two_files) {
   const TempDir dir;
   kit::write_file(dir.file("a"), "");
-  EXPECT_FALSE(zxplat::copy_attributes(dir.file("a"), dir.file("b")));
+  EXPECT_FALSE(zxplat::copy_time(dir.file("a"), dir.file("b")));
   EXPECT_EQ(last_error(), zxplat::k_err_not_found);
-  EXPECT_FALSE(zxplat::copy_attributes(dir.file("no\\b"), dir.file("a")));
+  EXPECT_FALSE(zxplat::copy_time(dir.file("no\\b"), dir.file("a")));
   EXPECT_EQ(last_error(), zxplat::k_err_path_not_found);
 }
 
