@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "hvldec.h"
+#include "kit/pages.h"
 #include "kit/process.h"
 #include "kit/tempdir.h"
 #include "vtxtext.h"
@@ -20,6 +21,11 @@ namespace {
 
 namespace fs = std::filesystem;
 
+using kit::indented_in;
+using kit::lines_of;
+using kit::rows_in;
+using kit::source;
+
 std::string variable(const char* name) {
   const char* const value = std::getenv(name);
   if (value == nullptr) ADD_FAILURE() << name << " is not set";
@@ -28,10 +34,6 @@ std::string variable(const char* name) {
 
 std::string program(const std::string& name) {
   return variable("ZX_BIN_DIR") + "/" + name;
-}
-
-std::string source(const std::string& name) {
-  return variable("ZX_SOURCE_DIR") + "/" + name;
 }
 
 kit::ProcessResult run(std::vector<std::string> command,
@@ -188,13 +190,6 @@ TEST(mkvtx_e2e, a_move_that_fails_leaves_no_temporary_file) {
 
 // ---- the examples of the pages
 
-std::vector<std::string> lines_of(const std::string& file) {
-  std::istringstream in(kit::read_file(source(file)));
-  std::vector<std::string> lines;
-  for (std::string line; std::getline(in, line);) lines.push_back(line);
-  return lines;
-}
-
 // The blocks that start with ```vtx.
 std::vector<std::string> examples_in(const std::string& file) {
   std::vector<std::string> blocks;
@@ -205,22 +200,6 @@ std::vector<std::string> examples_in(const std::string& file) {
     inside = line == "```vtx" || (inside && line != "```");
   }
   return blocks;
-}
-
-// The cells of the rows of a page's tables, without back quotes.
-std::vector<std::vector<std::string>> rows_in(const std::string& file) {
-  std::vector<std::vector<std::string>> rows;
-  for (const std::string& line : lines_of(file)) {
-    if (!line.starts_with("| ")) continue;
-    std::vector<std::string> cells;
-    std::istringstream in(line.substr(1));
-    for (std::string cell; std::getline(in, cell, '|');) {
-      std::erase(cell, '`');
-      cells.emplace_back(trimmed(cell));
-    }
-    rows.push_back(cells);
-  }
-  return rows;
 }
 
 std::string text_of(HvlDecimal number) {
@@ -280,15 +259,6 @@ TEST(mkvtx_e2e, the_words_of_the_format_page_are_right) {
     ++rows;
   }
   EXPECT_GE(rows, 8);
-}
-
-// The indented lines of a page, as they would stand in a file or on a screen.
-std::string indented_in(const std::string& file) {
-  constexpr std::size_t k_indent = 4;
-  std::string text;
-  for (const std::string& line : lines_of(file))
-    if (line.starts_with("    ")) text += line.substr(k_indent) + "\n";
-  return text;
 }
 
 TEST(mkvtx_e2e, the_examples_of_the_failure_page_are_right) {
