@@ -223,7 +223,8 @@ bool is_terminal(Fd fd);
 
 // Moments are seconds since 1970-01-01 00:00 UTC, as process.clock() counts
 // them.  The zone is that of the environment variable TZ, as in "EST5EDT",
-// else the system's; it is looked at anew with each call.
+// else the system's.  A program that changes it as it runs may see the new
+// zone's offset with the daylight saving of the old one.
 
 // The last moment that has fields: the end of the year 3000, UTC.
 inline constexpr std::int64_t k_last_moment = 32'535'215'999;

@@ -213,7 +213,6 @@ zxStr zxTime::to_text() const {
   if (!has_fields()) return {};
   const std::int32_t seconds = time_of_day();
   zxStr text = date().to_text_full();
-  text.append(' ');
   append_part(text, ' ', seconds / 3600);
   append_part(text, ':', seconds / 60 % 60);
   append_part(text, ':', seconds % 60);
