@@ -27,8 +27,8 @@ constexpr bool is_between(std::int32_t low, std::int32_t value,
   return value >= low && value <= high;
 }
 
-// The forms have no letter that depends on the locale but "%b", whose locale
-// is the C library's first one: nothing here changes it.
+// Of the forms' letters "%b" alone goes by the locale.  Nothing here changes
+// that of the C library, whose first one is plain English.
 zxStr text_of_form(const std::tm& fields, std::int32_t index) {
   if (!ZX_ASSERT(is_between(0, index, std::ssize(k_forms) - 1))) return {};
   char text[k_form_room];
