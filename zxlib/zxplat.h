@@ -26,6 +26,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <ctime>
 #include <span>
 #include <string_view>
 
@@ -317,6 +318,29 @@ bool has_stream(Fd fd);
 
 // True if a person sits at the other end.
 bool is_terminal(Fd fd);
+
+// ----------------------------------------------------------- local time --
+
+// Moments are seconds since 1970-01-01 00:00 UTC, as process.clock() counts
+// them.  The zone is that of the environment variable TZ, as in "EST5EDT",
+// else the system's.  A program that changes it as it runs may see the new
+// zone's offset with the daylight saving of the old one.
+
+// The last moment that has fields: the end of the year 3000, UTC.
+inline constexpr std::int64_t k_last_moment = 32'535'215'999;
+
+// What the local clock shows at a moment, daylight saving included.  False
+// (87), and `fields` unchanged, outside of 0 to k_last_moment.
+bool local_time(std::int64_t moment, std::tm& fields);
+
+// The moment at which a clock that knows no daylight saving shows year,
+// month, day, hour, minute and second of `fields`; the other fields are not
+// looked at, and values beyond their range are carried over.  -1 (87)
+// outside of 0 to k_last_moment.
+std::int64_t moment_of_standard_time(const std::tm& fields);
+
+// The seconds that such a clock is behind UTC; negative east of it.
+std::int32_t standard_zone_offset();
 
 // --------------------------------------------------------------- faults --
 

@@ -1,0 +1,216 @@
+// zxplat_time_test.cpp - the local clock of the platform line: the moments
+// that it knows, and, in processes of their own, zones east and west, with
+// and without daylight saving.
+// Tests zxlib/zxplat.h, zxplat_posix_time.cpp and zxplat_win32_time.cpp.
+
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <climits>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <ctime>
+#include <string>
+#include <vector>
+
+#include "kit/cases.h"
+#include "zxplat.h"
+
+namespace {
+
+using zxplat::k_last_moment;
+using zxplat::last_error;
+using zxplat::local_time;
+using zxplat::moment_of_standard_time;
+using zxplat::set_last_error;
+using zxplat::standard_zone_offset;
+
+constexpr int k_untouched = 4711;
+constexpr std::int64_t k_day = 86400;
+
+std::string text_of(const std::tm& fields) {
+  char text[100];
+  std::snprintf(text, sizeof text, "%d-%d-%d %d:%d:%d", fields.tm_year + 1900,
+                fields.tm_mon + 1, fields.tm_mday, fields.tm_hour,
+                fields.tm_min, fields.tm_sec);
+  return text;
+}
+
+// The same of a clock that is some seconds ahead of UTC.
+std::string text_at(std::int64_t moment, std::int64_t ahead) {
+  const std::chrono::sys_seconds time{std::chrono::seconds(moment + ahead)};
+  const auto day = std::chrono::floor<std::chrono::days>(time);
+  const std::chrono::year_month_day date(day);
+  const std::chrono::hh_mm_ss clock(time - day);
+  std::tm fields = {};
+  fields.tm_year = static_cast<int>(date.year()) - 1900;
+  fields.tm_mon = static_cast<int>(static_cast<unsigned>(date.month())) - 1;
+  fields.tm_mday = static_cast<int>(static_cast<unsigned>(date.day()));
+  fields.tm_hour = static_cast<int>(clock.hours().count());
+  fields.tm_min = static_cast<int>(clock.minutes().count());
+  fields.tm_sec = static_cast<int>(clock.seconds().count());
+  return text_of(fields);
+}
+
+std::tm fields_of(int year, int month, int day, int hour, int minute,
+                  int second) {
+  std::tm fields = {};
+  fields.tm_year = year - 1900;
+  fields.tm_mon = month - 1;
+  fields.tm_mday = day;
+  fields.tm_hour = hour;
+  fields.tm_min = minute;
+  fields.tm_sec = second;
+  return fields;
+}
+
+// ---- any zone
+
+TEST(zxplat_time, a_moment_outside_of_its_range_has_no_fields) {
+  for (const std::int64_t moment :
+       {std::int64_t{-1}, std::int64_t{INT32_MIN}, std::int64_t{INT64_MIN},
+        k_last_moment + 1, std::int64_t{INT64_MAX}}) {
+    std::tm fields;
+    std::memset(&fields, 0x55, sizeof fields);
+    std::tm before;
+    std::memset(&before, 0x55, sizeof before);
+    set_last_error(0);
+    EXPECT_FALSE(local_time(moment, fields)) << moment;
+    EXPECT_EQ(last_error(), zxplat::k_err_bad_parameter);
+    EXPECT_EQ(std::memcmp(&fields, &before, sizeof fields), 0);
+  }
+}
+
+TEST(zxplat_time, the_first_and_the_last_moment_have_fields) {
+  std::tm fields = {};
+  set_last_error(k_untouched);
+  EXPECT_TRUE(local_time(0, fields));
+  EXPECT_TRUE(fields.tm_year == 70 || fields.tm_year == 69);
+  EXPECT_TRUE(local_time(k_last_moment, fields));
+  EXPECT_TRUE(fields.tm_year == 1100 || fields.tm_year == 1101);
+  EXPECT_GE(moment_of_standard_time(fields_of(2009, 2, 25, 12, 0, 0)), 0);
+  standard_zone_offset();
+  EXPECT_EQ(last_error(), k_untouched);
+}
+
+TEST(zxplat_time, fields_outside_of_the_range_are_no_moment) {
+  for (const std::tm& fields :
+       {fields_of(1969, 12, 30, 0, 0, 0), fields_of(1900, 1, 1, 0, 0, 0),
+        fields_of(3001, 1, 3, 0, 0, 0), fields_of(2000, 1, 1, 0, INT_MAX, 0),
+        fields_of(2000, 1, 1, 0, INT_MIN, 0),
+        fields_of(2000, 1, 1, 0, INT_MIN / 2, 0)}) {
+    set_last_error(0);
+    EXPECT_EQ(moment_of_standard_time(fields), -1) << text_of(fields);
+    EXPECT_EQ(last_error(), zxplat::k_err_bad_parameter);
+  }
+}
+
+TEST(zxplat_time, standard_time_is_behind_by_the_offset) {
+  // 2009-01-01 12:00 and 2009-07-01 12:00 of a clock at UTC.
+  EXPECT_EQ(moment_of_standard_time(fields_of(2009, 1, 1, 12, 0, 0)),
+            1'230'811'200 + standard_zone_offset());
+  EXPECT_EQ(moment_of_standard_time(fields_of(2009, 7, 1, 12, 0, 0)),
+            1'246'449'600 + standard_zone_offset());
+}
+
+TEST(zxplat_time, what_is_no_number_of_the_clock_is_not_looked_at) {
+  std::tm fields = fields_of(2009, 7, 1, 12, 0, 0);
+  fields.tm_isdst = 1;
+  fields.tm_wday = 55;
+  fields.tm_yday = -55;
+  EXPECT_EQ(moment_of_standard_time(fields),
+            1'246'449'600 + standard_zone_offset());
+}
+
+// ---- zones, in processes of their own
+
+struct Zone {
+  const char* name;
+  std::int64_t behind;  // seconds of its standard time behind UTC
+  bool saves_daylight;
+};
+
+constexpr Zone k_zones[] = {
+    {"UTC0", 0, false},           {"EST5EDT", 18'000, true},
+    {"IST-2IDT", -7200, true},    {"NPT-5:45", -20'700, false},
+    {"XXX-14", -50'400, false},   {"YYY12", 43'200, false},
+    {"NST3:30NDT", 12'600, true},
+};
+
+// Winters all over the calendar, and one summer, in which all zones that
+// save daylight do so, whosever rules are taken.
+constexpr std::int64_t k_winters[] = {1, k_day, 946'684'800, 1'230'768'000,
+                                      2'114'380'800};
+constexpr std::int64_t k_summer = 1'246'449'600;  // 2009-07-01 12:00 UTC
+
+void say(const std::string& line) {
+  zxplat::write_all(zxplat::k_stdout_fd, line + "\n");
+}
+
+void say_time(std::int64_t moment) {
+  std::tm fields = {};
+  say(local_time(moment, fields) ? text_of(fields) : "none");
+}
+
+void say_moment(const std::tm& fields) {
+  say(std::to_string(moment_of_standard_time(fields)));
+}
+
+ZX_CASE(zxplat_time_in_zone) {
+  zxplat::set_binary(zxplat::k_stdout_fd);
+  say(std::to_string(standard_zone_offset()));
+  for (const std::int64_t winter : k_winters) say_time(winter);
+  say_time(k_summer);
+  say_moment(fields_of(1971, 1, 1, 0, 0, 0));
+  say_moment(fields_of(2009, 7, 1, 12, 0, 0));
+  // In the hours that the change of clocks leaves out, and repeats.
+  say_moment(fields_of(2009, 3, 8, 2, 30, 0));
+  say_moment(fields_of(2009, 11, 1, 1, 30, 0));
+  say_moment(fields_of(2009, 1, 31, 23, 75, 0));
+  say_moment(fields_of(2009, 1, 1, 0, -1, 0));
+  // The rules of later years must not change the offset.
+  std::tm fields = {};
+  local_time(2'200'000'000, fields);
+  say(std::to_string(standard_zone_offset()));
+  return 0;
+}
+
+std::vector<std::string> lines_of(const std::string& text) {
+  std::vector<std::string> lines;
+  std::size_t start = 0;
+  for (std::size_t end; (end = text.find('\n', start)) != std::string::npos;
+       start = end + 1)
+    lines.push_back(text.substr(start, end - start));
+  return lines;
+}
+
+std::vector<std::string> expected_in(const Zone& zone) {
+  std::vector<std::string> lines = {std::to_string(zone.behind)};
+  for (const std::int64_t winter : k_winters)
+    lines.push_back(text_at(winter, -zone.behind));
+  lines.push_back(
+      text_at(k_summer, -zone.behind + (zone.saves_daylight ? 3600 : 0)));
+  for (const std::int64_t clock :
+       {std::int64_t{31'536'000}, k_summer, std::int64_t{1'236'479'400},
+        std::int64_t{1'257'039'000}, std::int64_t{1'233'447'300},
+        std::int64_t{1'230'767'940}})
+    lines.push_back(std::to_string(clock + zone.behind));
+  lines.push_back(std::to_string(zone.behind));
+  return lines;
+}
+
+TEST(zxplat_time, the_zone_is_that_of_the_environment) {
+  for (const Zone& zone : k_zones) {
+    SCOPED_TRACE(zone.name);
+    kit::ProcessOptions options;
+    options.variables = {{"TZ", zone.name}};
+    const kit::ProcessResult result =
+        kit::run_case("zxplat_time_in_zone", {}, options);
+    EXPECT_EQ(result.exit_code, 0);
+    EXPECT_EQ(lines_of(result.out), expected_in(zone));
+  }
+}
+
+}  // namespace

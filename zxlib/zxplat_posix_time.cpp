@@ -1,0 +1,44 @@
+// zxplat_posix_time.cpp - the local clock, for POSIX systems.
+// Tested by tests/zxlib/zxplat_time_test.cpp.
+
+#include <time.h>
+
+#include "zxplat_posix_impl.h"
+
+namespace zxplat {
+namespace {
+
+bool has_fields(std::int64_t moment) {
+  return moment >= 0 && moment <= k_last_moment;
+}
+
+}  // namespace
+
+bool local_time(std::int64_t moment, std::tm& fields) {
+  if (!has_fields(moment)) return posix::fail_with(k_err_bad_parameter);
+  const time_t time = moment;
+  ::tzset();
+  std::tm found;
+  if (::localtime_r(&time, &found) == nullptr)
+    return posix::fail_with(k_err_bad_parameter);
+  fields = found;
+  return true;
+}
+
+std::int64_t moment_of_standard_time(const std::tm& fields) {
+  std::tm clock = fields;
+  clock.tm_isdst = 0;
+  const std::int64_t moment = ::mktime(&clock);
+  if (has_fields(moment)) return moment;
+  posix::fail_with(k_err_bad_parameter);
+  return -1;
+}
+
+// Breaking a moment down may change the variable to the offset of another
+// rule; tzset() puts it right.
+std::int32_t standard_zone_offset() {
+  ::tzset();
+  return static_cast<std::int32_t>(::timezone);
+}
+
+}  // namespace zxplat

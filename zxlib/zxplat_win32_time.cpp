@@ -1,0 +1,50 @@
+// zxplat_win32_time.cpp - the local clock, for Windows.
+// Tested by tests/zxlib/zxplat_time_test.cpp.
+
+#include <time.h>
+
+#include "zxplat_win32_impl.h"
+
+namespace zxplat {
+namespace {
+
+using win32::Attempt;
+
+bool has_fields(std::int64_t moment) {
+  return moment >= 0 && moment <= k_last_moment;
+}
+
+}  // namespace
+
+bool local_time(std::int64_t moment, std::tm& fields) {
+  if (!has_fields(moment)) return win32::fail_with(k_err_bad_parameter);
+  const Attempt attempt;
+  const __time64_t time = moment;
+  ::_tzset();
+  const std::tm* const found = ::_localtime64(&time);
+  attempt.restore();
+  if (found == nullptr) return win32::fail_with(k_err_bad_parameter);
+  fields = *found;
+  return true;
+}
+
+std::int64_t moment_of_standard_time(const std::tm& fields) {
+  const Attempt attempt;
+  std::tm clock = fields;
+  clock.tm_isdst = 0;
+  ::_tzset();
+  const std::int64_t moment = ::_mktime64(&clock);
+  attempt.restore();
+  if (has_fields(moment)) return moment;
+  win32::fail_with(k_err_bad_parameter);
+  return -1;
+}
+
+std::int32_t standard_zone_offset() {
+  const Attempt attempt;
+  ::_tzset();
+  attempt.restore();
+  return static_cast<std::int32_t>(_timezone);
+}
+
+}  // namespace zxplat
