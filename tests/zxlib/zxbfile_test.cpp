@@ -1722,32 +1722,51 @@ TEST_F(zxbfile, objects_of_one_process_exclude_each_other) {
   EXPECT_TRUE(a.lock(0, 100));
 }
 
-TEST_F(zxbfile, a_lock_moves_to_its_place_and_sees_what_is_there) {
+TEST_F(zxbfile, a_lock_flushes_and_moves_to_its_place) {
   zxBFile file;
-  zxBFile other;
   ASSERT_TRUE(file.open_rw(name));
   EXPECT_EQ(read(file, 3), "012");
   file.puts("x");
+  const Faults calls;
   EXPECT_TRUE(file.lock(5, 1));
-  EXPECT_EQ(bytes(), "012x456789");  // it flushed
+  EXPECT_EQ(calls.count(Call::write), 1);
   EXPECT_EQ(file.tell(), 5);
   EXPECT_EQ(file.lines, 1);
-  EXPECT_EQ(read(file, 2), "56");
-  ASSERT_TRUE(other.open_rw(name));
-  write(other, "ABCDE");
-  other.close(no_detail);
-  EXPECT_TRUE(file.lock(3, 2));
-  EXPECT_EQ(read(file, 3), "DE5");
+  EXPECT_EQ(read(file, 1), "5");
   write(file, "y");
-  file.unlock(3, 2);
-  EXPECT_EQ(bytes(), "ABCDE5y789");
-  EXPECT_EQ(file.tell(), 3);
+  file.unlock(5, 1);
+  EXPECT_EQ(calls.count(Call::write), 2);
+  EXPECT_EQ(file.tell(), 5);
   EXPECT_EQ(file.lines, 1);
+  EXPECT_EQ(bytes(), "012x45y789");
   EXPECT_TRUE(file.lock(0, 1));
   EXPECT_EQ(file.lines, 0);
   file.puts("A");
   file.unlock(0, 1);
   EXPECT_EQ(file.lines, 0);
+}
+
+// All of the file is in the buffer each time when another writes to it.
+TEST_F(zxbfile, behind_a_lock_and_an_unlock_nothing_stale_is_read) {
+  const auto overwrite = [&](std::string_view text) {
+    zxBFile other;
+    ASSERT_TRUE(other.open_rw(name));
+    write(other, text);
+    other.close(no_detail);
+  };
+  zxBFile file;
+  ASSERT_TRUE(file.open_rw(name));
+  EXPECT_EQ(read(file, 10), k_bytes);
+  overwrite("abcdefghij");
+  file.seek(3);
+  EXPECT_EQ(read(file, 1), "3");
+  EXPECT_TRUE(file.lock(10, 1));
+  file.seek(0);
+  EXPECT_EQ(read(file, 10), "abcdefghij");
+  overwrite("ABCDEFGHIJ");
+  file.unlock(10, 1);
+  file.seek(0);
+  EXPECT_EQ(read(file, 10), "ABCDEFGHIJ");
 }
 
 TEST_F(zxbfile, no_bytes_are_locked_without_a_call) {

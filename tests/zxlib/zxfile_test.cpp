@@ -1451,6 +1451,7 @@ TEST(zxfile, locks_end_with_the_stream_and_with_closing_all) {
     Stream third(file.name, OpenMode::read_write);
     EXPECT_TRUE(third->lock(0, 2));
     EXPECT_FALSE(second->unlock(0, 2));
+    EXPECT_EQ(zxplat::last_error(), zxplat::k_err_not_locked);
     EXPECT_FALSE(second->lock(5, 1));
   }
   EXPECT_EQ(Blocks::in_use, 0);
