@@ -27,18 +27,11 @@ std::int32_t room_for(std::int32_t length, std::int32_t present) {
 
 // The part of the bytes up to a line feed and with it; all without one.
 std::string_view first_line(std::string_view bytes) {
+  if (bytes.empty()) return bytes;
   const void* const feed = std::memchr(bytes.data(), '\n', bytes.size());
   if (feed == nullptr) return bytes;
   const auto length = static_cast<const char*>(feed) - bytes.data() + 1;
   return bytes.substr(0, static_cast<std::size_t>(length));
-}
-
-// Empties the text, but keeps a block that is its own.
-void start_line(zxStr& text) {
-  if (is_shared(text))
-    text.clear();
-  else
-    text.set_length(0);
 }
 
 // Adds to a text that no other shares; false if the line is too long.
@@ -50,6 +43,26 @@ bool add_piece(zxStr& text, std::string_view piece) {
   if (sum >= text.capacity()) text.reserve(room_for(sum, text.capacity()));
   text.append(piece.data(), zx_count(piece.size()));
   return true;
+}
+
+// Empties the text, but keeps a block that is its own.
+void start_line(zxStr& text) {
+  if (is_shared(text))
+    text.clear();
+  else
+    text.set_length(0);
+}
+
+// Makes the piece the whole text; false if it is too long.  Most lines are
+// one piece, for which there is room already.
+bool start_with(zxStr& text, std::string_view piece) {
+  const bool is_own = text.representation()->refs == 1;
+  if (is_own && piece.size() < zx_size(text.capacity())) {
+    text.build(piece.data(), zx_count(piece.size()));
+    return true;
+  }
+  start_line(text);
+  return add_piece(text, piece);
 }
 
 }  // namespace
@@ -73,18 +86,22 @@ bool zxBFile::gets(zxStr& text) {
 
 // False if no byte came.
 bool zxBFile::read_line(zxStr& text) {
-  start_line(text);
-  for (;;) {
-    const std::string_view line = first_line(handle->unread());
-    if (line.empty()) return !text.is_empty();
-    if (!add_piece(text, line)) {
-      text.clear();
-      bail_code(2005, name);
-      return false;
-    }
-    handle->skip(line.size());
-    if (line.back() == '\n') return true;
+  std::string_view piece = first_line(handle->unread());
+  if (piece.empty()) {
+    start_line(text);
+    return false;
   }
+  bool fits = start_with(text, piece);
+  while (fits) {
+    handle->skip(piece.size());
+    if (piece.back() == '\n') return true;
+    piece = first_line(handle->unread());
+    if (piece.empty()) return true;
+    fits = add_piece(text, piece);
+  }
+  text.clear();
+  bail_code(2005, name);
+  return false;
 }
 
 void zxBFile::puts(const zxStr& text) {

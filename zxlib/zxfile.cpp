@@ -2,6 +2,7 @@
 // Tests: tests/zxlib/zxfile_test.cpp.
 #include "zxfile.h"
 
+#include <algorithm>
 #include <cstring>
 #include <new>
 
@@ -113,7 +114,7 @@ bool zxStream::set_buffer(std::size_t size) {
     if (buffer != nullptr)
       buffer = static_cast<char*>(zx_realloc(buffer, capacity));
   }
-  first_read_ahead = size;
+  first_read_ahead = std::max(size, k_first_read_ahead);
   unbuffered = false;
   set_room_end();
   return true;

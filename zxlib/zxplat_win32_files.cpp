@@ -157,10 +157,18 @@ std::int64_t size_of(Fd fd) {
   return attempt.settle(size, size >= 0);
 }
 
+// Writing nothing asks for the right to write, whose lack some systems tell
+// in other numbers when it comes to cutting.
+bool may_write(HANDLE handle) {
+  DWORD written;
+  return ::WriteFile(handle, "", 0, &written, nullptr) != 0;
+}
+
 // The system cuts and widens at the position, which is put back.
 bool cut_at(HANDLE handle, LARGE_INTEGER end) {
   LARGE_INTEGER position;
-  if (!::SetFilePointerEx(handle, {}, &position, FILE_CURRENT) ||
+  if (!may_write(handle) ||
+      !::SetFilePointerEx(handle, {}, &position, FILE_CURRENT) ||
       !::SetFilePointerEx(handle, end, nullptr, FILE_BEGIN))
     return false;
   const bool is_cut = ::SetEndOfFile(handle) != 0;

@@ -11,6 +11,7 @@
 #include <random>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "kit/cases.h"
@@ -551,7 +552,7 @@ class Duel {
   }
 
   void step() {
-    switch (random.below(8)) {
+    switch (random.below(14)) {
       case 0:
       case 1:
         return read();
@@ -564,6 +565,17 @@ class Duel {
         return seek_nearby();
       case 6:
         return seek_from_end();
+      case 7:
+        return get();
+      case 8:
+        return put();
+      case 9:
+      case 10:
+        return view();
+      case 11:
+        return set_size();
+      case 12:
+        return rearrange();
       default:
         return look();
     }
@@ -584,6 +596,49 @@ class Duel {
     const std::string text = random.text(random.size());
     ASSERT_TRUE(stream.write(text));
     model.write(text);
+  }
+
+  void get() {
+    for (std::size_t left = random.below(300); left > 0; --left) {
+      const std::string byte = model.read(1);
+      const int expected =
+          byte.empty() ? -1 : static_cast<unsigned char>(byte[0]);
+      ASSERT_EQ(stream->get(), expected);
+      ASSERT_EQ(stream->eof(), model.met_end);
+    }
+  }
+
+  void put() {
+    const std::string text = random.text(random.size());
+    for (const char byte : text) ASSERT_TRUE(stream->put(byte));
+    model.write(text);
+  }
+
+  // Takes a part of what is to be seen of the buffer.
+  void view() {
+    const std::string_view bytes = stream->unread();
+    const std::size_t count =
+        bytes.empty() ? 1 : 1 + random.below(bytes.size());
+    ASSERT_TRUE(bytes.substr(0, count) == model.read(count));
+    stream->skip(bytes.empty() ? 0 : count);
+    ASSERT_EQ(stream->eof(), model.met_end);
+  }
+
+  void set_size() {
+    const std::size_t size = random.below(2 * model.bytes.size() + 100);
+    model.bytes.resize(std::min(size, std::size_t{200'000}));
+    const auto wanted = static_cast<std::int64_t>(model.bytes.size());
+    ASSERT_TRUE(stream->set_size(wanted));
+    ASSERT_EQ(stream->size(), wanted);
+  }
+
+  // What changes nothing that can be seen.
+  void rearrange() {
+    if (random.below(8) == 0) {
+      ASSERT_TRUE(stream->set_buffer(1 + random.below(70'000)));
+    } else {
+      ASSERT_TRUE(stream->drop_unread());
+    }
   }
 
   // Up to a little behind the end.
@@ -1017,6 +1072,389 @@ TEST(zxfile, a_file_above_a_stream_closes_without_failing) {
     EXPECT_FALSE(failure.failed) << failure.screen;
     EXPECT_EQ(written.bytes(), "text");
   }
+}
+
+// ---- bytes and pieces of the buffer
+
+TEST(zxfile, bytes_are_got_one_by_one_as_numbers_from_0_to_255) {
+  const TestFile file(std::string("\0\x7F\x80\xFF", 4));
+  const Stream stream(file.name, OpenMode::read);
+  for (const int byte : {0, 127, 128, 255}) EXPECT_EQ(stream->get(), byte);
+  EXPECT_FALSE(stream->eof());
+  EXPECT_EQ(stream->get(), -1);
+  EXPECT_TRUE(stream->eof());
+  EXPECT_FALSE(stream->error());
+  EXPECT_EQ(stream->tell(), 4);
+}
+
+TEST(zxfile, bytes_cost_no_call_of_the_system_each) {
+  const TestFile file("");
+  const Faults calls;
+  Stream writer(file.name, OpenMode::create);
+  for (int i = 0; i < 65'535; ++i) ASSERT_TRUE(writer->put('x'));
+  EXPECT_EQ(calls.count(Call::write), 0);
+  EXPECT_TRUE(writer->put('y'));
+  EXPECT_EQ(calls.count(Call::write), 1);
+  EXPECT_TRUE(writer->put('z'));
+  EXPECT_TRUE(writer.close());
+  EXPECT_EQ(calls.count(Call::write), 2);
+  EXPECT_TRUE(file.bytes() == std::string(65'535, 'x') + "yz");
+
+  const Stream reader(file.name, OpenMode::read);
+  for (int i = 0; i < 4096; ++i) EXPECT_EQ(reader->get(), 'x');
+  EXPECT_EQ(calls.count(Call::read), 1);
+}
+
+TEST(zxfile, a_byte_to_an_unbuffered_stream_is_written_at_once) {
+  const TestFile file("");
+  const Stream stream(file.name, OpenMode::create);
+  EXPECT_TRUE(stream->put('a'));
+  EXPECT_EQ(file.bytes(), "");
+  stream->set_unbuffered();
+  EXPECT_TRUE(stream->put('b'));
+  EXPECT_EQ(file.bytes(), "ab");
+  EXPECT_TRUE(stream->put('c'));
+  EXPECT_EQ(file.bytes(), "abc");
+}
+
+TEST(zxfile, a_byte_that_cannot_be_got_or_put_is_told) {
+  const TestFile file("abc");
+  {
+    Stream stream(file.name, OpenMode::read_write);
+    Faults faults;
+    faults.fail_nth(Call::read, 1);
+    EXPECT_EQ(stream->get(), -1);
+    EXPECT_TRUE(stream->error());
+    EXPECT_FALSE(stream->eof());
+    EXPECT_EQ(stream->get(), 'a');
+    faults.fail_nth(Call::seek, 1);  // "bc" cannot be given back
+    EXPECT_FALSE(stream->put('x'));
+    EXPECT_FALSE(stream.close());
+  }
+  Stream stream(file.name, OpenMode::create);
+  stream->set_unbuffered();
+  Faults faults;
+  faults.fail_nth(Call::write, 1);
+  EXPECT_FALSE(stream->put('x'));
+  EXPECT_FALSE(stream.close());
+}
+
+TEST(zxfile, what_is_unread_is_seen_and_passed_over_in_pieces) {
+  const TestFile file(pattern(5000));
+  const Stream stream(file.name, OpenMode::read);
+  EXPECT_TRUE(stream->unread() == pattern(5000).substr(0, 4096));
+  EXPECT_TRUE(stream->unread() == pattern(5000).substr(0, 4096));
+  stream->skip(4000);
+  EXPECT_EQ(stream->tell(), 4000);
+  EXPECT_TRUE(stream->unread() == pattern(5000).substr(4000, 96));
+  EXPECT_TRUE(stream.read(1) == pattern(5000).substr(4000, 1));
+  stream->skip(95);
+  EXPECT_TRUE(stream->unread() == pattern(5000).substr(4096));
+  EXPECT_FALSE(stream->eof());
+  stream->skip(904);
+  EXPECT_EQ(stream->unread(), "");
+  EXPECT_TRUE(stream->eof());
+  EXPECT_FALSE(stream->error());
+}
+
+TEST(zxfile, nothing_is_unread_where_reading_fails) {
+  const TestFile file("abc");
+  const Stream output(file.name, OpenMode::append);
+  EXPECT_EQ(output->unread(), "");
+  EXPECT_TRUE(output->error());
+  const Stream stream(file.name, OpenMode::read_write);
+  EXPECT_TRUE(stream.write("x"));
+  Faults faults;
+  faults.fail_nth(Call::write, 1);
+  EXPECT_EQ(stream->unread(), "");
+  EXPECT_TRUE(stream->error());
+}
+
+TEST(zxfile, what_others_wrote_is_seen_once_the_unread_is_dropped) {
+  const TestFile file("abcdef");
+  const Stream reader(file.name, OpenMode::read_write);
+  EXPECT_EQ(reader.read(2), "ab");
+  {
+    Stream writer(file.name, OpenMode::read_write);
+    EXPECT_TRUE(writer.write("ABCDEF"));
+  }
+  EXPECT_EQ(reader.read(1), "c");
+  EXPECT_TRUE(reader->drop_unread());
+  EXPECT_EQ(reader->tell(), 3);
+  EXPECT_EQ(reader.read(10), "DEF");
+}
+
+TEST(zxfile, dropping_leaves_what_is_to_be_written) {
+  const TestFile file("");
+  const Stream stream(file.name, OpenMode::create);
+  EXPECT_TRUE(stream.write("abc"));
+  EXPECT_TRUE(stream->drop_unread());
+  EXPECT_TRUE(stream->flush());
+  EXPECT_EQ(file.bytes(), "abc");
+}
+
+TEST(zxfile, what_cannot_be_given_back_is_dropped_all_the_same) {
+  const TestFile file("abcdef");
+  const Stream stream(file.name, OpenMode::read);
+  EXPECT_EQ(stream.read(2), "ab");
+  Faults faults;
+  faults.fail_nth(Call::seek, 1);
+  EXPECT_FALSE(stream->drop_unread());
+  EXPECT_TRUE(stream->error());
+  EXPECT_TRUE(stream->seek(2, Whence::start));
+  EXPECT_EQ(faults.count(Call::seek), 2);
+  EXPECT_EQ(stream.read(10), "cdef");
+}
+
+// ---- the buffer's size
+
+TEST(zxfile, a_buffer_of_a_size_reads_as_much_from_the_start_on) {
+  const TestFile file(pattern(400'000));
+  const struct {
+    std::size_t size;
+    Sizes reads;
+  } rows[] = {
+      {1, {4096, 8192, 16384}},  // the least that it ever reads
+      {16384, {16384, 32768, 65536, 65536}},
+      {24576, {24576, 49152, 65536, 65536}},
+      {65536, {65536, 65536, 65536}},
+      {100'000, {100'000, 100'000, 100'000}},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.size);
+    const Stream stream(file.name, OpenMode::read);
+    EXPECT_TRUE(stream->set_buffer(row.size));
+    const Reads reads;
+    while (Reads::sizes.size() < row.reads.size()) {
+      ASSERT_FALSE(stream->unread().empty());
+      stream->skip(stream->unread().size());
+      stream->unread();
+    }
+    EXPECT_EQ(Reads::sizes, row.reads);
+    // Behind a seek it starts anew.
+    EXPECT_TRUE(stream->seek(399'999, Whence::start));
+    Reads::sizes.clear();
+    EXPECT_EQ(stream.read(1).size(), 1U);
+    EXPECT_EQ(Reads::sizes, Sizes{row.reads[0]});
+  }
+}
+
+TEST(zxfile, a_new_buffer_keeps_what_is_unread_and_unwritten) {
+  const TestFile file("abcdefghij");
+  const Stream stream(file.name, OpenMode::read_write);
+  EXPECT_EQ(stream.read(3), "abc");
+  EXPECT_TRUE(stream->set_buffer(200'000));
+  EXPECT_EQ(stream.read(2), "de");
+  EXPECT_TRUE(stream.write("XY"));
+  EXPECT_TRUE(stream->set_buffer(300'000));
+  EXPECT_EQ(file.bytes(), "abcdeXYhij");
+  EXPECT_EQ(stream.read(10), "hij");
+}
+
+TEST(zxfile, a_larger_buffer_waits_longer_before_it_writes) {
+  const TestFile file("");
+  const Faults calls;
+  Stream stream(file.name, OpenMode::create);
+  EXPECT_TRUE(stream.write("x"));
+  EXPECT_TRUE(stream->set_buffer(200'000));
+  EXPECT_EQ(calls.count(Call::write), 1);
+  for (int i = 0; i < 199'999; ++i) EXPECT_TRUE(stream->put('y'));
+  EXPECT_EQ(calls.count(Call::write), 1);
+  EXPECT_TRUE(stream->put('z'));
+  EXPECT_EQ(calls.count(Call::write), 2);
+  EXPECT_TRUE(stream.close());
+  EXPECT_TRUE(file.bytes() == "x" + std::string(199'999, 'y') + "z");
+}
+
+TEST(zxfile, a_buffer_ends_the_writing_at_once) {
+  const TestFile file("");
+  const Stream stream(file.name, OpenMode::create);
+  stream->set_unbuffered();
+  EXPECT_TRUE(stream.write("a"));
+  EXPECT_TRUE(stream->set_buffer(512));
+  EXPECT_TRUE(stream.write("b"));
+  EXPECT_TRUE(stream->put('c'));
+  EXPECT_EQ(file.bytes(), "a");
+}
+
+TEST(zxfile, a_buffer_is_refused_for_no_size_no_file_and_lost_bytes) {
+  const Closings closings;
+  const TestFile file("");
+  Stream stream(file.name, OpenMode::create);
+  EXPECT_FALSE(stream->set_buffer(0));
+  EXPECT_TRUE(stream.write("abc"));
+  {
+    Faults faults;
+    faults.fail_nth(Call::write, 1);
+    EXPECT_FALSE(stream->set_buffer(1000));
+  }
+  EXPECT_TRUE(stream->set_buffer(1000));
+  zxStream::close_all();
+  EXPECT_FALSE(stream->set_buffer(1000));
+}
+
+TEST(zxfile, a_dropped_buffer_is_forgotten_and_taken_anew) {
+  const TestFile file("abcdefghij");
+  const Blocks blocks;
+  Stream stream(file.name, OpenMode::read_write);
+  EXPECT_EQ(stream.read(3), "abc");
+  EXPECT_EQ(Blocks::in_use, 2);
+  stream->drop_buffer();
+  EXPECT_EQ(Blocks::in_use, 1);
+  EXPECT_EQ(stream.read(3), "");  // all of it had been read ahead
+  EXPECT_TRUE(stream->seek(8, Whence::start));
+  EXPECT_TRUE(stream.write("XY"));
+  stream->drop_buffer();
+  EXPECT_TRUE(stream->put('Z'));
+  EXPECT_TRUE(stream.close());
+  EXPECT_EQ(file.bytes(), "abcdefghZj");
+  EXPECT_EQ(Blocks::in_use, 0);
+}
+
+// ---- the file's size
+
+TEST(zxfile, the_size_is_that_of_the_system) {
+  const TestFile file("abc");
+  const Stream stream(file.name, OpenMode::read_write);
+  EXPECT_EQ(stream->size(), 3);
+  EXPECT_TRUE(stream->seek(3, Whence::start));
+  EXPECT_TRUE(stream.write("def"));
+  EXPECT_EQ(stream->size(), 3);
+  EXPECT_TRUE(stream->flush());
+  EXPECT_EQ(stream->size(), 6);
+  EXPECT_EQ(stream->tell(), 6);
+  Faults faults;
+  faults.fail_nth(Call::size, 1);
+  EXPECT_EQ(stream->size(), -1);
+}
+
+TEST(zxfile, setting_the_size_flushes_and_keeps_the_position) {
+  const TestFile file("abcdefghij");
+  const Stream stream(file.name, OpenMode::read_write);
+  EXPECT_EQ(stream.read(2), "ab");
+  EXPECT_TRUE(stream->set_size(5));
+  EXPECT_EQ(stream->tell(), 2);
+  EXPECT_EQ(stream.read(10), "cde");
+  EXPECT_TRUE(stream.write("XYZ"));
+  EXPECT_TRUE(stream->set_size(7));
+  EXPECT_EQ(file.bytes(), "abcdeXY");
+  EXPECT_EQ(stream->tell(), 8);
+  EXPECT_TRUE(stream.write("!"));
+  EXPECT_TRUE(stream->set_size(11));
+  EXPECT_EQ(file.bytes(), std::string("abcdeXY\0!\0\0", 11));
+  EXPECT_TRUE(stream->seek(0, Whence::start));
+  EXPECT_EQ(stream.read(20), std::string("abcdeXY\0!\0\0", 11));
+}
+
+TEST(zxfile, a_size_that_cannot_be_set_is_told) {
+  const TestFile file("abcdef");
+  const Stream reader(file.name, OpenMode::read);
+  EXPECT_FALSE(reader->set_size(2));
+  const Stream stream(file.name, OpenMode::read_write);
+  EXPECT_FALSE(stream->set_size(-1));
+  for (const Call call : {Call::set_size, Call::write, Call::seek}) {
+    SCOPED_TRACE(kit::name_of(call));
+    EXPECT_TRUE(stream->seek(0, Whence::start));
+    EXPECT_EQ(stream.read(1), "a");
+    if (call == Call::write) {
+      EXPECT_TRUE(stream.write("b"));
+    }
+    Faults faults;
+    faults.fail_nth(call, 1);
+    EXPECT_FALSE(stream->set_size(2));
+  }
+  EXPECT_EQ(file.bytes(), "abcdef");
+}
+
+// ---- locks
+
+void expect_refused(const Stream& stream, std::int64_t start,
+                    std::int64_t size) {
+  zxplat::set_last_error(0);
+  EXPECT_FALSE(stream->lock(start, size)) << start << ", " << size;
+  EXPECT_EQ(zxplat::last_error(), zxplat::k_err_lock);
+}
+
+TEST(zxfile, a_stream_is_kept_out_by_its_own_locks_and_by_those_of_others) {
+  const TestFile file("abcdefghij");
+  const Stream first(file.name, OpenMode::read_write);
+  const Stream second(file.name, OpenMode::read_write);
+  EXPECT_TRUE(first->lock(2, 3));
+  EXPECT_TRUE(first->lock(7, 1));
+  for (const Stream* stream : {&first, &second}) {
+    for (const auto& [start, size] :
+         std::vector<std::pair<int, int>>{{2, 3}, {0, 3}, {4, 1}, {0, 100}})
+      expect_refused(*stream, start, size);
+    expect_refused(*stream, 7, 1);
+  }
+  EXPECT_TRUE(first->lock(5, 2));   // between the two
+  EXPECT_TRUE(second->lock(0, 2));  // just ahead
+  EXPECT_TRUE(second->lock(8, 2));  // just behind
+}
+
+TEST(zxfile, a_stream_asks_the_system_of_its_own_locks_nothing) {
+  const TestFile file("abcdefghij");
+  const Stream stream(file.name, OpenMode::read_write);
+  EXPECT_TRUE(stream->lock(2, 3));
+  const Faults calls;
+  expect_refused(stream, 3, 1);
+  EXPECT_FALSE(stream->unlock(2, 2));
+  EXPECT_EQ(calls.count(Call::lock) + calls.count(Call::unlock), 0);
+}
+
+TEST(zxfile, exactly_what_was_locked_is_unlocked_in_any_order) {
+  const TestFile file("abcdefghij");
+  const Stream stream(file.name, OpenMode::read_write);
+  const Stream other(file.name, OpenMode::read_write);
+  for (const int start : {0, 2, 4}) EXPECT_TRUE(stream->lock(start, 2));
+  for (const auto& [start, size] :
+       std::vector<std::pair<int, int>>{{0, 1}, {1, 1}, {0, 4}, {6, 2}}) {
+    zxplat::set_last_error(0);
+    EXPECT_FALSE(stream->unlock(start, size));
+    EXPECT_EQ(zxplat::last_error(), zxplat::k_err_not_locked);
+  }
+  for (const int start : {2, 4, 0}) {
+    expect_refused(other, start, 1);
+    EXPECT_TRUE(stream->unlock(start, 2));
+    EXPECT_TRUE(other->lock(start, 1));
+    EXPECT_FALSE(stream->unlock(start, 2));
+  }
+}
+
+TEST(zxfile, a_lock_that_the_system_refuses_is_not_held) {
+  const TestFile file("abcdefghij");
+  const Stream stream(file.name, OpenMode::read_write);
+  Faults faults;
+  faults.fail_nth(Call::lock, 1, zxplat::k_err_io);
+  EXPECT_FALSE(stream->lock(0, 1));
+  EXPECT_EQ(zxplat::last_error(), zxplat::k_err_io);
+  EXPECT_FALSE(stream->unlock(0, 1));
+  EXPECT_TRUE(stream->lock(0, 1));
+  faults.fail_nth(Call::unlock, 1, zxplat::k_err_io);
+  EXPECT_FALSE(stream->unlock(0, 1));
+  expect_refused(stream, 0, 1);  // it is held on
+  EXPECT_TRUE(stream->unlock(0, 1));
+}
+
+TEST(zxfile, locks_end_with_the_stream_and_with_closing_all) {
+  const Closings closings;
+  const TestFile file("abcdefghij");
+  const Blocks blocks;
+  {
+    Stream first(file.name, OpenMode::read_write);
+    Stream second(file.name, OpenMode::read_write);
+    EXPECT_TRUE(first->lock(0, 1));
+    EXPECT_TRUE(first->lock(1, 1));
+    EXPECT_TRUE(first.close());
+    EXPECT_TRUE(second->lock(0, 2));
+    zxStream::close_all();
+    Stream third(file.name, OpenMode::read_write);
+    EXPECT_TRUE(third->lock(0, 2));
+    EXPECT_FALSE(second->unlock(0, 2));
+    EXPECT_EQ(zxplat::last_error(), zxplat::k_err_not_locked);
+    EXPECT_FALSE(second->lock(5, 1));
+  }
+  EXPECT_EQ(Blocks::in_use, 0);
 }
 
 // ---- failing calls

@@ -16,6 +16,7 @@
 
 #include "kit/cases.h"
 #include "kit/failure.h"
+#include "kit/faults.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
 #include "zxatsys.h"
@@ -244,13 +245,39 @@ TEST(zxmainf, a_stream_is_attached_under_a_name) {
   file.handle = nullptr;
 }
 
-TEST(zxmainf, a_stream_over_nothing_fails_an_assertion) {
+TEST(zxmainf, a_stream_over_nothing_is_the_null_device) {
   static zxStream stream(999);
   zxBFile file;
+  file.lines = 7;
+  attach_stream(file, "-", stream);
+  ASSERT_TRUE(file.is_open());
+  EXPECT_NE(file.handle, &stream);
+  EXPECT_TRUE(file.name == "nul");
+  EXPECT_EQ(file.lines, 0);
+  char byte = '?';
+  EXPECT_FALSE(file.read(&byte, 1));
+  file.puts("lost");
+  EXPECT_TRUE(file.close());
+}
+
+TEST(zxmainf, without_a_null_device_the_file_stays_closed) {
+  static zxStream stream(999);
+  zxBFile file;
+  kit::Faults faults;
+  faults.fail_all(kit::Call::open);
+  attach_stream(file, "-", stream);
+  EXPECT_FALSE(file.is_open());
+}
+
+TEST(zxmainf, a_stream_that_cannot_be_switched_to_binary_fails_an_assertion) {
+  static zxStream stream(zxplat::k_stdin_fd);
+  zxBFile file;
+  zxplat::files.set_mode = [](zxplat::Fd, zxplat::StreamMode) { return false; };
   EXPECT_FAILURE(attach_stream(file, "-", stream),
                  "1000: bailed out: zxmainf:44 ",
                  "[1000-1000-0/E-0/E/zxmainf:44/]");
   kit::with_failures_dropped([&] { attach_stream(file, "-", stream); });
+  zxplat::files.set_mode = zxplat::system_files.set_mode;
   EXPECT_FALSE(file.is_open());
 }
 
@@ -357,6 +384,58 @@ TEST(zxmainf, the_end_flushes_and_passes_the_result_on) {
     EXPECT_EQ(result.exit_code, code);
     EXPECT_EQ(result.out, "not flushed");
   }
+}
+
+// Each switch of a descriptor, in order: "0b", "1t".
+std::string switches;
+
+void note_switches() {
+  zxplat::files.set_mode = [](zxplat::Fd fd, zxplat::StreamMode mode) {
+    switches += std::to_string(fd);
+    switches += mode == zxplat::StreamMode::text ? "t " : "b ";
+    return zxplat::system_files.set_mode(fd, mode);
+  };
+}
+
+ZX_CASE(zxmainf_switches_modes) {
+  note_switches();
+  std::atexit([] { say(switches + "\n"); });  // behind the library's end
+  init_zxlib_args(argc, argv);
+  g_stdout.puts("binary\n");
+  return 0;
+}
+
+TEST(zxmainf, the_streams_are_binary_until_the_end_and_then_text) {
+  const auto result = kit::run_case("zxmainf_switches_modes");
+  const std::string line_end = kit::on_windows() ? "\r\n" : "\n";
+  EXPECT_EQ(result.out, "binary\n0b 1b 2b 0t 1t 2t " + line_end);
+}
+
+// Reads a byte ahead of the end and behind it.
+ZX_CASE(zxmainf_leaves_nothing_in_buffers) {
+  std::atexit([] {
+    char room[8];
+    const std::size_t count = zx_standard_stream(0).read(room, sizeof room);
+    say(count == 0 ? "nothing left" : "left");
+  });
+  init_zxlib_args(argc, argv);
+  const int byte = g_stdin.getc();
+  g_stdout.putc(byte);
+  zxBFile second;
+  second.create("-");
+  g_stdout.close();
+  second.putc('2');
+  second.handle = nullptr;  // nobody closes it
+  return 0;
+}
+
+TEST(zxmainf, the_end_leaves_nothing_in_the_streams_buffers) {
+  kit::ProcessOptions options;
+  options.input = "abc";
+  const auto result =
+      kit::run_case("zxmainf_leaves_nothing_in_buffers", {}, options);
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out, "a2nothing left");
 }
 
 // Tells what of the process-wide values is still there: "A" for g_args, "O"

@@ -533,6 +533,11 @@ TEST(zxplat, a_closed_descriptor_is_a_bad_handle_to_every_call) {
   expect_bad_handle(files.seek(fd, 0, Whence::start) == -1, "seek");
   expect_bad_handle(!files.flush(fd), "flush");
   expect_bad_handle(files.size(fd) == -1, "size");
+  expect_bad_handle(!files.set_size(fd, 1), "set_size");
+  expect_bad_handle(!files.lock(fd, 0, 1), "lock");
+  expect_bad_handle(!files.unlock(fd, 0, 1), "unlock");
+  for (const auto mode : {zxplat::StreamMode::binary, zxplat::StreamMode::text})
+    expect_bad_handle(!files.set_mode(fd, mode), "set_mode");
   expect_bad_handle(!files.close(fd), "close");
   expect_bad_handle(!zxplat::set_binary(fd), "set_binary");
 }
@@ -1695,6 +1700,170 @@ TEST(zxplat, reading_memory_leaves_the_last_error_alone) {
   set_last_error(k_untouched);
   EXPECT_TRUE(zxplat::read_memory(address_of(&byte), &out, 1));
   EXPECT_EQ(last_error(), k_untouched);
+}
+
+// ------------------------------------------------------------------ size --
+
+TEST(zxplat, a_file_is_cut_and_widened_by_zeros_and_the_position_stays) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "abcdef");
+  const Open file(dir.file("a"), OpenMode::read_write);
+  EXPECT_EQ(files.seek(file.fd, 4, Whence::start), 4);
+  const struct {
+    std::int64_t size;
+    std::string_view bytes;
+  } rows[] = {
+      {6, "abcdef"}, {3, "abc"}, {5, "abc\0\0"sv}, {0, ""}, {2, "\0\0"sv}};
+  for (const auto& row : rows) {
+    EXPECT_TRUE(files.set_size(file.fd, row.size)) << last_error();
+    EXPECT_EQ(files.size(file.fd), row.size);
+    EXPECT_EQ(files.seek(file.fd, 0, Whence::current), 4);
+    EXPECT_EQ(kit::read_file(dir.file("a")), row.bytes);
+  }
+  EXPECT_TRUE(files.set_size(file.fd, 5'000'000'000));
+  EXPECT_EQ(files.size(file.fd), 5'000'000'000);
+}
+
+TEST(zxplat, setting_a_size_needs_a_descriptor_for_writing) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "abcdef");
+  const Open file(dir.file("a"), OpenMode::read);
+  set_last_error(k_untouched);
+  EXPECT_FALSE(files.set_size(file.fd, 3));
+  EXPECT_EQ(last_error(), zxplat::k_err_denied);
+  EXPECT_EQ(kit::read_file(dir.file("a")), "abcdef");
+  for (const OpenMode mode : k_overwriting_modes) {
+    const Open other(dir.file("a"), mode);
+    EXPECT_TRUE(files.set_size(other.fd, 3)) << last_error();
+    EXPECT_EQ(kit::read_file(dir.file("a")).size(), 3U);
+  }
+}
+
+TEST(zxplat, a_negative_size_is_refused) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "abcdef");
+  const Open file(dir.file("a"), OpenMode::read_write);
+  for (const std::int64_t size : {std::int64_t{-1}, INT64_MIN}) {
+    set_last_error(k_untouched);
+    EXPECT_FALSE(files.set_size(file.fd, size));
+    EXPECT_EQ(last_error(), zxplat::k_err_bad_parameter);
+  }
+  EXPECT_EQ(kit::read_file(dir.file("a")), "abcdef");
+}
+
+// ----------------------------------------------------------------- locks --
+
+void expect_locked(Fd fd, std::int64_t start, std::int64_t size) {
+  set_last_error(k_untouched);
+  EXPECT_FALSE(files.lock(fd, start, size)) << start << ", " << size;
+  EXPECT_EQ(last_error(), zxplat::k_err_lock);
+}
+
+TEST(zxplat, descriptors_of_one_process_lock_each_other_out) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "0123456789");
+  const Open first(dir.file("a"), OpenMode::read_write);
+  const Open second(dir.file("a"), OpenMode::read_write);
+  EXPECT_TRUE(files.lock(first.fd, 2, 3)) << last_error();
+  expect_locked(second.fd, 2, 3);
+  expect_locked(second.fd, 0, 3);
+  expect_locked(second.fd, 4, 100);
+  expect_locked(second.fd, 3, 1);
+  EXPECT_TRUE(files.lock(second.fd, 0, 2)) << last_error();
+  EXPECT_TRUE(files.lock(second.fd, 5, 1)) << last_error();
+  EXPECT_TRUE(files.unlock(first.fd, 2, 3)) << last_error();
+  EXPECT_TRUE(files.lock(second.fd, 2, 3)) << last_error();
+}
+
+TEST(zxplat, bytes_that_do_not_exist_are_locked_as_well) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "");
+  const Open first(dir.file("a"), OpenMode::read_write);
+  const Open second(dir.file("a"), OpenMode::read_write);
+  for (const std::int64_t start : {100LL, 0x7FFF'FFFFLL, 0x1'0000'0005LL}) {
+    EXPECT_TRUE(files.lock(first.fd, start, 1)) << last_error();
+    expect_locked(second.fd, start, 1);
+    EXPECT_TRUE(files.lock(second.fd, start + 1, 1)) << last_error();
+    EXPECT_TRUE(files.unlock(second.fd, start + 1, 1)) << last_error();
+  }
+}
+
+TEST(zxplat, closing_one_descriptor_unlocks_what_it_locked_alone) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "0123456789");
+  const Open first(dir.file("a"), OpenMode::read_write);
+  const Open asking(dir.file("a"), OpenMode::read_write);
+  EXPECT_TRUE(files.lock(first.fd, 0, 1));
+  {
+    const Open second(dir.file("a"), OpenMode::read_write);
+    EXPECT_TRUE(files.lock(second.fd, 5, 1));
+    expect_locked(asking.fd, 5, 1);
+  }
+  EXPECT_TRUE(files.lock(asking.fd, 5, 1)) << last_error();
+  expect_locked(asking.fd, 0, 1);
+}
+
+TEST(zxplat, a_native_lock_needs_a_descriptor_for_writing) {
+  if (kit::on_windows()) GTEST_SKIP() << "any descriptor will do";
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "0123456789");
+  const Open file(dir.file("a"), OpenMode::read);
+  set_last_error(k_untouched);
+  EXPECT_FALSE(files.lock(file.fd, 0, 1));
+  EXPECT_EQ(last_error(), zxplat::k_err_denied);
+  set_last_error(k_untouched);
+  EXPECT_FALSE(files.unlock(file.fd, 0, 1));
+  EXPECT_EQ(last_error(), zxplat::k_err_denied);
+}
+
+// The child's part: bytes 2 to 4 are held by its parent.
+void meet_a_lock() {
+  const Open file(child_folder() + "/a", OpenMode::read_write);
+  expect_locked(file.fd, 2, 3);
+  expect_locked(file.fd, 4, 1);
+  EXPECT_TRUE(files.lock(file.fd, 5, 5)) << last_error();
+  // The end of the process unlocks.
+}
+
+TEST(zxplat, a_lock_is_met_by_another_process_and_ends_with_it) {
+  if (!child_folder().empty()) return meet_a_lock();
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "0123456789");
+  const Open file(dir.file("a"), OpenMode::read_write);
+  EXPECT_TRUE(files.lock(file.fd, 2, 3)) << last_error();
+  const kit::ProcessResult result = run_as_child(dir);
+  EXPECT_EQ(result.exit_code, 0) << result.out;
+  EXPECT_TRUE(files.lock(file.fd, 5, 5)) << last_error();
+}
+
+// ------------------------------------------------------- kinds of streams --
+
+TEST(zxplat, a_descriptor_has_a_stream_behind_it_or_none) {
+  const TempDir dir;
+  const kit::Pipe pipe = kit::make_pipe();
+  set_last_error(k_untouched);
+  {
+    const Open file(dir.file("a"), OpenMode::create);
+    const Open null("nul", OpenMode::read_write);
+    for (const Fd fd : {file.fd, null.fd, pipe.reader, pipe.writer})
+      EXPECT_TRUE(zxplat::has_stream(fd)) << fd;
+  }
+  files.close(pipe.reader);
+  files.close(pipe.writer);
+  for (const Fd fd : {pipe.reader, 999, k_no_fd})
+    EXPECT_FALSE(zxplat::has_stream(fd)) << fd;
+  EXPECT_EQ(last_error(), k_untouched);
+}
+
+TEST(zxplat, text_is_translated_on_windows_alone) {
+  const TempDir dir;
+  const Open file(dir.file("a"), OpenMode::create);
+  EXPECT_TRUE(files.set_mode(file.fd, zxplat::StreamMode::text));
+  EXPECT_EQ(file.write("a\n"), 2);
+  EXPECT_TRUE(files.set_mode(file.fd, zxplat::StreamMode::binary));
+  EXPECT_EQ(file.write("b\n"), 2);
+  EXPECT_EQ(kit::read_file(dir.file("a")),
+            kit::on_windows() ? "a\r\nb\n" : "a\nb\n");
 }
 
 // ---------------------------------------------------------------- tables --
