@@ -168,7 +168,7 @@ bool is_day(const DateFields& date);
 
 // Reads the whole number at a place as std::atoi() does, white space and a
 // sign ahead of it included; the place moves on over digits alone.  False,
-// and the place stays, for a number of more than 32 bits.
+// and the place stays, for a number whose digits exceed 31 bits.
 bool read_number(const char*& at, std::int32_t& number);
 
 // Reads day, month and year, not tested yet but for the window of years.

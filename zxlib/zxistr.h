@@ -75,6 +75,8 @@ class IZxStrRef {
   IZxStr* held = nullptr;
 };
 
+static_assert(sizeof(IZxStrRef) == sizeof(IZxStr*));
+
 // The text as a string of the caller's own; empty without an object, behind
 // a dropped assertion.
 zxStr to_str(const IZxStrRef& text);

@@ -330,16 +330,13 @@ bool is_terminal(Fd fd);
 inline constexpr std::int64_t k_last_moment = 32'535'215'999;
 
 // What the local clock shows at a moment, daylight saving included.  False
-// (87), and `fields` unchanged, outside of 0 to k_last_moment.
+// (87), and `fields` unchanged, outside of 0 to k_last_moment.  A TZ that
+// names daylight saving without its rules is at the system's mercy: one takes
+// New York's, and its offset as well from the end of 2037 on.
 bool local_time(std::int64_t moment, std::tm& fields);
 
-// The moment at which a clock that knows no daylight saving shows year,
-// month, day, hour, minute and second of `fields`; the other fields are not
-// looked at, and values beyond their range are carried over.  -1 (87)
-// outside of 0 to k_last_moment.
-std::int64_t moment_of_standard_time(const std::tm& fields);
-
-// The seconds that such a clock is behind UTC; negative east of it.
+// The seconds that a clock without daylight saving is behind UTC in the
+// standard time of the present; negative east of it.
 std::int32_t standard_zone_offset();
 
 // --------------------------------------------------------------- faults --

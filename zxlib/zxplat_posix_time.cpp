@@ -25,15 +25,6 @@ bool local_time(std::int64_t moment, std::tm& fields) {
   return true;
 }
 
-std::int64_t moment_of_standard_time(const std::tm& fields) {
-  std::tm clock = fields;
-  clock.tm_isdst = 0;
-  const std::int64_t moment = ::mktime(&clock);
-  if (has_fields(moment)) return moment;
-  posix::fail_with(k_err_bad_parameter);
-  return -1;
-}
-
 // Breaking a moment down may change the variable to the offset of another
 // rule; tzset() puts it right.
 std::int32_t standard_zone_offset() {

@@ -28,18 +28,6 @@ bool local_time(std::int64_t moment, std::tm& fields) {
   return true;
 }
 
-std::int64_t moment_of_standard_time(const std::tm& fields) {
-  const Attempt attempt;
-  std::tm clock = fields;
-  clock.tm_isdst = 0;
-  ::_tzset();
-  const std::int64_t moment = ::_mktime64(&clock);
-  attempt.restore();
-  if (has_fields(moment)) return moment;
-  win32::fail_with(k_err_bad_parameter);
-  return -1;
-}
-
 std::int32_t standard_zone_offset() {
   const Attempt attempt;
   ::_tzset();

@@ -2,7 +2,6 @@
 // Tests: tests/zxlib/zxtime_test.cpp.
 #include "zxtime.h"
 
-#include <climits>
 #include <cstddef>
 #include <iterator>
 
@@ -37,9 +36,8 @@ zxStr text_of_form(const std::tm& fields, std::int32_t index) {
   return {text, zx_count(length)};
 }
 
-// A moment that does not fit 32 bits is none.
-std::int64_t in_32_bits(std::int64_t moment) {
-  return moment < INT32_MIN || moment > INT32_MAX ? -1 : moment;
+constexpr bool fits_32_bits(std::int64_t moment) {
+  return moment >= INT32_MIN && moment <= INT32_MAX;
 }
 
 // Appends a separator and a number of two digits.
@@ -63,13 +61,15 @@ void zxTime::set_raw(std::int32_t seconds) {
 }
 
 bool zxTime::set_time_t(std::int64_t moment) {
-  const std::int64_t seconds =
-      in_32_bits(moment) - zxplat::standard_zone_offset();
-  const bool is_time = seconds >= k_first && seconds <= INT32_MAX;
+  const std::int64_t seconds = moment - zxplat::standard_zone_offset();
+  const bool is_time =
+      fits_32_bits(moment) && seconds >= k_first && seconds <= INT32_MAX;
   count = is_time ? static_cast<std::int32_t>(seconds) : k_null;
   return is_time;
 }
 
+// By arithmetic: the C library would take the standard time of that year,
+// which is not today's in a zone that has moved since.
 bool zxTime::try_set(std::int32_t year, std::int32_t month, std::int32_t day,
                      std::int32_t hour, std::int32_t minute,
                      std::int32_t second) {
@@ -78,14 +78,11 @@ bool zxTime::try_set(std::int32_t year, std::int32_t month, std::int32_t day,
       !zxdate_detail::is_day({year, month, day}) || !is_between(0, hour, 23) ||
       !is_between(0, second, 59))
     return false;
-  std::tm fields = {};
-  fields.tm_year = year - 1900;
-  fields.tm_mon = month - 1;
-  fields.tm_mday = day;
-  fields.tm_hour = hour;
-  fields.tm_min = minute;
-  fields.tm_sec = second;
-  return set_time_t(zxplat::moment_of_standard_time(fields));
+  zxDate date;
+  date.set(year, month, day);
+  const std::int64_t seconds = std::int64_t{date.days()} * k_seconds_of_day +
+                               hour * 3600 + std::int64_t{minute} * 60 + second;
+  return set_time_t(seconds + zxplat::standard_zone_offset());
 }
 
 void zxTime::set(std::int32_t year, std::int32_t month, std::int32_t day,
@@ -129,7 +126,9 @@ zxDate zxTime::date() const {
 
 std::int64_t zxTime::to_time_t() const {
   if (is_null()) return INT32_MIN;
-  return in_32_bits(std::int64_t{count} + zxplat::standard_zone_offset());
+  const std::int64_t moment =
+      std::int64_t{count} + zxplat::standard_zone_offset();
+  return fits_32_bits(moment) ? moment : -1;
 }
 
 void zxTime::get(std::int32_t& year, std::int32_t& month, std::int32_t& day,

@@ -9,19 +9,20 @@
 //
 // A moment is a number of seconds since 1970-01-01 00:00 UTC, as the C
 // library's time_t.  Times come from moments and become such by the offset of
-// the local zone's standard time; daylight saving does not enter.  A moment
-// beyond 32 bits counts as -1 there, which is none.
+// the local zone's present standard time; daylight saving does not enter.  A
+// moment beyond 32 bits is none there, and counts as -1.
 //
 // These rules are meant, and programs rely on them:
 //   - minutes given as a number are not tested: 75 of them are an hour and a
 //     quarter;
 //   - years of two digits are those of zxdate.h, with 100 for 2000, and the
 //     calendar ends within 2038;
-//   - what local_fields() and format_time_t() show in summer is an hour ahead
-//     of a zxTime of the same moment, where clocks are changed.
+//   - what local_fields() and format_time_t() show in summer is ahead of a
+//     zxTime of the same moment, where clocks are changed.
 //
-// After a failure that was dropped a setter leaves the time as it was, and a
-// question gets 0, an empty text or, for a time, this one.
+// After a failure that was dropped a setter leaves the time as it was (set()
+// leaves what try_set() does), and a question gets 0, an empty text or, for a
+// time, this one.
 #ifndef ZXTIME_H
 #define ZXTIME_H
 
