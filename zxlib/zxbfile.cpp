@@ -103,6 +103,22 @@ bool zxBFile::try_create_private(const zxStr& file_name) {
   return open_as(file_name, OpenMode::create_private);
 }
 
+void zxBFile::attach(const zxStr& stream_name, zxStream& stream) {
+  const zxplat::Fd descriptor = stream.descriptor();
+  if (!zxplat::has_stream(descriptor)) {
+    open_rw("nul");
+    return;
+  }
+  const bool is_binary =
+      zxplat::files.set_mode(descriptor, zxplat::StreamMode::binary);
+  if (!ZX_ASSERT_AT(is_binary, "zxmainf", 44)) return;
+  if (descriptor == zxplat::k_stderr_fd || zxplat::is_terminal(descriptor))
+    stream.set_unbuffered();
+  handle = &stream;
+  name = stream_name;
+  lines = 0;
+}
+
 bool zxBFile::is_standard() const {
   return handle == &zx_standard_stream(zxplat::k_stdin_fd) ||
          handle == &zx_standard_stream(zxplat::k_stdout_fd) ||

@@ -71,6 +71,11 @@ class zxBFile {
   // As try_create_new(), for a file that only its owner may read.
   bool try_create_private(const zxStr& file_name);
 
+  // Takes a standard stream over under a name and switches it to binary; that
+  // this fails is an assertion.  If the process was started without that
+  // stream, the null device is opened for reading and writing instead.
+  void attach(const zxStr& stream_name, zxStream& stream);
+
   // ---- closing.  A closed object is a success.  Whatever the result, the
   // object is closed afterwards and its name empty.
   bool close();

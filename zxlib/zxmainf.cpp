@@ -81,9 +81,9 @@ void set_program_values(const char* path) {
 
 void bind_standard_streams() {
   const zxStr name = "-";
-  attach_stream(g_stdin, name, zx_standard_stream(zxplat::k_stdin_fd));
-  attach_stream(g_stdout, name, zx_standard_stream(zxplat::k_stdout_fd));
-  attach_stream(g_stderr, name, zx_standard_stream(zxplat::k_stderr_fd));
+  g_stdin.attach(name, zx_standard_stream(zxplat::k_stdin_fd));
+  g_stdout.attach(name, zx_standard_stream(zxplat::k_stdout_fd));
+  g_stderr.attach(name, zx_standard_stream(zxplat::k_stderr_fd));
 }
 
 // Leaves a standard stream written down and empty, and the descriptor as a
@@ -125,20 +125,4 @@ void init_zxlib_args(int argc, const char* const* argv) {
   set_program_values(argc > 0 && argv[0] != nullptr ? argv[0] : "");
   for (int i = 1; i < argc; ++i) g_args.append(argv[i]);
   bind_standard_streams();
-}
-
-void attach_stream(zxBFile& file, const zxStr& name, zxStream& stream) {
-  const zxplat::Fd descriptor = stream.descriptor();
-  if (!zxplat::has_stream(descriptor)) {
-    file.open_rw("nul");
-    return;
-  }
-  const bool is_binary =
-      zxplat::files.set_mode(descriptor, zxplat::StreamMode::binary);
-  if (!ZX_ASSERT_AT(is_binary, "zxmainf", 44)) return;
-  if (descriptor == zxplat::k_stderr_fd || zxplat::is_terminal(descriptor))
-    stream.set_unbuffered();
-  file.handle = &stream;
-  file.name = name;
-  file.lines = 0;
 }

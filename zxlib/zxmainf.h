@@ -51,8 +51,4 @@ inline const zxStr& positional_arg(std::int32_t n) { return g_args.get_or(n); }
 // without a program name gives empty texts.
 void init_zxlib_args(int argc, const char* const* argv);
 
-// Binds `file` to a standard stream under `name`, switched to binary.  If the
-// process has no such stream, the file is the null device instead.
-void attach_stream(zxBFile& file, const zxStr& name, zxStream& stream);
-
 #endif  // ZXMAINF_H

@@ -314,7 +314,7 @@ void check_files_that_fail() {
                     !file.is_open());
   static zxStream stream(zxplat::k_stdin_fd);
   zxplat::files.set_mode = [](zxplat::Fd, zxplat::StreamMode) { return false; };
-  EXPECT_DROPPED_IN(attach_stream(file, "-", stream), !file.is_open());
+  EXPECT_DROPPED_IN(file.attach("-", stream), !file.is_open());
   zxplat::files.set_mode = zxplat::system_files.set_mode;
   EXPECT_FINE(kit::read_file("open.txt") == "text");
 }

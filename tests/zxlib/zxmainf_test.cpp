@@ -238,7 +238,7 @@ TEST(zxmainf, a_stream_is_attached_under_a_name) {
   static zxStream stream(zxplat::k_stdin_fd);
   zxBFile file;
   file.lines = 7;
-  attach_stream(file, "some name", stream);
+  file.attach("some name", stream);
   EXPECT_EQ(file.handle, &stream);
   EXPECT_TRUE(file.name == "some name");
   EXPECT_EQ(file.lines, 0);
@@ -249,7 +249,7 @@ TEST(zxmainf, a_stream_over_nothing_is_the_null_device) {
   static zxStream stream(999);
   zxBFile file;
   file.lines = 7;
-  attach_stream(file, "-", stream);
+  file.attach("-", stream);
   ASSERT_TRUE(file.is_open());
   EXPECT_NE(file.handle, &stream);
   EXPECT_TRUE(file.name == "nul");
@@ -265,7 +265,7 @@ TEST(zxmainf, without_a_null_device_the_file_stays_closed) {
   zxBFile file;
   kit::Faults faults;
   faults.fail_all(kit::Call::open);
-  attach_stream(file, "-", stream);
+  file.attach("-", stream);
   EXPECT_FALSE(file.is_open());
 }
 
@@ -273,10 +273,10 @@ TEST(zxmainf, a_stream_that_cannot_be_switched_to_binary_fails_an_assertion) {
   static zxStream stream(zxplat::k_stdin_fd);
   zxBFile file;
   zxplat::files.set_mode = [](zxplat::Fd, zxplat::StreamMode) { return false; };
-  EXPECT_FAILURE(attach_stream(file, "-", stream),
+  EXPECT_FAILURE(file.attach("-", stream),
                  "1000: bailed out: zxmainf:44 ",
                  "[1000-1000-0/E-0/E/zxmainf:44/]");
-  kit::with_failures_dropped([&] { attach_stream(file, "-", stream); });
+  kit::with_failures_dropped([&] { file.attach("-", stream); });
   zxplat::files.set_mode = zxplat::system_files.set_mode;
   EXPECT_FALSE(file.is_open());
 }
