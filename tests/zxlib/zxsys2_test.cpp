@@ -1,7 +1,8 @@
-// zxsys2_test.cpp - operations on whole files by name: parts of names, the
-// two folders of the process, unique names, deleting, copying and moving in
+// zxsys2_test.cpp - operations on whole files and folders by name: the two
+// folders of the process, unique names, reading and writing, comparing,
+// deleting, copying and moving, making folders, disks and the environment in
 // each of their outcomes.
-// Tests zxlib/zxsys2.h and zxsys2.cpp.
+// Tests zxlib/zxsys2.h, zxsys2.cpp and zxsys2_data.cpp.
 #include "zxsys2.h"
 
 #include <gtest/gtest.h>
@@ -9,6 +10,7 @@
 #include <algorithm>
 #include <chrono>
 #include <cstdint>
+#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <functional>
@@ -19,7 +21,9 @@
 
 #include "kit/cases.h"
 #include "kit/failure.h"
+#include "kit/failure_road.h"
 #include "kit/faults.h"
+#include "kit/process.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
 #include "zxmainf.h"
@@ -130,17 +134,17 @@ std::string in_library_form(std::string path) {
   return path;
 }
 
-TEST(zxsys2, the_working_directory_ends_in_a_backslash) {
+TEST(zxsys2, the_working_directory_has_no_backslash_at_its_end) {
   const TempDir folder;
   const WorkingIn there(folder.path());
-  EXPECT_EQ(text_of(with_slash(get_cwd())),
-            in_library_form(fs::current_path().string()) + "\\");
+  EXPECT_EQ(text_of(get_cwd()), in_library_form(fs::current_path().string()));
 }
 
-TEST(zxsys2, the_working_directory_at_the_root_is_one_backslash_long) {
+TEST(zxsys2, the_working_directory_at_the_root_keeps_its_backslash) {
   const WorkingIn there(fs::current_path().root_path().string());
-  EXPECT_EQ(text_of(with_slash(get_cwd())),
+  EXPECT_EQ(text_of(get_cwd()),
             in_library_form(fs::current_path().root_path().string()));
+  EXPECT_EQ(text_of(get_cwd()).back(), '\\');
 }
 
 TEST(zxsys2, a_working_directory_may_have_a_long_name) {
@@ -150,8 +154,7 @@ TEST(zxsys2, a_working_directory_may_have_a_long_name) {
   for (int i = 0; i < 6; ++i) deep /= std::string(200, 'd');
   fs::create_directories(deep);
   const WorkingIn there(deep.string());
-  EXPECT_EQ(text_of(with_slash(get_cwd())),
-            in_library_form(deep.string()) + "\\");
+  EXPECT_EQ(text_of(get_cwd()), in_library_form(deep.string()));
 }
 
 TEST(zxsys2, a_working_directory_that_is_gone_fails_an_assertion) {
@@ -161,9 +164,8 @@ TEST(zxsys2, a_working_directory_that_is_gone_fails_an_assertion) {
   fs::create_directory(gone);
   const WorkingIn there(gone);
   fs::remove(gone);
-  expect_assertion_at([] { with_slash(get_cwd()); }, "zxsys2:398");
-  kit::with_failures_dropped(
-      [] { EXPECT_EQ(text_of(with_slash(get_cwd())), ""); });
+  expect_assertion_at([] { get_cwd(); }, "zxsys2:398");
+  kit::with_failures_dropped([] { EXPECT_EQ(text_of(get_cwd()), ""); });
 }
 
 TEST(zxsys2, the_temporary_directory_is_the_systems_with_a_backslash) {
@@ -432,9 +434,7 @@ TEST(zxsys2, thirty_names_that_others_take_meanwhile_are_fatal) {
   EXPECT_EQ(faults.count(Call::open), 30);
 }
 
-// ---- deleting
-
-// A folder with two files; names with the backslash, as programs join them.
+// A folder with two files.
 class Files {
  public:
   Files() {
@@ -455,6 +455,686 @@ class Files {
   // One that the standard library takes on both targets.
   static constexpr char k_separator = '/';
 };
+
+void set_time(const std::string& path, int hours_ago) {
+  fs::last_write_time(
+      path, fs::file_time_type::clock::now() - std::chrono::hours(hours_ago));
+}
+
+// ---- writing whole files
+
+// Bytes that differ from place to place.
+std::string some_bytes(std::size_t size) {
+  std::string bytes(size, '\0');
+  for (std::size_t i = 0; i < size; ++i)
+    bytes[i] = static_cast<char>((i + i / 255) & 0xFF);
+  return bytes;
+}
+
+zxStr to_text(const std::string& bytes) {
+  return zxStr(bytes.data(), static_cast<std::int32_t>(bytes.size()));
+}
+
+// Lines as the library takes them.
+struct Lines : zxQVA<zxStr> {
+  explicit Lines(const Names& lines) {
+    for (const std::string& line : lines) append(to_text(line));
+  }
+};
+
+TEST(zxsys2, a_text_replaces_a_file_or_is_added_to_it) {
+  const Files files;
+  const std::string bytes("a\r\n\0\x1a\xff\n", 7);
+  EXPECT_TRUE(str2file(files.to.c_str(), to_text(bytes)));
+  EXPECT_EQ(read_file(files.to), bytes);
+  EXPECT_TRUE(str2file(files.to.c_str(), "more", true));
+  EXPECT_EQ(read_file(files.to), bytes + "more");
+  EXPECT_TRUE(str2file(files.to.c_str(), "", true));
+  EXPECT_EQ(read_file(files.to), bytes + "more");
+  EXPECT_TRUE(str2file(files.to.c_str(), ""));
+  EXPECT_EQ(read_file(files.to), "");
+  EXPECT_TRUE(str2file(files.missing.c_str(), "new", true));
+  EXPECT_EQ(read_file(files.missing), "new");
+  str2file_or_die(files.missing.c_str(), "newer");
+  str2file_or_die(files.missing.c_str(), "st", true);
+  EXPECT_EQ(read_file(files.missing), "newerst");
+}
+
+TEST(zxsys2, a_text_of_any_size_is_written_whole) {
+  const Files files;
+  for (const std::size_t size : {65'535, 65'536, 65'537, 1'000'000}) {
+    const std::string bytes = some_bytes(size);
+    EXPECT_TRUE(str2file(files.to.c_str(), to_text(bytes)));
+    EXPECT_TRUE(read_file(files.to) == bytes) << size;
+    EXPECT_TRUE(str2file(files.to.c_str(), to_text(bytes), true));
+    EXPECT_TRUE(read_file(files.to) == bytes + bytes) << size;
+  }
+}
+
+TEST(zxsys2, lines_get_line_ends_unless_they_begin_with_a_line_feed) {
+  const Files files;
+  const struct {
+    Names lines;
+    const char* expected;
+  } rows[] = {
+      {{}, ""},
+      {{""}, "\r\n"},
+      {{"a"}, "a\r\n"},
+      {{"a", "", "b"}, "a\r\n\r\nb\r\n"},
+      {{"\n"}, "\n"},
+      {{"\na", "b"}, "\nab\r\n"},
+      {{"a\n", "\r\n"}, "a\n\r\n\r\n\r\n"},
+      {{" \n"}, " \n\r\n"},
+  };
+  for (const auto& row : rows) {
+    EXPECT_TRUE(lines2file(files.to.c_str(), Lines(row.lines)));
+    EXPECT_EQ(read_file(files.to), row.expected);
+  }
+}
+
+TEST(zxsys2, lines_are_added_to_a_file) {
+  const Files files;
+  EXPECT_TRUE(lines2file(files.missing.c_str(), Lines({"a"}), true));
+  EXPECT_TRUE(lines2file(files.missing.c_str(), Lines({"b", "c"}), true));
+  EXPECT_EQ(read_file(files.missing), "a\r\nb\r\nc\r\n");
+  lines2file_or_die(files.missing.c_str(), Lines({"d"}), true);
+  EXPECT_EQ(read_file(files.missing), "a\r\nb\r\nc\r\nd\r\n");
+  lines2file_or_die(files.missing.c_str(), Lines({"e"}));
+  EXPECT_EQ(read_file(files.missing), "e\r\n");
+}
+
+// The two ways to write a file: false on failure, and with an assertion.
+struct Writer {
+  const char* label;
+  std::function<bool(const char* name, bool append)> attempt;
+  std::function<void(const char* name, bool append)> or_die;
+};
+
+// They write some 200000 bytes, in four calls of the system.
+std::vector<Writer> writers() {
+  static const zxStr text = to_text(std::string(200'000, 'x'));
+  static const Lines lines(Names(2000, std::string(98, 'x')));
+  return {{"str2file",
+           [](const char* name, bool append) {
+             return str2file(name, text, append);
+           },
+           [](const char* name, bool append) {
+             str2file_or_die(name, text, append);
+           }},
+          {"lines2file",
+           [](const char* name, bool append) {
+             return lines2file(name, lines, append);
+           },
+           [](const char* name, bool append) {
+             lines2file_or_die(name, lines, append);
+           }}};
+}
+
+void expect_no_writing(const std::string& name) {
+  for (const Writer& writer : writers()) {
+    for (const bool append : {false, true}) {
+      SCOPED_TRACE(testing::Message()
+                   << writer.label << ' ' << name << ' ' << append);
+      EXPECT_FALSE(writer.attempt(name.c_str(), append));
+      EXPECT_ASSERTION(writer.or_die(name.c_str(), append), "zxsys2_data");
+      kit::with_failures_dropped([&] { writer.or_die(name.c_str(), append); });
+    }
+  }
+}
+
+TEST(zxsys2, what_cannot_be_opened_is_not_written) {
+  const Files files;
+  make_read_only(files.to);
+  for (const std::string& name :
+       {files.to, files.folder.path(), files.in_missing_folder, std::string()})
+    expect_no_writing(name);
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_full_device_is_told_by_those_who_write_to_it) {
+  const std::string device = kit::full_device();
+  if (device.empty()) GTEST_SKIP() << "no device that is full";
+  expect_no_writing(device);
+  EXPECT_FALSE(str2file(device.c_str(), "x"));  // at the close alone
+  EXPECT_TRUE(str2file(device.c_str(), ""));
+}
+
+TEST(zxsys2, each_failed_call_of_writing_is_told_and_the_file_closed) {
+  const Files files;
+  const struct {
+    Call call;
+    int n;
+  } rows[] = {{Call::open, 1},  {Call::write, 1}, {Call::write, 2},
+              {Call::write, 3}, {Call::write, 4}, {Call::close, 1}};
+  for (const Writer& writer : writers()) {
+    for (const auto& row : rows) {
+      SCOPED_TRACE(testing::Message()
+                   << writer.label << ' ' << kit::name_of(row.call) << row.n);
+      Faults faults;
+      faults.fail_nth(row.call, row.n, zxplat::k_err_disk_full);
+      EXPECT_FALSE(writer.attempt(files.to.c_str(), false));
+      EXPECT_EQ(faults.count(Call::close), row.call == Call::open ? 0 : 1);
+      EXPECT_TRUE(writer.attempt(files.to.c_str(), false));
+      EXPECT_EQ(faults.count(Call::write), row.call == Call::open ? 4
+                                           : row.call == Call::close
+                                               ? 8
+                                               : row.n + 4);
+    }
+  }
+}
+
+// ---- reading whole files
+
+std::string text_in(const std::string& name) {
+  zxStr text = "before";
+  EXPECT_TRUE(file2str(name.c_str(), text)) << name;
+  return text_of(text);
+}
+
+TEST(zxsys2, a_file_is_read_whole) {
+  const Files files;
+  const std::string odd("a\r\n\0\x1a\xff\n", 7);
+  write_file(files.to, odd);
+  EXPECT_EQ(text_in(files.to), odd);
+  for (const std::size_t size : {0, 1, 65'534, 65'535, 65'536, 65'537, 131'071,
+                                 131'072, 131'073, 1'000'000}) {
+    const std::string bytes = some_bytes(size);
+    write_file(files.to, bytes);
+    EXPECT_TRUE(text_in(files.to) == bytes) << size;
+  }
+}
+
+TEST(zxsys2, what_cannot_be_opened_leaves_an_empty_text) {
+  const Files files;
+  for (const std::string& name : {files.missing, files.in_missing_folder,
+                                  files.folder.path(), std::string()}) {
+    zxStr text = "before";
+    EXPECT_FALSE(file2str(name.c_str(), text)) << name;
+    EXPECT_TRUE(text.is_empty()) << name;
+  }
+}
+
+TEST(zxsys2, the_name_may_be_the_text_that_is_read_into) {
+  const Files files;
+  zxStr text = files.from.c_str();
+  EXPECT_TRUE(file2str(text, text));
+  EXPECT_EQ(text_of(text), Files::k_from_bytes);
+  Lines lines({files.from});
+  EXPECT_TRUE(file2lines(lines.get(0), lines));
+  ASSERT_EQ(lines.length(), 1);
+  EXPECT_EQ(text_of(lines.get(0)), Files::k_from_bytes);
+}
+
+TEST(zxsys2, a_device_and_what_only_seems_empty_are_read_to_their_end) {
+  EXPECT_EQ(text_in("nul"), "");
+  if (kit::on_windows()) return;
+  // The system makes these up, and gives them no size.
+  EXPECT_EQ(fs::file_size("/proc/version"), 0u);
+  EXPECT_EQ(text_in("\\proc\\version"), read_file("/proc/version"));
+}
+
+ZX_CASE(zxsys2_reads_its_input) {
+  init_zxlib_args(argc, argv);
+  zxStr text;
+  const int is_read = file2str("-", text) ? 1 : 0;
+  const int sum = crc16(text.c_str(), static_cast<std::size_t>(text.length()));
+  oprint("#:#:#", is_read, text.length(), sum);
+  return 0;
+}
+
+// The checksum bit by bit: polynomial 0x1021, the highest bit first, from
+// 0xFFFF on.
+std::uint32_t checksum(const std::string& bytes) {
+  std::uint32_t crc = 0xFFFF;
+  for (const char byte : bytes) {
+    for (int bit = 7; bit >= 0; --bit) {
+      const std::uint32_t in = (static_cast<unsigned char>(byte) >> bit) & 1;
+      const bool is_odd = ((crc >> 15) ^ in) != 0;
+      crc = (crc << 1) & 0xFFFF;
+      if (is_odd) crc ^= 0x1021;
+    }
+  }
+  return crc;
+}
+
+TEST(zxsys2, a_pipe_is_read_to_its_end) {
+  for (const std::size_t size : {0, 10, 65'536, 300'000}) {
+    kit::ProcessOptions options;
+    options.input = some_bytes(size);
+    EXPECT_EQ(kit::run_case("zxsys2_reads_its_input", {}, options).out,
+              "1:" + std::to_string(size) + ":" +
+                  std::to_string(checksum(options.input)));
+  }
+}
+
+TEST(zxsys2, a_failed_read_of_a_text_is_fatal) {
+  const Files files;
+  write_file(files.from, some_bytes(200'000));
+  for (const int n : {1, 2}) {
+    Faults faults;
+    faults.fail_nth(Call::read, n);
+    expect_failure(
+        [&] {
+          zxStr text;
+          file2str(files.from.c_str(), text);
+        },
+        1014, "read: " + quoted(files.from) + " operation failed", files.from);
+    faults.fail_nth(Call::read, n);
+    kit::with_failures_dropped([&] {
+      zxStr text;
+      EXPECT_FALSE(file2str(files.from.c_str(), text));
+    });
+  }
+}
+
+Names lines_in(const std::string& name) {
+  Lines lines({"before", "before"});
+  EXPECT_TRUE(file2lines(name.c_str(), lines)) << name;
+  Names texts;
+  for (const zxStr& line : lines) texts.push_back(text_of(line));
+  return texts;
+}
+
+TEST(zxsys2, lines_lose_one_line_end_each) {
+  const Files files;
+  const struct {
+    std::string bytes;
+    Names lines;
+  } rows[] = {
+      {"", {}},
+      {"a", {"a"}},
+      {"a\n", {"a"}},
+      {"a\r\nb\r\n", {"a", "b"}},
+      {"a\nb", {"a", "b"}},
+      {"\n", {""}},
+      {"\r\n\n", {"", ""}},
+      {"a\n\r\n\nb", {"a", "", "", "b"}},
+      {"a\r", {"a\r"}},
+      {"\r", {"\r"}},
+      {"a\r\r\n", {"a\r"}},
+      {"a\rb\n", {"a\rb"}},
+      {" a \t\n", {" a \t"}},
+      {std::string("a\0b\n\0\n", 6),
+       {std::string("a\0b", 3), std::string("\0", 1)}},
+      {"a\x1a\nb\n", {"a\x1a", "b"}},
+  };
+  for (const auto& row : rows) {
+    write_file(files.to, row.bytes);
+    EXPECT_EQ(lines_in(files.to), row.lines);
+  }
+}
+
+TEST(zxsys2, lines_that_were_written_are_read_again) {
+  const Files files;
+  Names lines;
+  for (int i = 0; i < 3000; ++i)
+    lines.push_back(std::string(static_cast<std::size_t>(i % 300), 'x'));
+  EXPECT_TRUE(lines2file(files.to.c_str(), Lines(lines)));
+  EXPECT_EQ(lines_in(files.to), lines);
+}
+
+Names settings_in(const std::string& name, const char* comment = nullptr) {
+  Lines lines({"before"});
+  EXPECT_TRUE(file2conflines(name.c_str(), lines, comment)) << name;
+  Names texts;
+  for (const zxStr& line : lines) texts.push_back(text_of(line));
+  return texts;
+}
+
+TEST(zxsys2, lines_of_settings_are_cut_trimmed_and_dropped_if_empty) {
+  const Files files;
+  const struct {
+    const char* bytes;
+    const char* comment;
+    Names lines;
+  } rows[] = {
+      {"", nullptr, {}},
+      {"a\r\n b \r\n\t\r\n\r\n", nullptr, {"a", "b"}},
+      {"# all\n  # all\na # part\n#", nullptr, {"a"}},
+      {"a#b#c", nullptr, {"a"}},
+      {"a \"#\" b\n'#'\n", nullptr, {"a \"", "'"}},
+      {"a ; b % c # d\n% a\n", ";%", {"a"}},
+      {"a # b\n", ";", {"a # b"}},
+      {"# a\n", "", {"# a"}},
+      {"a\r", nullptr, {"a"}},
+  };
+  for (const auto& row : rows) {
+    write_file(files.to, row.bytes);
+    EXPECT_EQ(settings_in(files.to, row.comment), row.lines) << row.bytes;
+  }
+}
+
+// The two operations that read lines.
+using LineReader = bool (*)(const char* name, zxQVA<zxStr>& lines);
+constexpr LineReader k_line_readers[] = {
+    [](const char* name, zxQVA<zxStr>& lines) {
+      return file2lines(name, lines);
+    },
+    [](const char* name, zxQVA<zxStr>& lines) {
+      return file2conflines(name, lines);
+    }};
+
+TEST(zxsys2, what_cannot_be_opened_leaves_no_lines) {
+  const Files files;
+  for (const LineReader read : k_line_readers) {
+    for (const std::string& name :
+         {files.missing, files.in_missing_folder, files.folder.path()}) {
+      Lines lines({"before"});
+      EXPECT_FALSE(read(name.c_str(), lines)) << name;
+      EXPECT_EQ(lines.length(), 0) << name;
+    }
+  }
+}
+
+TEST(zxsys2, a_failed_read_of_lines_is_fatal) {
+  const Files files;
+  write_file(files.from, "first\nsecond");
+  for (const LineReader read : k_line_readers) {
+    for (const int n : {1, 2}) {  // the second reads behind the last byte
+      Faults faults;
+      faults.fail_nth(Call::read, n);
+      expect_failure(
+          [&] {
+            zxQVA<zxStr> lines;
+            read(files.from.c_str(), lines);
+          },
+          1029, "gets: file error (" + files.from + ")", files.from);
+      faults.fail_nth(Call::read, n);
+      kit::with_failures_dropped([&] {
+        zxQVA<zxStr> lines;
+        EXPECT_FALSE(read(files.from.c_str(), lines));
+      });
+    }
+  }
+}
+
+// ---- copying between open files
+
+// What copy_stream() makes of `bytes` from position `start` on.
+std::string copied(const Files& files, const std::string& bytes,
+                   std::int32_t start, std::int32_t size) {
+  write_file(files.from, bytes);
+  zxBFile in;
+  in.open_or_die(files.from.c_str());
+  in.seek(start);
+  zxBFile out;
+  out.create(files.to.c_str());
+  out.puts("<");
+  copy_stream(in, out, size);
+  out.puts(">");
+  EXPECT_TRUE(out.close());
+  return read_file(files.to);
+}
+
+TEST(zxsys2, a_stream_is_copied_to_its_end_or_by_a_size) {
+  const Files files;
+  EXPECT_EQ(copied(files, "abcdef", 0, -1), "<abcdef>");
+  EXPECT_EQ(copied(files, "abcdef", 2, -1), "<cdef>");
+  EXPECT_EQ(copied(files, "abcdef", 6, -1), "<>");
+  EXPECT_EQ(copied(files, "abcdef", 0, 0), "<>");
+  EXPECT_EQ(copied(files, "abcdef", 1, 3), "<bcd>");
+  EXPECT_EQ(copied(files, "abcdef", 0, 6), "<abcdef>");
+}
+
+TEST(zxsys2, blocks_of_a_stream_are_copied_in_their_order) {
+  const Files files;
+  const std::string bytes = some_bytes(200'000);
+  for (const std::int32_t size :
+       {49'151, 49'152, 49'153, 98'304, 98'305, 199'999}) {
+    const std::string part = bytes.substr(1, static_cast<std::size_t>(size));
+    EXPECT_TRUE(copied(files, bytes, 1, size) == "<" + part + ">") << size;
+    EXPECT_TRUE(copied(files, "-" + part, 1, -1) == "<" + part + ">") << size;
+  }
+}
+
+TEST(zxsys2, a_stream_that_has_too_few_bytes_is_fatal) {
+  const Files files;
+  for (const std::int32_t size : {13, 49'152, 49'153, 0x7FFFFFFF}) {
+    expect_failure([&] { copied(files, "the new text", 0, size); }, 1014,
+                   "read: " + quoted(files.from) + " operation failed",
+                   files.from);
+    kit::with_failures_dropped(
+        [&] { EXPECT_EQ(copied(files, "the new text", 0, size), "<>"); });
+  }
+  zxBFile in;
+  in.open_or_die(files.from.c_str());
+  zxBFile out;
+  out.create(files.to.c_str());
+  EXPECT_ASSERTION(copy_stream(in, out, -2), "zxsys2_data");
+}
+
+// ---- adding a file to another
+
+TEST(zxsys2, a_file_is_added_to_the_end_of_another) {
+  const Files files;
+  append_file(files.from.c_str(), files.to.c_str());
+  const std::string both = std::string(Files::k_to_bytes) + Files::k_from_bytes;
+  EXPECT_EQ(read_file(files.to), both);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  append_file(files.from.c_str(), files.missing.c_str());
+  EXPECT_EQ(read_file(files.missing), Files::k_from_bytes);
+  const std::string bytes = some_bytes(100'000);
+  write_file(files.from, bytes);
+  append_file(files.from.c_str(), files.to.c_str());
+  EXPECT_TRUE(read_file(files.to) == both + bytes);
+}
+
+void expect_no_addition(const Files& files, const std::string& to) {
+  SCOPED_TRACE(to);
+  const auto add = [&] { append_file(files.from.c_str(), to.c_str()); };
+  EXPECT_ASSERTION(add(), "zxsys2_data");
+  kit::with_failures_dropped(add);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+TEST(zxsys2, a_file_is_not_added_to_itself) {
+  const Files files;
+  const std::string& folder = files.folder.path();
+  expect_no_addition(files, files.from);
+  expect_no_addition(files, folder + "\\FROM");
+  expect_no_addition(files, folder + "\\.\\from");
+  const std::string twin = files.folder.file("twin");
+  std::error_code error;
+  fs::create_hard_link(files.from, twin, error);
+  if (!error) expect_no_addition(files, twin);
+  if (kit::make_link(files.from, files.folder.file("link")))
+    expect_no_addition(files, files.folder.file("link"));
+}
+
+TEST(zxsys2, each_failure_of_adding_has_its_message) {
+  const Files files;
+  make_read_only(files.to);
+  const auto expect_no_source = [&](const std::string& from) {
+    const auto add = [&] { append_file(from.c_str(), files.missing.c_str()); };
+    expect_failure(add, 1002,
+                   "open: Can't open file " + quoted(from) + " for reading",
+                   from);
+    kit::with_failures_dropped(add);
+  };
+  expect_no_source(files.in_missing_folder);
+  expect_no_source(files.missing);
+  expect_no_source(files.folder.path());
+  for (const std::string& to :
+       {files.to, files.folder.path(), files.in_missing_folder}) {
+    const auto add = [&] { append_file(files.from.c_str(), to.c_str()); };
+    expect_failure(add, 1004,
+                   "create: Can't open file " + quoted(to) + " for writing",
+                   to);
+    kit::with_failures_dropped(add);
+  }
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, each_failed_call_of_adding_has_its_message) {
+  const Files files;
+  write_file(files.from, some_bytes(200'000));
+  const struct {
+    Call call;
+    int n;
+    int number;
+    std::string message;
+    std::string name;
+  } rows[] = {
+      {Call::read, 1, 1014, "read: '%' operation failed", files.from},
+      {Call::read, 2, 1014, "read: '%' operation failed", files.from},
+      {Call::write, 1, 1016, "write: failed on '%'", files.to},
+      {Call::close, 1, 1010, "close: '%' failed", files.from},
+      {Call::close, 2, 1010, "close: '%' failed", files.to},
+  };
+  for (const auto& row : rows) {
+    std::string message = row.message;
+    message.replace(message.find('%'), 1, row.name);
+    const auto add = [&] { append_file(files.from.c_str(), files.to.c_str()); };
+    Faults faults;
+    faults.fail_nth(row.call, row.n);
+    expect_failure(add, row.number, message, row.name);
+    faults.fail_nth(row.call, row.n);
+    kit::with_failures_dropped(add);
+    EXPECT_TRUE(read_file(files.to).starts_with(Files::k_to_bytes));
+  }
+}
+
+// ---- comparing
+
+std::int32_t compared(const Files& files) {
+  const std::int32_t result =
+      compare_files(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(compare_files(files.to.c_str(), files.from.c_str()), result);
+  EXPECT_EQ(same_files(files.from.c_str(), files.to.c_str()), result < 2);
+  return result;
+}
+
+TEST(zxsys2, files_that_hold_the_same_differ_in_whole_seconds_alone) {
+  if (kit::on_windows()) GTEST_SKIP() << "tests can set no parts of seconds";
+  const Files files;
+  for (const std::size_t size : {0, 1, 24'576, 100'000}) {
+    write_file(files.from, some_bytes(size));
+    write_file(files.to, some_bytes(size));
+    const std::chrono::sys_seconds second{std::chrono::seconds(1'000'000'000)};
+    const auto time = std::chrono::file_clock::from_sys(second);
+    const auto part = std::chrono::milliseconds(999);
+    fs::last_write_time(files.from, time);
+    fs::last_write_time(files.to, time);
+    EXPECT_EQ(compared(files), 0);
+    fs::last_write_time(files.to, time + part);
+    EXPECT_EQ(compared(files), 0);
+    fs::last_write_time(files.to, time + std::chrono::seconds(1));
+    EXPECT_EQ(compared(files), 1);
+    fs::last_write_time(files.from, time + part);
+    EXPECT_EQ(compared(files), 1);
+  }
+}
+
+TEST(zxsys2, the_times_of_two_files_decide_when_their_bytes_agree) {
+  const Files files;
+  write_file(files.to, Files::k_from_bytes);
+  fs::last_write_time(files.to, fs::last_write_time(files.from));
+  EXPECT_EQ(compared(files), 0);
+  set_time(files.to, 10);
+  EXPECT_EQ(compared(files), 1);
+}
+
+TEST(zxsys2, files_differ_in_any_byte) {
+  const Files files;
+  const std::string bytes = some_bytes(100'000);
+  write_file(files.from, bytes);
+  for (const std::size_t place :
+       {0, 1, 24'575, 24'576, 24'577, 49'152, 99'999}) {
+    std::string other = bytes;
+    other[place] = static_cast<char>(other[place] ^ 1);
+    write_file(files.to, other);
+    fs::last_write_time(files.to, fs::last_write_time(files.from));
+    EXPECT_EQ(compared(files), 2) << place;
+  }
+}
+
+TEST(zxsys2, files_of_two_sizes_and_what_is_no_file_are_unlike) {
+  const Files files;
+  EXPECT_EQ(compared(files), 3);
+  write_file(files.to, std::string(Files::k_from_bytes) + "!");
+  EXPECT_EQ(compared(files), 3);
+  write_file(files.to, "");
+  EXPECT_EQ(compared(files), 3);
+  for (const std::string& other :
+       {files.missing, files.in_missing_folder, files.folder.path()}) {
+    EXPECT_EQ(compare_files(files.from.c_str(), other.c_str()), 3) << other;
+    EXPECT_EQ(compare_files(other.c_str(), files.from.c_str()), 3) << other;
+    EXPECT_EQ(compare_files(other.c_str(), other.c_str()), 3) << other;
+    EXPECT_FALSE(same_files(other.c_str(), other.c_str())) << other;
+  }
+}
+
+TEST(zxsys2, a_file_is_the_same_as_itself) {
+  const Files files;
+  EXPECT_EQ(compare_files(files.from.c_str(), files.from.c_str()), 0);
+  EXPECT_TRUE(same_files(files.from.c_str(), files.from.c_str()));
+}
+
+TEST(zxsys2, a_failed_read_of_a_comparison_is_fatal_and_then_they_differ) {
+  const Files files;
+  write_file(files.to, Files::k_from_bytes);
+  // Each file is read up to its end before the other.
+  for (const int n : {1, 2, 3, 4}) {
+    SCOPED_TRACE(n);
+    const std::string& name = n <= 2 ? files.from : files.to;
+    const auto compare = [&] {
+      return compare_files(files.from.c_str(), files.to.c_str());
+    };
+    Faults faults;
+    faults.fail_nth(Call::read, n);
+    expect_failure([&] { compare(); }, 1014,
+                   "read: " + quoted(name) + " operation failed", name);
+    faults.fail_nth(Call::read, n);
+    kit::with_failures_dropped([&] { EXPECT_EQ(compare(), 2); });
+  }
+}
+
+// The number for these digits is well known.
+TEST(zxsys2, the_model_of_the_checksum_is_the_right_one) {
+  EXPECT_EQ(checksum("123456789"), 0x29B1u);
+}
+
+TEST(zxsys2, the_checksum_is_that_of_all_bytes) {
+  const Files files;
+  for (const std::size_t size :
+       {0, 1, 9, 24'575, 24'576, 24'577, 49'152, 100'000}) {
+    const std::string bytes = some_bytes(size);
+    write_file(files.from, bytes);
+    EXPECT_EQ(file_crc(files.from.c_str()), checksum(bytes)) << size;
+  }
+  write_file(files.from, "123456789");
+  EXPECT_EQ(file_crc(files.from.c_str()), 0x29B1u);
+}
+
+TEST(zxsys2, each_failure_of_a_checksum_has_its_message) {
+  const Files files;
+  for (const std::string& name : {files.missing, files.folder.path()}) {
+    expect_failure([&] { file_crc(name.c_str()); }, 1002,
+                   "open: Can't open file " + quoted(name) + " for reading",
+                   name);
+    kit::with_failures_dropped(
+        [&] { EXPECT_EQ(file_crc(name.c_str()), checksum("")); });
+  }
+  const auto sum = [&] { file_crc(files.from.c_str()); };
+  Faults faults;
+  for (const int n : {1, 2}) {  // the second reads behind the last byte
+    faults.fail_nth(Call::read, n);
+    expect_failure(sum, 1014,
+                   "read: " + quoted(files.from) + " operation failed",
+                   files.from);
+    faults.fail_nth(Call::read, n);
+    kit::with_failures_dropped(sum);
+  }
+  faults.fail_nth(Call::close, 1);
+  expect_failure(sum, 1010, "close: " + quoted(files.from) + " failed",
+                 files.from);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+// ---- deleting
 
 TEST(zxsys2, deleting_in_three_ways_deletes) {
   const struct {
@@ -502,11 +1182,6 @@ TEST(zxsys2, what_cannot_be_deleted_is_told) {
 
 // ---- copying
 
-void set_time(const std::string& path, int hours_ago) {
-  fs::last_write_time(
-      path, fs::file_time_type::clock::now() - std::chrono::hours(hours_ago));
-}
-
 TEST(zxsys2, a_copy_has_the_bytes_the_time_and_the_permissions) {
   const Files files;
   set_time(files.from, 1000);
@@ -544,9 +1219,7 @@ TEST(zxsys2, copies_of_every_size_are_complete) {
   const Files files;
   for (const std::size_t size :
        {0, 1, 49'151, 49'152, 49'153, 65'536, 98'304, 98'305, 1'000'000}) {
-    std::string bytes(size, '\0');
-    for (std::size_t i = 0; i < size; ++i)
-      bytes[i] = static_cast<char>((i + i / 255) & 0xFF);
+    const std::string bytes = some_bytes(size);
     write_file(files.from, bytes);
     cpfile(files.from.c_str(), files.to.c_str());
     EXPECT_TRUE(read_file(files.to) == bytes) << size;
@@ -620,60 +1293,113 @@ constexpr CopyFault k_copy_faults[] = {
     {Call::open, 1, 1002, "open: Can't open file '%' for reading", true},
     {Call::open, 2, 1004, "create: Can't open file '%' for writing", false},
     {Call::read, 1, 1014, "read: '%' operation failed", true},
+    {Call::read, 2, 1014, "read: '%' operation failed", true},
     {Call::write, 1, 1016, "write: failed on '%'", false},
-    {Call::flush, 1, 1020, "flush: '%' operation failed", false},
+    {Call::write, 2, 1016, "write: failed on '%'", false},
     {Call::close, 1, 1010, "close: '%' failed", true},
     {Call::close, 2, 1010, "close: '%' failed", false},
 };
+
+// Only where the source is to go does the copy have to be on the device.
+constexpr CopyFault k_device_fault = {Call::flush, 1, 1020,
+                                      "flush: '%' operation failed", false};
 
 std::string filled(std::string text, const std::string& argument) {
   return text.replace(text.find('%'), 1, argument);
 }
 
-// Runs `copy` with each of the faults; each time `old` must keep its bytes.
-// The source is large enough to be written in its middle.
-void expect_copy_faults(const Files& files, const std::string& target,
-                        const std::function<void()>& copy) {
-  const std::string bytes(200'000, 'x');
+// The names of temporary copies in a folder.
+Names copies_in(const std::string& folder) {
+  Names names = names_in(folder);
+  std::erase_if(
+      names, [](const std::string& name) { return !name.ends_with(".cpy"); });
+  return names;
+}
+
+// Runs `copy` with a fault: the old target must keep its bytes, and so must
+// the source.  What the copy had come to lies beside the target.
+void expect_copy_fault(const CopyFault& fault, const Files& files,
+                       const std::string& target,
+                       const std::function<void()>& copy) {
+  SCOPED_TRACE(testing::Message()
+               << kit::name_of(fault.call) << ' ' << fault.n);
+  const std::string bytes(200'000, 'x');  // written in the middle as well
   write_file(files.from, bytes);
-  for (const CopyFault& fault : k_copy_faults) {
-    SCOPED_TRACE(testing::Message()
-                 << kit::name_of(fault.call) << ' ' << fault.n);
-    write_file(target, Files::k_to_bytes);
-    const std::uint32_t tried = names_tried(files.folder);
-    const Ticks zero(0);
-    const std::string copy_name =
-        text_of(with_slash(dir_part(target.c_str()))) + "tmp" +
-        std::to_string(tried + 1) + ".cpy";
-    const std::string& name = fault.names_source ? files.from : copy_name;
+  write_file(target, Files::k_to_bytes);
+  const std::string folder = fs::path(target).parent_path().string();
+  const std::uint32_t tried = names_tried(files.folder);
+  const Ticks zero(0);
+  const std::string copy_name = "tmp" + std::to_string(tried + 1) + ".cpy";
+  const std::string shown = text_of(dir_part(target.c_str())) + copy_name;
+  const std::string& name = fault.names_source ? files.from : shown;
+  {
     Faults faults;
     faults.fail_nth(fault.call, fault.n, zxplat::k_err_disk_full);
     expect_failure(copy, fault.number, filled(fault.message, name), name);
-    EXPECT_EQ(read_file(target), Files::k_to_bytes);
-    EXPECT_TRUE(read_file(files.from) == bytes);
   }
+  EXPECT_EQ(read_file(target), Files::k_to_bytes);
+  EXPECT_TRUE(read_file(files.from) == bytes);
+  const bool is_begun = fault.call != Call::open;
+  EXPECT_EQ(copies_in(folder), is_begun ? Names{copy_name} : Names());
+  for (const std::string& left : copies_in(folder))
+    fs::remove(fs::path(folder) / left);
 }
 
 TEST(zxsys2, a_copy_that_fails_half_way_leaves_the_old_target) {
   const Files files;
-  expect_copy_faults(files, files.to,
-                     [&] { cpfile(files.from.c_str(), files.to.c_str()); });
+  for (const CopyFault& fault : k_copy_faults)
+    expect_copy_fault(fault, files, files.to,
+                      [&] { cpfile(files.from.c_str(), files.to.c_str()); });
+}
+
+TEST(zxsys2, a_copy_is_not_forced_to_the_device) {
+  const Files files;
+  const Faults calls;
+  cpfile(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(calls.count(Call::flush), 0);
+}
+
+// Runs `copy` with a fault that is dropped: nothing is replaced or lost.
+void expect_dropped_copy_fault(const CopyFault& fault, const Files& files,
+                               const std::string& target,
+                               const std::function<void()>& copy) {
+  // The bytes are all there by the time that the source is closed.
+  if (fault.call == Call::close && fault.n == 1) return;
+  SCOPED_TRACE(testing::Message()
+               << kit::name_of(fault.call) << ' ' << fault.n);
+  const std::string bytes(200'000, 'x');
+  write_file(files.from, bytes);
+  write_file(target, Files::k_to_bytes);
+  {
+    Faults faults;
+    faults.fail_nth(fault.call, fault.n);
+    kit::with_failures_dropped(copy);
+  }
+  EXPECT_EQ(read_file(target), Files::k_to_bytes);
+  EXPECT_TRUE(read_file(files.from) == bytes);
 }
 
 TEST(zxsys2, behind_dropped_failures_an_incomplete_copy_replaces_nothing) {
   const Files files;
-  const std::string bytes(200'000, 'x');
-  write_file(files.from, bytes);
-  for (const CopyFault& fault : k_copy_faults) {
-    if (fault.call == Call::close) continue;  // the bytes are there by then
-    SCOPED_TRACE(kit::name_of(fault.call));
-    Faults faults;
-    faults.fail_nth(fault.call, fault.n);
-    kit::with_failures_dropped(
-        [&] { cpfile(files.from.c_str(), files.to.c_str()); });
-    EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
-    EXPECT_TRUE(read_file(files.from) == bytes);
-  }
+  for (const CopyFault& fault : k_copy_faults)
+    expect_dropped_copy_fault(fault, files, files.to, [&] {
+      cpfile(files.from.c_str(), files.to.c_str());
+    });
+}
+
+// What a copy may be read by while it is no more than begun.
+TEST(zxsys2, a_copy_is_its_owners_alone_until_it_is_complete) {
+  if (kit::on_windows()) GTEST_SKIP() << "every file can be read here";
+  const Files files;
+  fs::permissions(files.from, fs::perms::owner_read | fs::perms::owner_write);
+  Faults faults;
+  faults.fail_nth(Call::write, 1);
+  kit::with_failures_dropped(
+      [&] { cpfile(files.from.c_str(), files.to.c_str()); });
+  const Names left = copies_in(files.folder.path());
+  ASSERT_EQ(left.size(), 1u);
+  EXPECT_EQ(fs::status(files.folder.file(left[0])).permissions(),
+            fs::perms::owner_read | fs::perms::owner_write);
 }
 
 TEST(zxsys2, a_copy_that_cannot_get_its_name_is_deleted) {
@@ -685,6 +1411,45 @@ TEST(zxsys2, a_copy_that_cannot_get_its_name_is_deleted) {
                  files.to);
   EXPECT_EQ(names_in(files.folder.path()), (Names{"from"}));
   EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+// The copy has the permissions of its source by then.
+TEST(zxsys2, a_copy_that_may_not_be_written_is_deleted_all_the_same) {
+  const Files files;
+  make_read_only(files.from);
+  {
+    Faults faults;
+    faults.fail_nth(Call::rename, 1, zxplat::k_err_denied);
+    expect_failure([&] { cpfile(files.from.c_str(), files.missing.c_str()); },
+                   1038,
+                   "cpfile: failed to rename tmp to " + quoted(files.missing),
+                   files.missing);
+  }
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+  make_read_only(files.to);
+  for (const std::string& target : {files.to, files.from}) {
+    expect_failure([&] { cpfile(files.from.c_str(), target.c_str()); }, 1027,
+                   "delefile: cant del " + quoted(target), target);
+    EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+  }
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+}
+
+TEST(zxsys2, a_copy_whose_time_cannot_be_set_fails_an_assertion) {
+  const Files files;
+  // The source goes while it is being closed.
+  static const Files* now;
+  now = &files;
+  Faults faults;
+  zxplat::files.close = [](zxplat::Fd fd) {
+    const bool closed = zxplat::system_files.close(fd);
+    fs::remove(now->from);
+    return closed;
+  };
+  expect_assertion_at([&] { cpfile(files.from.c_str(), files.to.c_str()); },
+                      "zxsys2:174");
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
 }
 
 TEST(zxsys2, the_reason_of_a_failed_rename_of_a_copy_outlives_its_deletion) {
@@ -863,6 +1628,24 @@ TEST(zxsys2, a_rename_that_cannot_cross_becomes_a_copy) {
   }
 }
 
+TEST(zxsys2, a_copy_in_place_of_a_rename_is_forced_to_the_device) {
+  const Files files;
+  Faults faults;
+  faults.fail_nth(Call::rename, 1, zxplat::k_err_other_device);
+  move_file(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(faults.count(Call::flush), 1);
+}
+
+TEST(zxsys2, a_source_whose_copy_is_not_on_the_device_stays) {
+  const Files files;
+  Faults faults;
+  faults.fail_nth(Call::rename, 1, zxplat::k_err_other_device);
+  faults.fail_nth(Call::flush, 1);
+  kit::with_failures_dropped(
+      [&] { move_file(files.from.c_str(), files.to.c_str()); });
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
 TEST(zxsys2, a_copy_in_place_of_a_rename_that_gets_no_name_keeps_the_source) {
   for (const int error : k_errors_of_devices) {
     SCOPED_TRACE(error);
@@ -951,8 +1734,13 @@ TEST(zxsys2, across_devices_the_old_target_outlives_every_failed_copy) {
   if (!device.is_there()) GTEST_SKIP() << "there is one device only";
   const Files files;
   const std::string target = device.file("target");
-  expect_copy_faults(files, target,
-                     [&] { move_file(files.from.c_str(), target.c_str()); });
+  const auto move = [&] { move_file(files.from.c_str(), target.c_str()); };
+  for (const CopyFault& fault : k_copy_faults)
+    expect_copy_fault(fault, files, target, move);
+  expect_copy_fault(k_device_fault, files, target, move);
+  for (const CopyFault& fault : k_copy_faults)
+    expect_dropped_copy_fault(fault, files, target, move);
+  expect_dropped_copy_fault(k_device_fault, files, target, move);
 }
 
 TEST(zxsys2, across_devices_an_undeletable_target_is_fatal_and_stays) {
