@@ -1339,10 +1339,9 @@ void expect_copy_fault(const CopyFault& fault, const Files& files,
   }
   EXPECT_EQ(read_file(target), Files::k_to_bytes);
   EXPECT_TRUE(read_file(files.from) == bytes);
-  const bool is_begun = fault.call != Call::open;
-  EXPECT_EQ(copies_in(folder), is_begun ? Names{copy_name} : Names());
-  for (const std::string& left : copies_in(folder))
-    fs::remove(fs::path(folder) / left);
+  const Names copies = copies_in(folder);
+  EXPECT_EQ(std::count(copies.begin(), copies.end(), copy_name),
+            fault.call == Call::open ? 0 : 1);
 }
 
 TEST(zxsys2, a_copy_that_fails_half_way_leaves_the_old_target) {
@@ -1768,6 +1767,690 @@ TEST(zxsys2, across_devices_a_missing_source_leaves_the_target) {
       "open: Can't open file " + quoted(files.missing) + " for reading",
       files.missing);
   EXPECT_EQ(read_file(target), Files::k_to_bytes);
+}
+
+TEST(zxsys2, a_file_is_copied_to_another_device) {
+  const OtherDevice device;
+  if (!device.is_there()) GTEST_SKIP() << "there is one device only";
+  const Files files;
+  const std::string target = device.file("target");
+  const Faults calls;
+  cpfile(files.from.c_str(), target.c_str());
+  EXPECT_EQ(calls.count(Call::flush), 0);
+  EXPECT_EQ(read_file(target), Files::k_from_bytes);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  EXPECT_EQ(names_in(device.path()), (Names{"target"}));
+}
+
+// A disk of 64 kilobytes, for one test.
+class SmallDisk {
+ public:
+  SmallDisk() {
+    if (kit::on_windows()) return;
+    is_mounted = kit::run_process({"mount", "-t", "tmpfs", "-o", "size=64k",
+                                   "tmpfs", folder.path()})
+                     .exit_code == 0;
+  }
+  SmallDisk(const SmallDisk&) = delete;
+  SmallDisk& operator=(const SmallDisk&) = delete;
+  ~SmallDisk() {
+    if (is_mounted) kit::run_process({"umount", folder.path()});
+  }
+
+  bool is_there() const { return is_mounted; }
+  std::string file(const std::string& name) const { return folder.file(name); }
+
+ private:
+  TempDir folder;
+  bool is_mounted = false;
+};
+
+TEST(zxsys2, a_full_disk_loses_neither_source_nor_target) {
+  const SmallDisk disk;
+  if (!disk.is_there()) GTEST_SKIP() << "no disk can be mounted here";
+  const Files files;
+  const std::string bytes = some_bytes(200'000);
+  const std::string target = disk.file("target");
+  write_file(files.from, bytes);
+  write_file(target, Files::k_to_bytes);
+  for (const auto operation : {cpfile, move_file}) {
+    const auto run = [&] { operation(files.from.c_str(), target.c_str()); };
+    const kit::Failure failure = kit::failure_of(run);
+    EXPECT_TRUE(failure.message.starts_with("1016: write: failed on "))
+        << failure.message;
+    kit::with_failures_dropped(run);
+    EXPECT_TRUE(read_file(files.from) == bytes);
+    EXPECT_EQ(read_file(target), Files::k_to_bytes);
+  }
+}
+
+TEST(zxsys2, a_full_disk_is_told_by_those_who_write_to_it) {
+  const SmallDisk disk;
+  if (!disk.is_there()) GTEST_SKIP() << "no disk can be mounted here";
+  expect_no_writing(disk.file("new"));
+  const WorkingIn there(disk.file(""));
+  EXPECT_FALSE(space_for("."));  // 64 kilobytes are too few anyway
+}
+
+// ---- the time of a file
+
+TEST(zxsys2, a_file_gets_the_time_of_another) {
+  const Files files;
+  set_time(files.from, 1000);
+  copy_time(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(fs::last_write_time(files.to), fs::last_write_time(files.from));
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+}
+
+TEST(zxsys2, a_time_that_cannot_be_copied_fails_an_assertion) {
+  const Files files;
+  const auto expect_at = [](const std::string& from, const std::string& to,
+                            const char* place) {
+    const auto copy = [&] { copy_time(from.c_str(), to.c_str()); };
+    expect_assertion_at(copy, place);
+    kit::with_failures_dropped(copy);
+  };
+  expect_at(files.missing, files.to, "zxsys2:174");
+  expect_at(files.in_missing_folder, files.to, "zxsys2:174");
+  expect_at(files.missing, files.missing, "zxsys2:174");
+  expect_at(files.from, files.missing, "zxsys2:177");
+  expect_at(files.from, files.in_missing_folder, "zxsys2:177");
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+// ---- files by a pattern
+
+// A folder with three files, one more in a folder below, and an empty one.
+class Tree {
+ public:
+  Tree() {
+    fs::create_directories(source + "/below");
+    fs::create_directory(target);
+    for (const char* name : {"a.txt", "b.txt", "c.dat", "below/d.txt"})
+      write_file(source + "/" + name, name);
+  }
+
+  Names sources() const { return names_in(source); }
+  Names targets() const { return names_in(target); }
+
+  const TempDir folder;
+  const std::string source = folder.file("source");
+  const std::string target = folder.file("target");
+  const std::string texts = source + "\\*.txt";
+  const std::string all_texts = source + "\\\\*.txt";
+};
+
+TEST(zxsys2, files_of_a_pattern_are_deleted) {
+  const Tree tree;
+  delfiles((tree.source + "\\*.none").c_str());
+  EXPECT_EQ(tree.sources().size(), 4u);
+  delfiles(tree.texts.c_str());
+  EXPECT_EQ(tree.sources(), (Names{"below", "c.dat"}));
+  delfiles(tree.all_texts.c_str());
+  EXPECT_TRUE(names_in(tree.source + "/below").empty());
+  delfiles((tree.source + "\\c.dat").c_str());
+  EXPECT_EQ(tree.sources(), (Names{"below"}));
+  delfiles((tree.source + "\\missing").c_str());
+}
+
+TEST(zxsys2, a_file_of_a_pattern_that_cannot_be_deleted_is_fatal) {
+  const Tree tree;
+  make_read_only(tree.source + "/a.txt");
+  const kit::Failure failure =
+      kit::failure_of([&] { delfiles(tree.texts.c_str()); });
+  EXPECT_TRUE(failure.message.starts_with("1027: delefile: cant del '"))
+      << failure.message;
+  EXPECT_TRUE(failure.message.ends_with("a.txt'")) << failure.message;
+  kit::with_failures_dropped([&] { delfiles(tree.texts.c_str()); });
+  EXPECT_EQ(tree.sources(), (Names{"a.txt", "below", "c.dat"}));
+}
+
+TEST(zxsys2, files_of_a_pattern_are_copied) {
+  const Tree tree;
+  cpfiles2dir((tree.source + "\\*.none").c_str(), tree.target.c_str());
+  EXPECT_EQ(tree.targets(), Names());
+  cpfiles2dir(tree.texts.c_str(), tree.target.c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt"}));
+  EXPECT_EQ(read_file(tree.target + "/b.txt"), "b.txt");
+  cpfiles2dir((tree.source + "\\c.dat").c_str(), (tree.target + "\\").c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt", "c.dat"}));
+  cpfiles2dir(tree.all_texts.c_str(), (tree.target + "/").c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt", "c.dat", "d.txt"}));
+  EXPECT_EQ(tree.sources(), (Names{"a.txt", "b.txt", "below", "c.dat"}));
+}
+
+TEST(zxsys2, files_of_a_pattern_are_moved) {
+  const Tree tree;
+  write_file(tree.target + "/a.txt", "old");
+  mvfiles2dir(tree.texts.c_str(), tree.target.c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt"}));
+  EXPECT_EQ(read_file(tree.target + "/a.txt"), "a.txt");
+  EXPECT_EQ(tree.sources(), (Names{"below", "c.dat"}));
+  mvfiles2dir(tree.all_texts.c_str(), tree.target.c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt", "d.txt"}));
+}
+
+TEST(zxsys2, files_are_copied_into_the_folder_that_they_are_in) {
+  const Tree tree;
+  for (int i = 0; i < 200; ++i)
+    write_file(tree.source + "/" + std::to_string(i) + ".txt", "x");
+  const Names before = tree.sources();
+  cpfiles2dir(tree.texts.c_str(), tree.source.c_str());
+  EXPECT_EQ(tree.sources(), before);
+  EXPECT_EQ(read_file(tree.source + "/a.txt"), "a.txt");
+}
+
+TEST(zxsys2, files_are_not_moved_into_the_folder_that_they_are_in) {
+  const Tree tree;
+  const auto move = [&] {
+    mvfiles2dir(tree.texts.c_str(), tree.source.c_str());
+  };
+  expect_assertion_at(move, "zxsys2:287");
+  kit::with_failures_dropped(move);
+  EXPECT_EQ(tree.sources().size(), 4u);
+  EXPECT_EQ(read_file(tree.source + "/a.txt"), "a.txt");
+}
+
+TEST(zxsys2, files_by_a_pattern_need_a_directory) {
+  const Tree tree;
+  const std::string file = tree.source + "/c.dat";
+  for (const std::string& dir :
+       {tree.folder.file("none"), file, file + "\\", std::string()}) {
+    SCOPED_TRACE(dir);
+    const auto copy = [&] { cpfiles2dir(tree.texts.c_str(), dir.c_str()); };
+    const auto move = [&] { mvfiles2dir(tree.texts.c_str(), dir.c_str()); };
+    expect_failure(copy, 1034, "cpfiles2dir: bad dir name " + quoted(dir), dir);
+    expect_failure(move, 1035, "mvfiles2dir: bad dir name " + quoted(dir), dir);
+    kit::with_failures_dropped(copy);
+    kit::with_failures_dropped(move);
+  }
+  EXPECT_EQ(tree.sources(), (Names{"a.txt", "b.txt", "below", "c.dat"}));
+  EXPECT_EQ(tree.targets(), Names());
+}
+
+TEST(zxsys2, a_plain_name_of_no_file_is_fatal_to_copy_or_move) {
+  const Tree tree;
+  const std::string missing = tree.source + "\\none";
+  const std::string message =
+      "open: Can't open file " + quoted(missing) + " for reading";
+  for (const auto operation : {cpfiles2dir, mvfiles2dir}) {
+    const auto run = [&] { operation(missing.c_str(), tree.target.c_str()); };
+    expect_failure(run, 1002, message, missing);
+    kit::with_failures_dropped(run);
+  }
+  EXPECT_EQ(tree.targets(), Names());
+}
+
+// ---- making and deleting folders
+
+TEST(zxsys2, a_directory_is_made_whatever_separators_end_its_name) {
+  const TempDir folder;
+  Names expected;
+  for (const char* ending : {"", "\\", "/", "\\\\", "//", "/\\/\\"}) {
+    const std::string name = "d" + std::to_string(expected.size());
+    expected.push_back(name);
+    EXPECT_TRUE(try_createdir((folder.path() + "\\" + name + ending).c_str()))
+        << ending;
+  }
+  createdir((folder.path() + "\\last\\").c_str());
+  expected.push_back("last");
+  EXPECT_EQ(names_in(folder.path()), expected);
+}
+
+TEST(zxsys2, a_directory_that_cannot_be_made_is_told) {
+  const Files files;
+  const std::string inner = files.folder.path() + "/inner";
+  fs::create_directory(inner);
+  for (const std::string& name :
+       {files.from, inner, inner + "\\", files.in_missing_folder,
+        files.from + "\\new", std::string()}) {
+    SCOPED_TRACE(name);
+    EXPECT_FALSE(try_createdir(name.c_str()));
+    const auto create = [&] { createdir(name.c_str()); };
+    expect_failure(create, 1030, "createdir: failed " + quoted(name), name);
+    kit::with_failures_dropped(create);
+  }
+  Faults faults;
+  faults.fail_all(Call::make_folder, zxplat::k_err_denied);
+  EXPECT_FALSE(try_createdir(files.missing.c_str()));
+  expect_failure([&] { createdir(files.missing.c_str()); }, 1030,
+                 "createdir: failed " + quoted(files.missing), files.missing);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "inner", "to"}));
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+TEST(zxsys2, an_empty_directory_is_deleted) {
+  const TempDir folder;
+  fs::create_directory(folder.file("a"));
+  fs::create_directory(folder.file("b"));
+  deldir(folder.file("a").c_str());
+  deldir((folder.path() + "\\b\\").c_str());
+  EXPECT_EQ(names_in(folder.path()), Names());
+}
+
+TEST(zxsys2, a_directory_that_cannot_be_deleted_is_fatal) {
+  const Files files;
+  const std::string inner = files.folder.path() + "/inner";
+  fs::create_directory(inner);
+  const auto expect_stays = [](const std::string& name) {
+    SCOPED_TRACE(name);
+    const auto remove = [&] { deldir(name.c_str()); };
+    expect_failure(remove, 1031, "del dir: failed " + quoted(name), name);
+    kit::with_failures_dropped(remove);
+  };
+  for (const std::string& name :
+       {files.folder.path(), files.from, files.missing, files.in_missing_folder,
+        std::string()})
+    expect_stays(name);
+  Faults faults;
+  faults.fail_all(Call::remove_folder, zxplat::k_err_denied);
+  expect_stays(inner);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "inner", "to"}));
+}
+
+// What folders the system was told to make, in their order.
+class MadeFolders {
+ public:
+  MadeFolders() {
+    names.clear();
+    zxplat::files.make_folder = [](std::string_view name) {
+      names.emplace_back(name);
+      return zxplat::system_files.make_folder(name);
+    };
+  }
+  MadeFolders(const MadeFolders&) = delete;
+  MadeFolders& operator=(const MadeFolders&) = delete;
+  ~MadeFolders() { zxplat::files = zxplat::system_files; }
+
+  static inline Names names;
+};
+
+TEST(zxsys2, a_chain_of_folders_is_made_from_the_outermost_on) {
+  const TempDir folder;
+  const MadeFolders made;
+  const std::string a = folder.path() + "\\a";
+  EXPECT_TRUE(make_path((a + "\\b\\c").c_str()));
+  EXPECT_EQ(made.names, (Names{a, a + "\\b", a + "\\b\\c"}));
+  EXPECT_TRUE(fs::is_directory(folder.file("a/b/c")));
+  EXPECT_TRUE(make_path((a + "\\b\\c").c_str()));
+  EXPECT_TRUE(make_path((a + "\\b").c_str()));
+  EXPECT_EQ(made.names.size(), 3u);
+  make_path_or_die((a + "\\d\\e").c_str());
+  EXPECT_TRUE(fs::is_directory(folder.file("a/d/e")));
+}
+
+TEST(zxsys2, separators_at_the_end_and_in_pairs_do_not_count) {
+  const TempDir folder;
+  const WorkingIn there(folder.path());
+  const std::string path = folder.path();
+  for (const char* ending : {"\\", "/", "//", "\\\\", "/\\/\\"}) {
+    EXPECT_TRUE(make_path((path + "/a/b" + ending).c_str())) << ending;
+    EXPECT_TRUE(fs::is_directory("a/b")) << ending;
+    fs::remove_all("a");
+  }
+  for (const char* chain : {"/a//b", "//a/b", "/a\\\\b", "\\a/b", "/a///b"}) {
+    EXPECT_TRUE(make_path((path + chain).c_str())) << chain;
+    EXPECT_TRUE(fs::is_directory("a/b")) << chain;
+    fs::remove_all("a");
+  }
+  EXPECT_FALSE(make_path("a//b"));
+  EXPECT_EQ(names_in("."), Names());
+}
+
+TEST(zxsys2, a_relative_chain_must_begin_with_a_folder_that_is_there) {
+  const TempDir folder;
+  const WorkingIn there(folder.path());
+  for (const char* name : {"new", "new\\", "new\\a", "new/a/b", "\\", "/"}) {
+    const bool is_root = name[1] == '\0';
+    EXPECT_EQ(make_path(name), is_root) << name;
+  }
+  EXPECT_EQ(names_in("."), Names());
+  EXPECT_TRUE(make_path(".\\new"));
+  EXPECT_TRUE(make_path("new\\a\\b"));
+  EXPECT_TRUE(make_path("new/a"));
+  EXPECT_TRUE(make_path("."));
+  EXPECT_TRUE(fs::is_directory("new/a/b"));
+}
+
+TEST(zxsys2, the_native_drive_may_begin_a_chain) {
+  if (kit::on_windows()) GTEST_SKIP() << "names begin with a drive anyway";
+  const TempDir folder;
+  const WorkingIn there(folder.path());
+  EXPECT_TRUE(make_path(("c:" + folder.path() + "/a/b").c_str()));
+  EXPECT_TRUE(make_path("C:x\\y"));
+  EXPECT_TRUE(make_path("C:"));
+  EXPECT_TRUE(make_path("C:\\"));
+  EXPECT_EQ(names_in("."), (Names{"a", "x"}));
+}
+
+TEST(zxsys2, a_path_that_cannot_be_made_is_told_by_the_number_of_chg_dir) {
+  const Files files;
+  for (const std::string& name :
+       {std::string(), files.from, files.from + "\\new", files.from + "\\a\\b",
+        std::string("1:\\new"), std::string("new")}) {
+    SCOPED_TRACE(name);
+    EXPECT_FALSE(make_path(name.c_str()));
+    const auto make = [&] { make_path_or_die(name.c_str()); };
+    expect_failure(make, 1032, "chg dir: failed " + quoted(name), name);
+    kit::with_failures_dropped(make);
+  }
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_chain_ends_where_a_folder_cannot_be_made) {
+  const TempDir folder;
+  Faults faults;
+  faults.fail_nth(Call::make_folder, 2, zxplat::k_err_disk_full);
+  EXPECT_FALSE(make_path((folder.path() + "\\a\\b\\c").c_str()));
+  EXPECT_EQ(faults.count(Call::make_folder), 2);
+  EXPECT_EQ(names_in(folder.path()), Names{"a"});
+  EXPECT_EQ(names_in(folder.file("a")), Names());
+}
+
+// ---- changing the working directory
+
+TEST(zxsys2, the_working_directory_changes_and_the_old_one_comes_back) {
+  const TempDir folder;
+  const WorkingIn there(folder.path());
+  fs::create_directories("a/b");
+  const std::string start = text_of(get_cwd());
+  const struct {
+    std::string name;
+    std::string now;
+  } rows[] = {{"a", "\\a"},       {"b\\", "\\a\\b"}, {"..", "\\a"},
+              {".\\b", "\\a\\b"}, {start, ""},       {start + "\\a\\", "\\a"},
+              {"..", ""},         {"a/b", "\\a\\b"}, {"", "\\a\\b"}};
+  std::string before = start;
+  for (const auto& row : rows) {
+    EXPECT_EQ(text_of(chg_dir(row.name.c_str())), before) << row.name;
+    before = start + row.now;
+    EXPECT_EQ(text_of(get_cwd()), before) << row.name;
+  }
+  EXPECT_EQ(text_of(chg_dir("\\")), before);
+  EXPECT_EQ(text_of(get_cwd()),
+            in_library_form(fs::current_path().root_path().string()));
+}
+
+TEST(zxsys2, a_working_directory_that_there_is_not_is_fatal) {
+  const Files files;
+  const WorkingIn there(files.folder.path());
+  const std::string start = text_of(get_cwd());
+  for (const std::string& name :
+       {files.missing, files.in_missing_folder, files.from, std::string("none"),
+        std::string("C:"), std::string("1:\\")}) {
+    SCOPED_TRACE(name);
+    expect_failure([&] { chg_dir(name.c_str()); }, 1032,
+                   "chg dir: failed " + quoted(name), name);
+    kit::with_failures_dropped(
+        [&] { EXPECT_EQ(text_of(chg_dir(name.c_str())), start); });
+    EXPECT_EQ(text_of(get_cwd()), start);
+  }
+}
+
+// ---- disks
+
+// A disk with this room under every letter; the letters that were asked for.
+class FakeDisk {
+ public:
+  explicit FakeDisk(const zxplat::DiskSpace& space) {
+    now = space;
+    letters.clear();
+    zxplat::files.disk_space = [](char letter, zxplat::DiskSpace& out) {
+      letters += letter == '\0' ? '0' : letter;
+      out = now;
+      return true;
+    };
+  }
+  FakeDisk(const FakeDisk&) = delete;
+  FakeDisk& operator=(const FakeDisk&) = delete;
+  ~FakeDisk() { zxplat::files = zxplat::system_files; }
+
+  static inline std::string letters;
+
+ private:
+  static inline zxplat::DiskSpace now;
+};
+
+TEST(zxsys2, free_space_is_counted_in_whole_units_of_sectors) {
+  constexpr std::int32_t k_most = 0x7FFFFFFF;
+  const struct {
+    zxplat::DiskSpace space;  // clusters, sectors in each, bytes in each
+    std::uint32_t unit;
+    std::int32_t expected;
+  } rows[] = {
+      {{0, 8, 512}, 1, 0},
+      {{1000, 8, 512}, 1, 4'096'000},
+      // 8000 sectors are 7 times 1024 of them.
+      {{1000, 8, 512}, 1024, 7 * 512},
+      {{127, 8, 512}, 1024, 0},
+      {{128, 8, 512}, 1024, 512},
+      {{1, 1, 4096}, 1, 4096},
+      {{1, 1, 512}, 2, 0},
+      // 2^31 bytes are one too many.
+      {{4'194'303, 1, 512}, 1, 2'147'483'136},
+      {{4'194'304, 1, 512}, 1, k_most},
+      {{4'194'304, 1, 512}, 2, 1 << 30},
+      {{0xFFFFFFFF, 64, 4096}, 1, k_most},
+      // 2^35 sectors do not fit 32 bits.
+      {{std::uint64_t{1} << 32, 8, 512}, 1 << 16, 1 << 28},
+      {{0xFFFFFFFF, 1, 512}, 0xFFFFFFFF, 512},
+      {{0xFFFFFFFE, 1, 512}, 0xFFFFFFFF, 0},
+  };
+  for (const auto& row : rows) {
+    const FakeDisk disk(row.space);
+    EXPECT_EQ(diskfree('C', row.unit), row.expected)
+        << row.space.free_clusters << ' ' << row.unit;
+  }
+}
+
+TEST(zxsys2, bytes_and_kilobytes_are_units) {
+  const FakeDisk disk({100'000, 8, 512});
+  EXPECT_EQ(disk_bytes('C'), 409'600'000);
+  EXPECT_EQ(disk_kb('d'), 781 * 512);  // 800000 / 1024
+  EXPECT_EQ(disk_kb('\0'), 781 * 512);
+  EXPECT_TRUE(drive_ok('e'));
+  EXPECT_EQ(disk.letters, "Cd0e");
+}
+
+TEST(zxsys2, a_unit_of_no_bytes_fails_an_assertion) {
+  EXPECT_ASSERTION(diskfree('\0', 0), "zxsys2");
+  kit::with_failures_dropped([] { EXPECT_EQ(diskfree('\0', 0), 0); });
+}
+
+TEST(zxsys2, the_current_drive_has_space) {
+  EXPECT_GT(disk_bytes('\0'), 0);
+  EXPECT_GT(disk_kb('C'), 0);
+  EXPECT_GT(disk_kb('c'), 0);
+  EXPECT_TRUE(drive_ok('C'));
+  EXPECT_TRUE(drive_ok('c'));
+}
+
+void expect_no_drive(char letter) {
+  SCOPED_TRACE(letter);
+  const std::function<std::int32_t()> questions[] = {
+      [=] { return diskfree(letter, 512); }, [=] { return disk_bytes(letter); },
+      [=] { return disk_kb(letter); }};
+  for (const auto& question : questions) {
+    expect_failure([&] { question(); }, 1028, "diskfree: bad drive", "");
+    kit::with_failures_dropped([&] { EXPECT_EQ(question(), 0); });
+  }
+}
+
+TEST(zxsys2, a_drive_that_there_is_not_is_fatal) {
+  expect_no_drive('1');
+  expect_no_drive('\\');
+  std::error_code ignored;
+  if (kit::on_windows() && fs::exists("Q:\\", ignored)) return;
+  expect_no_drive('Q');
+  expect_no_drive('q');
+  EXPECT_FALSE(drive_ok('Q'));
+  EXPECT_FALSE(drive_ok('q'));
+  EXPECT_FALSE(space_for("Q:\\"));
+  EXPECT_FALSE(space_for("q:x"));
+}
+
+TEST(zxsys2, a_disk_that_cannot_be_asked_is_no_good_drive) {
+  Faults faults;
+  faults.fail_all(Call::disk_space, zxplat::k_err_io);
+  expect_no_drive('C');
+  expect_no_drive('\0');
+  EXPECT_FALSE(drive_ok('C'));
+  EXPECT_FALSE(space_for("C:\\"));
+}
+
+TEST(zxsys2, a_drive_is_asked_for_by_a_letter) {
+  for (const char byte : {'\0', '1', '@', '[', '`', '{', '\xe0'}) {
+    expect_assertion_at([=] { drive_ok(byte); }, "zxsys2:519");
+    kit::with_failures_dropped([=] { EXPECT_FALSE(drive_ok(byte)); });
+  }
+}
+
+TEST(zxsys2, there_is_space_from_512000_bytes_on) {
+  const TempDir folder;
+  {
+    const FakeDisk disk({999, 1, 512});
+    EXPECT_FALSE(space_for(folder.path().c_str()));
+  }
+  {
+    const FakeDisk disk({1000, 1, 512});
+    EXPECT_TRUE(space_for(folder.path().c_str()));
+  }
+  {
+    const FakeDisk disk({4'194'304, 8, 512});
+    EXPECT_TRUE(space_for(folder.path().c_str()));
+  }
+  EXPECT_EQ(names_in(folder.path()), Names());
+}
+
+TEST(zxsys2, space_is_looked_for_on_the_drive_of_the_path) {
+  const FakeDisk disk({1000, 1, 512});
+  space_for("x");
+  EXPECT_EQ(disk.letters, "0");
+  space_for("q:\\none");
+  EXPECT_EQ(disk.letters, "0QQ");
+}
+
+TEST(zxsys2, space_is_for_files_in_a_directory) {
+  const Files files;
+  const FakeDisk disk({1000, 1, 512});
+  const WorkingIn there(files.folder.path());
+  for (const std::string& path :
+       {files.folder.path(), std::string("."), files.folder.path() + "\\"})
+    EXPECT_TRUE(space_for(path.c_str())) << path;
+  for (const std::string& path :
+       {files.from, files.missing, std::string("none")})
+    EXPECT_FALSE(space_for(path.c_str())) << path;
+  Faults faults;
+  faults.fail_all(Call::open, zxplat::k_err_denied);
+  EXPECT_FALSE(space_for(files.folder.path().c_str()));
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+// ---- the environment
+
+TEST(zxsys2, a_variable_has_its_value_or_none) {
+  kit::set_variable("ZX_SYS2_TEST", "a value;");
+  EXPECT_EQ(text_of(get_env("ZX_SYS2_TEST")), "a value;");
+  kit::set_variable("ZX_SYS2_TEST", nullptr);
+  EXPECT_EQ(text_of(get_env("ZX_SYS2_TEST")), "");
+  EXPECT_EQ(text_of(get_env("")), "");
+}
+
+// ---- standard output
+
+ZX_CASE(zxsys2_redirects) {
+  init_zxlib_args(argc, argv);
+  std::printf("printf before,");
+  std::fflush(stdout);
+  oprint("oprint before");
+  redirect_stdout(argv[1]);
+  oprint("oprint after,");
+  g_stdout.flush();
+  std::printf("printf after;");
+  std::fflush(stdout);
+  oprint("at the end.");
+  return 0;
+}
+
+TEST(zxsys2, standard_output_goes_to_the_end_of_a_file) {
+  const TempDir folder;
+  const std::string file = folder.file("out");
+  const std::string line = "oprint after,printf after;at the end.";
+  std::string expected;
+  for (int i = 0; i < 2; ++i) {
+    const kit::ProcessResult process =
+        kit::run_case("zxsys2_redirects", {file});
+    EXPECT_EQ(process.exit_code, 0);
+    EXPECT_EQ(process.out, "printf before,oprint before");
+    EXPECT_EQ(process.err, "");
+    expected += line;
+    EXPECT_EQ(read_file(file), expected);
+  }
+}
+
+// Its arguments: the file, the call that is to fail, and whether the failure
+// is to be dropped.
+ZX_CASE(zxsys2_fails_to_redirect) {
+  kit::start();
+  Faults faults;
+  if (!faults.parse(argv[2])) return 1;
+  const auto redirect = [&] { redirect_stdout(argv[1]); };
+  if (std::string(argv[3]) == "dropped")
+    kit::with_failures_dropped(redirect);
+  else
+    redirect();
+  oprint("and on");
+  return 0;
+}
+
+struct RedirectRow {
+  const char* fault;
+  const char* position;
+  bool is_redirected;  // by then
+};
+constexpr RedirectRow k_redirect_rows[] = {{"open:1", "zxsys2:630", false},
+                                           {"bind:1", "zxsys2:631", false},
+                                           {"close:1", "zxsys2:632", true}};
+
+// What a case printed where it should have, and nothing anywhere else.
+std::string printed(const RedirectRow& row, const std::string& end,
+                    int exit_code) {
+  SCOPED_TRACE(row.fault);
+  const TempDir folder;
+  const std::string file = folder.file("out");
+  write_file(file, "");
+  kit::ProcessOptions options;
+  options.directory = folder.path();
+  const kit::ProcessResult process = kit::run_case(
+      "zxsys2_fails_to_redirect", {file, row.fault, end}, options);
+  EXPECT_EQ(process.exit_code, exit_code);
+  EXPECT_EQ(row.is_redirected ? process.out : read_file(file), "");
+  return row.is_redirected ? read_file(file) : process.out;
+}
+
+TEST(zxsys2, each_failed_call_of_a_redirection_fails_an_assertion) {
+  for (const RedirectRow& row : k_redirect_rows) {
+    const std::string text = printed(row, "told", 100);
+    const std::string start =
+        "\r\np v Fatal Error 1000: bailed out: " + std::string(row.position);
+    EXPECT_TRUE(text.starts_with(start)) << text;
+  }
+}
+
+TEST(zxsys2, behind_a_dropped_failure_standard_output_still_goes_somewhere) {
+  for (const RedirectRow& row : k_redirect_rows)
+    EXPECT_EQ(printed(row, "dropped", 0), "and on");
+}
+
+TEST(zxsys2, standard_output_does_not_go_where_no_file_can_be) {
+  const Files files;
+  make_read_only(files.to);
+  for (const std::string& name :
+       {files.to, files.folder.path(), files.in_missing_folder}) {
+    expect_assertion_at([&] { redirect_stdout(name.c_str()); }, "zxsys2:630");
+    kit::with_failures_dropped([&] { redirect_stdout(name.c_str()); });
+  }
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
 }
 
 }  // namespace
