@@ -74,10 +74,26 @@ zxStr copy_beside(const zxStr& from, const zxStr& to, Safety safety) {
   return {};
 }
 
+// A copy of a file without write permission has none either, which keeps it
+// from being deleted; then it takes that of a fresh file.
+void delete_copy(const zxStr& copy) {
+  if (zxplat::files.remove(copy.view())) return;
+  zxBFile fresh;
+  zxStr name;
+  const bool is_made =
+      create_unique(fresh, &zxBFile::try_create_private, dir_part(copy), "cpy",
+                    name) == zxUnique::created;
+  if (!is_made) return;
+  fresh.close();
+  zxplat::copy_permissions(name.view(), copy.view());
+  zxplat::files.remove(name.view());
+  zxplat::files.remove(copy.view());
+}
+
 // Deletes a copy that cannot take its place; the failure shows its own cause.
 bool give_copy_up(const zxStr& copy, std::int32_t message, const zxStr& to) {
   const int reason = zxplat::last_error();
-  zxplat::files.remove(copy.view());
+  delete_copy(copy);
   zxplat::set_last_error(reason);
   bail_code(message, to);
   return false;

@@ -31,6 +31,15 @@ bool write_line(zxBFile& file, const zxStr& line) {
   return line.view().starts_with('\n') || file.newline();
 }
 
+// Reads up to `size` bytes; the count, 0 at the end.  A failure is fatal even
+// if bytes came ahead of it.
+std::int32_t read_block(zxBFile& file, char* room, std::int32_t size) {
+  std::int32_t got = 0;
+  const bool is_read = file.read(room, size, &got);
+  if (is_read && file.handle->error()) bail_code(1014, file.name);
+  return got;
+}
+
 // How much to ask for next: all that the file seems to have and a byte more,
 // which shows its end; a pipe, or a file that grows, tells too little.
 std::int32_t next_block(zxBFile& file, std::int32_t done) {
@@ -46,16 +55,18 @@ std::int32_t next_block(zxBFile& file, std::int32_t done) {
 template <class Clean>
 bool read_lines(const zxStr& name, zxQVA<zxStr>& lines, bool keeps_empty,
                 const Clean& clean) {
-  lines.set_length(0);
   zxBFile file;
-  if (!file.open(name)) return false;
+  const bool is_open = file.open(name);
+  lines.set_length(0);  // the name may be one of them
+  if (!is_open) return false;
   for (zxStr line; file.gets(line);) {
     clean(line);
     if (line.is_empty() && !keeps_empty) continue;
     lines.append(zxStr(line.c_str(), line.length()));  // without spare room
   }
+  const bool is_read = !file.handle->error();
   file.close(no_detail);
-  return true;
+  return is_read;
 }
 
 // A block of a file for comparing and summing up.
@@ -63,13 +74,11 @@ class Block {
  public:
   // The next bytes of a file; none at its end.
   std::string_view next(zxBFile& file) {
-    file.read(room, k_compare_block, &got);
-    return {room, zx_size(got)};
+    return {room, zx_size(read_block(file, room, k_compare_block))};
   }
 
  private:
   char room[k_compare_block];
-  std::int32_t got = 0;
 };
 
 bool hold_the_same(zxBFile& a, zxBFile& b) {
@@ -122,16 +131,17 @@ void lines2file_or_die(const zxStr& name, const zxQVA<zxStr>& lines,
 // ---- reading
 
 bool file2str(const zxStr& name, zxStr& text) {
-  text.clear();
   zxBFile file;
-  if (!file.open(name)) return false;
+  const bool is_open = file.open(name);
+  text.clear();  // the name may be the same string
+  if (!is_open) return false;
   std::int32_t done = 0;
   std::int32_t got = 0;
   std::int32_t block = 0;
   do {
     block = next_block(file, done);
     char* const room = text.buffer(done + block);
-    file.read(room + done, block, &got);
+    got = read_block(file, room + done, block);
     done += got;
   } while (got == block && done < k_most_read);
   text.set_length(done);
@@ -160,10 +170,9 @@ void copy_stream(zxBFile& in, zxBFile& out, std::int32_t size) {
   if (!ZX_ASSERT(size >= -1)) return;
   zxStr block;
   char* const room = block.buffer(k_copy_block);
-  if (size == -1) {
-    std::int32_t got = 0;
-    while (in.read(room, k_copy_block, &got)) out.write(room, got);
-  }
+  if (size == -1)
+    while (const std::int32_t got = read_block(in, room, k_copy_block))
+      out.write(room, got);
   for (std::int32_t left = size; left > 0; left -= k_copy_block)
     if (!copy_block(in, out, room, std::min(left, k_copy_block))) return;
 }
@@ -172,9 +181,10 @@ void append_file(const zxStr& from, const zxStr& to) {
   if (!ZX_ASSERT(!zxplat::same_file(from.view(), to.view()))) return;
   zxBFile in;
   in.open_or_die(from);
+  if (!in.is_open()) return;
   zxBFile out;
   out.append(to);
-  if (!in.is_open() || !out.is_open()) return;
+  if (!out.is_open()) return;
   copy_stream(in, out);
   in.close(no_detail);
   out.close(no_detail);

@@ -45,6 +45,7 @@ constexpr int k_untouched = 1234;
 constexpr OpenMode k_all_modes[] = {
     OpenMode::read,           OpenMode::create,     OpenMode::create_new,
     OpenMode::create_private, OpenMode::read_write, OpenMode::append,
+    OpenMode::read_append,
 };
 
 constexpr OpenMode k_existing_modes[] = {OpenMode::read, OpenMode::read_write};
@@ -54,7 +55,8 @@ constexpr OpenMode k_new_modes[] = {OpenMode::create_new,
 
 // The modes that write into a file that is there already.
 constexpr OpenMode k_overwriting_modes[] = {
-    OpenMode::create, OpenMode::read_write, OpenMode::append};
+    OpenMode::create, OpenMode::read_write, OpenMode::append,
+    OpenMode::read_append};
 
 std::string describe(std::string_view name, OpenMode mode) {
   return std::string(name) + ", mode " + std::to_string(static_cast<int>(mode));
@@ -191,7 +193,8 @@ TEST(zxplat, calls_that_succeed_leave_the_last_error_alone) {
   EXPECT_EQ(last_error(), k_untouched) << "create again";
   files.close(files.open(other, OpenMode::create_new));
   zxplat::copy_time(name, other);
-  EXPECT_EQ(last_error(), k_untouched) << "attributes";
+  zxplat::copy_permissions(name, other);
+  EXPECT_EQ(last_error(), k_untouched) << "time, permissions";
   files.remove(other);
   files.rename(name, other);
   EXPECT_EQ(last_error(), k_untouched) << "rename";
@@ -257,6 +260,28 @@ TEST(zxplat, read_write_keeps_the_bytes_and_does_both) {
     EXPECT_EQ(file.read(), "ef");
   }
   EXPECT_EQ(kit::read_file(dir.file("a")), "abXYef");
+}
+
+TEST(zxplat, read_append_reads_anywhere_and_writes_at_the_end) {
+  const TempDir dir;
+  kit::write_file(dir.file("a"), "abc");
+  {
+    const Open file(dir.file("a"), OpenMode::read_append);
+    EXPECT_EQ(files.seek(file.fd, 0, Whence::current), 3);
+    EXPECT_EQ(file.read(), "");
+    EXPECT_EQ(files.seek(file.fd, 1, Whence::start), 1);
+    EXPECT_EQ(file.read(1), "b");
+    EXPECT_EQ(file.write("XY"), 2);
+    EXPECT_EQ(files.seek(file.fd, 0, Whence::start), 0);
+    EXPECT_EQ(file.read(), "abcXY");
+  }
+  EXPECT_EQ(kit::read_file(dir.file("a")), "abcXY");
+}
+
+TEST(zxplat, read_append_makes_a_file_that_is_missing) {
+  const TempDir dir;
+  write_through(dir.file("a"), OpenMode::read_append, "new");
+  EXPECT_EQ(kit::read_file(dir.file("a")), "new");
 }
 
 TEST(zxplat, append_makes_a_file_that_is_missing) {
@@ -636,8 +661,13 @@ void expect_refused_everywhere(std::string_view name, int number) {
   expect_false(zxplat::name_taken(name), "name_taken");
   expect_false(zxplat::same_file(good, name), "same_file");
   expect_false(zxplat::same_file(name, good), "same_file");
-  expect_false(zxplat::copy_time(good, name), "copy_attributes");
-  expect_false(zxplat::copy_time(name, good), "copy_attributes");
+  expect_false(zxplat::copy_time(good, name), "copy_time");
+  expect_false(zxplat::copy_time(name, good), "copy_time");
+  expect_false(zxplat::copy_permissions(good, name), "copy_permissions");
+  expect_false(zxplat::copy_permissions(name, good), "copy_permissions");
+  expect_false(files.make_folder(name), "make_folder");
+  expect_false(files.remove_folder(name), "remove_folder");
+  expect_false(zxplat::set_current_directory(name), "set_current_directory");
   EXPECT_TRUE(zxplat::on_one_device(name, good));
   EXPECT_TRUE(zxplat::on_one_device(good, name));
   EXPECT_EQ(last_error(), k_untouched);
@@ -1135,39 +1165,90 @@ TEST(zxplat, another_device_is_known_ahead_of_the_rename) {
   EXPECT_FALSE(zxplat::on_one_device(dir.file("a"), in_capitals(other) + "/b"));
 }
 
-TEST(zxplat, attributes_are_the_time_and_the_permissions) {
+// Two files, the first of which was last written long ago.
+class OldAndNew {
+ public:
+  OldAndNew() {
+    kit::write_file(from, "x");
+    kit::write_file(to, "kept");
+    fs::last_write_time(from,
+                        fs::last_write_time(from) - std::chrono::hours(1000));
+  }
+
   const TempDir dir;
   const std::string from = dir.file("From");
   const std::string to = dir.file("To");
-  kit::write_file(from, "x");
-  kit::write_file(to, "kept");
-  fs::last_write_time(from,
-                      fs::last_write_time(from) - std::chrono::hours(1000));
-  make_read_only(from);
-  EXPECT_TRUE(zxplat::copy_time(dir.file("FROM"), dir.file("TO")))
+};
+
+TEST(zxplat, a_copied_time_is_the_time_alone) {
+  const OldAndNew both;
+  make_read_only(both.from);
+  const fs::perms before = fs::status(both.to).permissions();
+  EXPECT_TRUE(zxplat::copy_time(both.dir.file("FROM"), both.dir.file("TO")))
       << last_error();
-  EXPECT_EQ(fs::last_write_time(to), fs::last_write_time(from));
-  EXPECT_EQ(fs::status(to).permissions(), fs::status(from).permissions());
-  EXPECT_EQ(kit::read_file(to), "kept");
+  EXPECT_EQ(fs::last_write_time(both.to), fs::last_write_time(both.from));
+  EXPECT_EQ(fs::status(both.to).permissions(), before);
+  EXPECT_EQ(kit::read_file(both.to), "kept");
 }
 
-TEST(zxplat, attributes_replace_those_of_a_file_without_write_permission) {
-  const TempDir dir;
-  kit::write_file(dir.file("a"), "");
-  kit::write_file(dir.file("b"), "");
-  make_read_only(dir.file("b"));
-  EXPECT_TRUE(zxplat::copy_time(dir.file("a"), dir.file("b")))
-      << last_error();
-  EXPECT_TRUE(files.remove(dir.file("b"))) << last_error();
+// The time of the last access, in seconds since 1970, as the system's own
+// tool tells it.
+std::string time_of_access(const std::string& path) {
+  return kit::run_process({"stat", "-c", "%X", path}).out;
 }
 
-TEST(zxplat, attributes_need_two_files) {
+TEST(zxplat, a_copied_time_is_that_of_the_access_as_well) {
+  if (kit::on_windows()) GTEST_SKIP() << "there is no tool that tells it";
+  const OldAndNew both;
+  const std::string written =
+      kit::run_process({"stat", "-c", "%Y", both.from}).out;
+  ASSERT_NE(time_of_access(both.to), written);
+  EXPECT_TRUE(zxplat::copy_time(both.from, both.to));
+  EXPECT_EQ(time_of_access(both.to), written);
+}
+
+TEST(zxplat, copied_permissions_are_the_permissions_alone) {
+  const OldAndNew both;
+  make_read_only(both.from);
+  const auto before = fs::last_write_time(both.to);
+  EXPECT_TRUE(
+      zxplat::copy_permissions(both.dir.file("FROM"), both.dir.file("TO")))
+      << last_error();
+  EXPECT_EQ(fs::status(both.to).permissions(),
+            fs::status(both.from).permissions());
+  EXPECT_EQ(fs::last_write_time(both.to), before);
+  EXPECT_EQ(kit::read_file(both.to), "kept");
+}
+
+TEST(zxplat, a_copied_permission_lets_a_file_be_deleted_again) {
+  const OldAndNew both;
+  make_read_only(both.to);
+  EXPECT_TRUE(zxplat::copy_permissions(both.from, both.to)) << last_error();
+  EXPECT_TRUE(files.remove(both.to)) << last_error();
+}
+
+TEST(zxplat, natively_the_three_special_bits_are_not_copied) {
+  if (kit::on_windows()) GTEST_SKIP() << "there are none";
+  const OldAndNew both;
+  fs::permissions(both.from, fs::perms::set_uid | fs::perms::set_gid |
+                                 fs::perms::sticky_bit | fs::perms::owner_all |
+                                 fs::perms::others_read);
+  EXPECT_TRUE(zxplat::copy_permissions(both.from, both.to));
+  EXPECT_EQ(fs::status(both.to).permissions(),
+            fs::perms::owner_all | fs::perms::others_read);
+}
+
+TEST(zxplat, time_and_permissions_need_two_files) {
   const TempDir dir;
   kit::write_file(dir.file("a"), "");
-  EXPECT_FALSE(zxplat::copy_time(dir.file("a"), dir.file("b")));
-  EXPECT_EQ(last_error(), zxplat::k_err_not_found);
-  EXPECT_FALSE(zxplat::copy_time(dir.file("no\\b"), dir.file("a")));
-  EXPECT_EQ(last_error(), zxplat::k_err_path_not_found);
+  for (const auto call : {zxplat::copy_time, zxplat::copy_permissions}) {
+    EXPECT_FALSE(call(dir.file("a"), dir.file("b")));
+    EXPECT_EQ(last_error(), zxplat::k_err_not_found);
+    EXPECT_FALSE(call(dir.file("b"), dir.file("a")));
+    EXPECT_EQ(last_error(), zxplat::k_err_not_found);
+    EXPECT_FALSE(call(dir.file("no\\b"), dir.file("a")));
+    EXPECT_EQ(last_error(), zxplat::k_err_path_not_found);
+  }
 }
 
 // --------------------------------------------------------------- folders --

@@ -1,7 +1,8 @@
-// zxsys2_test.cpp - operations on whole files by name: parts of names, the
-// two folders of the process, unique names, deleting, copying and moving in
+// zxsys2_test.cpp - operations on whole files and folders by name: the two
+// folders of the process, unique names, reading and writing, comparing,
+// deleting, copying and moving, making folders, disks and the environment in
 // each of their outcomes.
-// Tests zxlib/zxsys2.h and zxsys2.cpp.
+// Tests zxlib/zxsys2.h, zxsys2.cpp and zxsys2_data.cpp.
 #include "zxsys2.h"
 
 #include <gtest/gtest.h>
@@ -9,6 +10,7 @@
 #include <algorithm>
 #include <chrono>
 #include <cstdint>
+#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <functional>
@@ -19,7 +21,9 @@
 
 #include "kit/cases.h"
 #include "kit/failure.h"
+#include "kit/failure_road.h"
 #include "kit/faults.h"
+#include "kit/process.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
 #include "zxmainf.h"
@@ -130,17 +134,17 @@ std::string in_library_form(std::string path) {
   return path;
 }
 
-TEST(zxsys2, the_working_directory_ends_in_a_backslash) {
+TEST(zxsys2, the_working_directory_has_no_backslash_at_its_end) {
   const TempDir folder;
   const WorkingIn there(folder.path());
-  EXPECT_EQ(text_of(with_slash(get_cwd())),
-            in_library_form(fs::current_path().string()) + "\\");
+  EXPECT_EQ(text_of(get_cwd()), in_library_form(fs::current_path().string()));
 }
 
-TEST(zxsys2, the_working_directory_at_the_root_is_one_backslash_long) {
+TEST(zxsys2, the_working_directory_at_the_root_keeps_its_backslash) {
   const WorkingIn there(fs::current_path().root_path().string());
-  EXPECT_EQ(text_of(with_slash(get_cwd())),
+  EXPECT_EQ(text_of(get_cwd()),
             in_library_form(fs::current_path().root_path().string()));
+  EXPECT_EQ(text_of(get_cwd()).back(), '\\');
 }
 
 TEST(zxsys2, a_working_directory_may_have_a_long_name) {
@@ -150,8 +154,7 @@ TEST(zxsys2, a_working_directory_may_have_a_long_name) {
   for (int i = 0; i < 6; ++i) deep /= std::string(200, 'd');
   fs::create_directories(deep);
   const WorkingIn there(deep.string());
-  EXPECT_EQ(text_of(with_slash(get_cwd())),
-            in_library_form(deep.string()) + "\\");
+  EXPECT_EQ(text_of(get_cwd()), in_library_form(deep.string()));
 }
 
 TEST(zxsys2, a_working_directory_that_is_gone_fails_an_assertion) {
@@ -161,9 +164,8 @@ TEST(zxsys2, a_working_directory_that_is_gone_fails_an_assertion) {
   fs::create_directory(gone);
   const WorkingIn there(gone);
   fs::remove(gone);
-  expect_assertion_at([] { with_slash(get_cwd()); }, "zxsys2:398");
-  kit::with_failures_dropped(
-      [] { EXPECT_EQ(text_of(with_slash(get_cwd())), ""); });
+  expect_assertion_at([] { get_cwd(); }, "zxsys2:398");
+  kit::with_failures_dropped([] { EXPECT_EQ(text_of(get_cwd()), ""); });
 }
 
 TEST(zxsys2, the_temporary_directory_is_the_systems_with_a_backslash) {
@@ -432,9 +434,7 @@ TEST(zxsys2, thirty_names_that_others_take_meanwhile_are_fatal) {
   EXPECT_EQ(faults.count(Call::open), 30);
 }
 
-// ---- deleting
-
-// A folder with two files; names with the backslash, as programs join them.
+// A folder with two files.
 class Files {
  public:
   Files() {
@@ -455,6 +455,686 @@ class Files {
   // One that the standard library takes on both targets.
   static constexpr char k_separator = '/';
 };
+
+void set_time(const std::string& path, int hours_ago) {
+  fs::last_write_time(
+      path, fs::file_time_type::clock::now() - std::chrono::hours(hours_ago));
+}
+
+// ---- writing whole files
+
+// Bytes that differ from place to place.
+std::string some_bytes(std::size_t size) {
+  std::string bytes(size, '\0');
+  for (std::size_t i = 0; i < size; ++i)
+    bytes[i] = static_cast<char>((i + i / 255) & 0xFF);
+  return bytes;
+}
+
+zxStr to_text(const std::string& bytes) {
+  return zxStr(bytes.data(), static_cast<std::int32_t>(bytes.size()));
+}
+
+// Lines as the library takes them.
+struct Lines : zxQVA<zxStr> {
+  explicit Lines(const Names& lines) {
+    for (const std::string& line : lines) append(to_text(line));
+  }
+};
+
+TEST(zxsys2, a_text_replaces_a_file_or_is_added_to_it) {
+  const Files files;
+  const std::string bytes("a\r\n\0\x1a\xff\n", 7);
+  EXPECT_TRUE(str2file(files.to.c_str(), to_text(bytes)));
+  EXPECT_EQ(read_file(files.to), bytes);
+  EXPECT_TRUE(str2file(files.to.c_str(), "more", true));
+  EXPECT_EQ(read_file(files.to), bytes + "more");
+  EXPECT_TRUE(str2file(files.to.c_str(), "", true));
+  EXPECT_EQ(read_file(files.to), bytes + "more");
+  EXPECT_TRUE(str2file(files.to.c_str(), ""));
+  EXPECT_EQ(read_file(files.to), "");
+  EXPECT_TRUE(str2file(files.missing.c_str(), "new", true));
+  EXPECT_EQ(read_file(files.missing), "new");
+  str2file_or_die(files.missing.c_str(), "newer");
+  str2file_or_die(files.missing.c_str(), "st", true);
+  EXPECT_EQ(read_file(files.missing), "newerst");
+}
+
+TEST(zxsys2, a_text_of_any_size_is_written_whole) {
+  const Files files;
+  for (const std::size_t size : {65'535, 65'536, 65'537, 1'000'000}) {
+    const std::string bytes = some_bytes(size);
+    EXPECT_TRUE(str2file(files.to.c_str(), to_text(bytes)));
+    EXPECT_TRUE(read_file(files.to) == bytes) << size;
+    EXPECT_TRUE(str2file(files.to.c_str(), to_text(bytes), true));
+    EXPECT_TRUE(read_file(files.to) == bytes + bytes) << size;
+  }
+}
+
+TEST(zxsys2, lines_get_line_ends_unless_they_begin_with_a_line_feed) {
+  const Files files;
+  const struct {
+    Names lines;
+    const char* expected;
+  } rows[] = {
+      {{}, ""},
+      {{""}, "\r\n"},
+      {{"a"}, "a\r\n"},
+      {{"a", "", "b"}, "a\r\n\r\nb\r\n"},
+      {{"\n"}, "\n"},
+      {{"\na", "b"}, "\nab\r\n"},
+      {{"a\n", "\r\n"}, "a\n\r\n\r\n\r\n"},
+      {{" \n"}, " \n\r\n"},
+  };
+  for (const auto& row : rows) {
+    EXPECT_TRUE(lines2file(files.to.c_str(), Lines(row.lines)));
+    EXPECT_EQ(read_file(files.to), row.expected);
+  }
+}
+
+TEST(zxsys2, lines_are_added_to_a_file) {
+  const Files files;
+  EXPECT_TRUE(lines2file(files.missing.c_str(), Lines({"a"}), true));
+  EXPECT_TRUE(lines2file(files.missing.c_str(), Lines({"b", "c"}), true));
+  EXPECT_EQ(read_file(files.missing), "a\r\nb\r\nc\r\n");
+  lines2file_or_die(files.missing.c_str(), Lines({"d"}), true);
+  EXPECT_EQ(read_file(files.missing), "a\r\nb\r\nc\r\nd\r\n");
+  lines2file_or_die(files.missing.c_str(), Lines({"e"}));
+  EXPECT_EQ(read_file(files.missing), "e\r\n");
+}
+
+// The two ways to write a file: false on failure, and with an assertion.
+struct Writer {
+  const char* label;
+  std::function<bool(const char* name, bool append)> attempt;
+  std::function<void(const char* name, bool append)> or_die;
+};
+
+// They write some 200000 bytes, in four calls of the system.
+std::vector<Writer> writers() {
+  static const zxStr text = to_text(std::string(200'000, 'x'));
+  static const Lines lines(Names(2000, std::string(98, 'x')));
+  return {{"str2file",
+           [](const char* name, bool append) {
+             return str2file(name, text, append);
+           },
+           [](const char* name, bool append) {
+             str2file_or_die(name, text, append);
+           }},
+          {"lines2file",
+           [](const char* name, bool append) {
+             return lines2file(name, lines, append);
+           },
+           [](const char* name, bool append) {
+             lines2file_or_die(name, lines, append);
+           }}};
+}
+
+void expect_no_writing(const std::string& name) {
+  for (const Writer& writer : writers()) {
+    for (const bool append : {false, true}) {
+      SCOPED_TRACE(testing::Message()
+                   << writer.label << ' ' << name << ' ' << append);
+      EXPECT_FALSE(writer.attempt(name.c_str(), append));
+      EXPECT_ASSERTION(writer.or_die(name.c_str(), append), "zxsys2_data");
+      kit::with_failures_dropped([&] { writer.or_die(name.c_str(), append); });
+    }
+  }
+}
+
+TEST(zxsys2, what_cannot_be_opened_is_not_written) {
+  const Files files;
+  make_read_only(files.to);
+  for (const std::string& name :
+       {files.to, files.folder.path(), files.in_missing_folder, std::string()})
+    expect_no_writing(name);
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_full_device_is_told_by_those_who_write_to_it) {
+  const std::string device = kit::full_device();
+  if (device.empty()) GTEST_SKIP() << "no device that is full";
+  expect_no_writing(device);
+  EXPECT_FALSE(str2file(device.c_str(), "x"));  // at the close alone
+  EXPECT_TRUE(str2file(device.c_str(), ""));
+}
+
+TEST(zxsys2, each_failed_call_of_writing_is_told_and_the_file_closed) {
+  const Files files;
+  const struct {
+    Call call;
+    int n;
+  } rows[] = {{Call::open, 1},  {Call::write, 1}, {Call::write, 2},
+              {Call::write, 3}, {Call::write, 4}, {Call::close, 1}};
+  for (const Writer& writer : writers()) {
+    for (const auto& row : rows) {
+      SCOPED_TRACE(testing::Message()
+                   << writer.label << ' ' << kit::name_of(row.call) << row.n);
+      Faults faults;
+      faults.fail_nth(row.call, row.n, zxplat::k_err_disk_full);
+      EXPECT_FALSE(writer.attempt(files.to.c_str(), false));
+      EXPECT_EQ(faults.count(Call::close), row.call == Call::open ? 0 : 1);
+      EXPECT_TRUE(writer.attempt(files.to.c_str(), false));
+      EXPECT_EQ(faults.count(Call::write), row.call == Call::open ? 4
+                                           : row.call == Call::close
+                                               ? 8
+                                               : row.n + 4);
+    }
+  }
+}
+
+// ---- reading whole files
+
+std::string text_in(const std::string& name) {
+  zxStr text = "before";
+  EXPECT_TRUE(file2str(name.c_str(), text)) << name;
+  return text_of(text);
+}
+
+TEST(zxsys2, a_file_is_read_whole) {
+  const Files files;
+  const std::string odd("a\r\n\0\x1a\xff\n", 7);
+  write_file(files.to, odd);
+  EXPECT_EQ(text_in(files.to), odd);
+  for (const std::size_t size : {0, 1, 65'534, 65'535, 65'536, 65'537, 131'071,
+                                 131'072, 131'073, 1'000'000}) {
+    const std::string bytes = some_bytes(size);
+    write_file(files.to, bytes);
+    EXPECT_TRUE(text_in(files.to) == bytes) << size;
+  }
+}
+
+TEST(zxsys2, what_cannot_be_opened_leaves_an_empty_text) {
+  const Files files;
+  for (const std::string& name : {files.missing, files.in_missing_folder,
+                                  files.folder.path(), std::string()}) {
+    zxStr text = "before";
+    EXPECT_FALSE(file2str(name.c_str(), text)) << name;
+    EXPECT_TRUE(text.is_empty()) << name;
+  }
+}
+
+TEST(zxsys2, the_name_may_be_the_text_that_is_read_into) {
+  const Files files;
+  zxStr text = files.from.c_str();
+  EXPECT_TRUE(file2str(text, text));
+  EXPECT_EQ(text_of(text), Files::k_from_bytes);
+  Lines lines({files.from});
+  EXPECT_TRUE(file2lines(lines.get(0), lines));
+  ASSERT_EQ(lines.length(), 1);
+  EXPECT_EQ(text_of(lines.get(0)), Files::k_from_bytes);
+}
+
+TEST(zxsys2, a_device_and_what_only_seems_empty_are_read_to_their_end) {
+  EXPECT_EQ(text_in("nul"), "");
+  if (kit::on_windows()) return;
+  // The system makes these up, and gives them no size.
+  EXPECT_EQ(fs::file_size("/proc/version"), 0u);
+  EXPECT_EQ(text_in("\\proc\\version"), read_file("/proc/version"));
+}
+
+ZX_CASE(zxsys2_reads_its_input) {
+  init_zxlib_args(argc, argv);
+  zxStr text;
+  const int is_read = file2str("-", text) ? 1 : 0;
+  const int sum = crc16(text.c_str(), static_cast<std::size_t>(text.length()));
+  oprint("#:#:#", is_read, text.length(), sum);
+  return 0;
+}
+
+// The checksum bit by bit: polynomial 0x1021, the highest bit first, from
+// 0xFFFF on.
+std::uint32_t checksum(const std::string& bytes) {
+  std::uint32_t crc = 0xFFFF;
+  for (const char byte : bytes) {
+    for (int bit = 7; bit >= 0; --bit) {
+      const std::uint32_t in = (static_cast<unsigned char>(byte) >> bit) & 1;
+      const bool is_odd = ((crc >> 15) ^ in) != 0;
+      crc = (crc << 1) & 0xFFFF;
+      if (is_odd) crc ^= 0x1021;
+    }
+  }
+  return crc;
+}
+
+TEST(zxsys2, a_pipe_is_read_to_its_end) {
+  for (const std::size_t size : {0, 10, 65'536, 300'000}) {
+    kit::ProcessOptions options;
+    options.input = some_bytes(size);
+    EXPECT_EQ(kit::run_case("zxsys2_reads_its_input", {}, options).out,
+              "1:" + std::to_string(size) + ":" +
+                  std::to_string(checksum(options.input)));
+  }
+}
+
+TEST(zxsys2, a_failed_read_of_a_text_is_fatal) {
+  const Files files;
+  write_file(files.from, some_bytes(200'000));
+  for (const int n : {1, 2}) {
+    Faults faults;
+    faults.fail_nth(Call::read, n);
+    expect_failure(
+        [&] {
+          zxStr text;
+          file2str(files.from.c_str(), text);
+        },
+        1014, "read: " + quoted(files.from) + " operation failed", files.from);
+    faults.fail_nth(Call::read, n);
+    kit::with_failures_dropped([&] {
+      zxStr text;
+      EXPECT_FALSE(file2str(files.from.c_str(), text));
+    });
+  }
+}
+
+Names lines_in(const std::string& name) {
+  Lines lines({"before", "before"});
+  EXPECT_TRUE(file2lines(name.c_str(), lines)) << name;
+  Names texts;
+  for (const zxStr& line : lines) texts.push_back(text_of(line));
+  return texts;
+}
+
+TEST(zxsys2, lines_lose_one_line_end_each) {
+  const Files files;
+  const struct {
+    std::string bytes;
+    Names lines;
+  } rows[] = {
+      {"", {}},
+      {"a", {"a"}},
+      {"a\n", {"a"}},
+      {"a\r\nb\r\n", {"a", "b"}},
+      {"a\nb", {"a", "b"}},
+      {"\n", {""}},
+      {"\r\n\n", {"", ""}},
+      {"a\n\r\n\nb", {"a", "", "", "b"}},
+      {"a\r", {"a\r"}},
+      {"\r", {"\r"}},
+      {"a\r\r\n", {"a\r"}},
+      {"a\rb\n", {"a\rb"}},
+      {" a \t\n", {" a \t"}},
+      {std::string("a\0b\n\0\n", 6),
+       {std::string("a\0b", 3), std::string("\0", 1)}},
+      {"a\x1a\nb\n", {"a\x1a", "b"}},
+  };
+  for (const auto& row : rows) {
+    write_file(files.to, row.bytes);
+    EXPECT_EQ(lines_in(files.to), row.lines);
+  }
+}
+
+TEST(zxsys2, lines_that_were_written_are_read_again) {
+  const Files files;
+  Names lines;
+  for (int i = 0; i < 3000; ++i)
+    lines.push_back(std::string(static_cast<std::size_t>(i % 300), 'x'));
+  EXPECT_TRUE(lines2file(files.to.c_str(), Lines(lines)));
+  EXPECT_EQ(lines_in(files.to), lines);
+}
+
+Names settings_in(const std::string& name, const char* comment = nullptr) {
+  Lines lines({"before"});
+  EXPECT_TRUE(file2conflines(name.c_str(), lines, comment)) << name;
+  Names texts;
+  for (const zxStr& line : lines) texts.push_back(text_of(line));
+  return texts;
+}
+
+TEST(zxsys2, lines_of_settings_are_cut_trimmed_and_dropped_if_empty) {
+  const Files files;
+  const struct {
+    const char* bytes;
+    const char* comment;
+    Names lines;
+  } rows[] = {
+      {"", nullptr, {}},
+      {"a\r\n b \r\n\t\r\n\r\n", nullptr, {"a", "b"}},
+      {"# all\n  # all\na # part\n#", nullptr, {"a"}},
+      {"a#b#c", nullptr, {"a"}},
+      {"a \"#\" b\n'#'\n", nullptr, {"a \"", "'"}},
+      {"a ; b % c # d\n% a\n", ";%", {"a"}},
+      {"a # b\n", ";", {"a # b"}},
+      {"# a\n", "", {"# a"}},
+      {"a\r", nullptr, {"a"}},
+  };
+  for (const auto& row : rows) {
+    write_file(files.to, row.bytes);
+    EXPECT_EQ(settings_in(files.to, row.comment), row.lines) << row.bytes;
+  }
+}
+
+// The two operations that read lines.
+using LineReader = bool (*)(const char* name, zxQVA<zxStr>& lines);
+constexpr LineReader k_line_readers[] = {
+    [](const char* name, zxQVA<zxStr>& lines) {
+      return file2lines(name, lines);
+    },
+    [](const char* name, zxQVA<zxStr>& lines) {
+      return file2conflines(name, lines);
+    }};
+
+TEST(zxsys2, what_cannot_be_opened_leaves_no_lines) {
+  const Files files;
+  for (const LineReader read : k_line_readers) {
+    for (const std::string& name :
+         {files.missing, files.in_missing_folder, files.folder.path()}) {
+      Lines lines({"before"});
+      EXPECT_FALSE(read(name.c_str(), lines)) << name;
+      EXPECT_EQ(lines.length(), 0) << name;
+    }
+  }
+}
+
+TEST(zxsys2, a_failed_read_of_lines_is_fatal) {
+  const Files files;
+  write_file(files.from, "first\nsecond");
+  for (const LineReader read : k_line_readers) {
+    for (const int n : {1, 2}) {  // the second reads behind the last byte
+      Faults faults;
+      faults.fail_nth(Call::read, n);
+      expect_failure(
+          [&] {
+            zxQVA<zxStr> lines;
+            read(files.from.c_str(), lines);
+          },
+          1029, "gets: file error (" + files.from + ")", files.from);
+      faults.fail_nth(Call::read, n);
+      kit::with_failures_dropped([&] {
+        zxQVA<zxStr> lines;
+        EXPECT_FALSE(read(files.from.c_str(), lines));
+      });
+    }
+  }
+}
+
+// ---- copying between open files
+
+// What copy_stream() makes of `bytes` from position `start` on.
+std::string copied(const Files& files, const std::string& bytes,
+                   std::int32_t start, std::int32_t size) {
+  write_file(files.from, bytes);
+  zxBFile in;
+  in.open_or_die(files.from.c_str());
+  in.seek(start);
+  zxBFile out;
+  out.create(files.to.c_str());
+  out.puts("<");
+  copy_stream(in, out, size);
+  out.puts(">");
+  EXPECT_TRUE(out.close());
+  return read_file(files.to);
+}
+
+TEST(zxsys2, a_stream_is_copied_to_its_end_or_by_a_size) {
+  const Files files;
+  EXPECT_EQ(copied(files, "abcdef", 0, -1), "<abcdef>");
+  EXPECT_EQ(copied(files, "abcdef", 2, -1), "<cdef>");
+  EXPECT_EQ(copied(files, "abcdef", 6, -1), "<>");
+  EXPECT_EQ(copied(files, "abcdef", 0, 0), "<>");
+  EXPECT_EQ(copied(files, "abcdef", 1, 3), "<bcd>");
+  EXPECT_EQ(copied(files, "abcdef", 0, 6), "<abcdef>");
+}
+
+TEST(zxsys2, blocks_of_a_stream_are_copied_in_their_order) {
+  const Files files;
+  const std::string bytes = some_bytes(200'000);
+  for (const std::int32_t size :
+       {49'151, 49'152, 49'153, 98'304, 98'305, 199'999}) {
+    const std::string part = bytes.substr(1, static_cast<std::size_t>(size));
+    EXPECT_TRUE(copied(files, bytes, 1, size) == "<" + part + ">") << size;
+    EXPECT_TRUE(copied(files, "-" + part, 1, -1) == "<" + part + ">") << size;
+  }
+}
+
+TEST(zxsys2, a_stream_that_has_too_few_bytes_is_fatal) {
+  const Files files;
+  for (const std::int32_t size : {13, 49'152, 49'153, 0x7FFFFFFF}) {
+    expect_failure([&] { copied(files, "the new text", 0, size); }, 1014,
+                   "read: " + quoted(files.from) + " operation failed",
+                   files.from);
+    kit::with_failures_dropped(
+        [&] { EXPECT_EQ(copied(files, "the new text", 0, size), "<>"); });
+  }
+  zxBFile in;
+  in.open_or_die(files.from.c_str());
+  zxBFile out;
+  out.create(files.to.c_str());
+  EXPECT_ASSERTION(copy_stream(in, out, -2), "zxsys2_data");
+}
+
+// ---- adding a file to another
+
+TEST(zxsys2, a_file_is_added_to_the_end_of_another) {
+  const Files files;
+  append_file(files.from.c_str(), files.to.c_str());
+  const std::string both = std::string(Files::k_to_bytes) + Files::k_from_bytes;
+  EXPECT_EQ(read_file(files.to), both);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  append_file(files.from.c_str(), files.missing.c_str());
+  EXPECT_EQ(read_file(files.missing), Files::k_from_bytes);
+  const std::string bytes = some_bytes(100'000);
+  write_file(files.from, bytes);
+  append_file(files.from.c_str(), files.to.c_str());
+  EXPECT_TRUE(read_file(files.to) == both + bytes);
+}
+
+void expect_no_addition(const Files& files, const std::string& to) {
+  SCOPED_TRACE(to);
+  const auto add = [&] { append_file(files.from.c_str(), to.c_str()); };
+  EXPECT_ASSERTION(add(), "zxsys2_data");
+  kit::with_failures_dropped(add);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+TEST(zxsys2, a_file_is_not_added_to_itself) {
+  const Files files;
+  const std::string& folder = files.folder.path();
+  expect_no_addition(files, files.from);
+  expect_no_addition(files, folder + "\\FROM");
+  expect_no_addition(files, folder + "\\.\\from");
+  const std::string twin = files.folder.file("twin");
+  std::error_code error;
+  fs::create_hard_link(files.from, twin, error);
+  if (!error) expect_no_addition(files, twin);
+  if (kit::make_link(files.from, files.folder.file("link")))
+    expect_no_addition(files, files.folder.file("link"));
+}
+
+TEST(zxsys2, each_failure_of_adding_has_its_message) {
+  const Files files;
+  make_read_only(files.to);
+  const auto expect_no_source = [&](const std::string& from) {
+    const auto add = [&] { append_file(from.c_str(), files.missing.c_str()); };
+    expect_failure(add, 1002,
+                   "open: Can't open file " + quoted(from) + " for reading",
+                   from);
+    kit::with_failures_dropped(add);
+  };
+  expect_no_source(files.in_missing_folder);
+  expect_no_source(files.missing);
+  expect_no_source(files.folder.path());
+  for (const std::string& to :
+       {files.to, files.folder.path(), files.in_missing_folder}) {
+    const auto add = [&] { append_file(files.from.c_str(), to.c_str()); };
+    expect_failure(add, 1004,
+                   "create: Can't open file " + quoted(to) + " for writing",
+                   to);
+    kit::with_failures_dropped(add);
+  }
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, each_failed_call_of_adding_has_its_message) {
+  const Files files;
+  write_file(files.from, some_bytes(200'000));
+  const struct {
+    Call call;
+    int n;
+    int number;
+    std::string message;
+    std::string name;
+  } rows[] = {
+      {Call::read, 1, 1014, "read: '%' operation failed", files.from},
+      {Call::read, 2, 1014, "read: '%' operation failed", files.from},
+      {Call::write, 1, 1016, "write: failed on '%'", files.to},
+      {Call::close, 1, 1010, "close: '%' failed", files.from},
+      {Call::close, 2, 1010, "close: '%' failed", files.to},
+  };
+  for (const auto& row : rows) {
+    std::string message = row.message;
+    message.replace(message.find('%'), 1, row.name);
+    const auto add = [&] { append_file(files.from.c_str(), files.to.c_str()); };
+    Faults faults;
+    faults.fail_nth(row.call, row.n);
+    expect_failure(add, row.number, message, row.name);
+    faults.fail_nth(row.call, row.n);
+    kit::with_failures_dropped(add);
+    EXPECT_TRUE(read_file(files.to).starts_with(Files::k_to_bytes));
+  }
+}
+
+// ---- comparing
+
+std::int32_t compared(const Files& files) {
+  const std::int32_t result =
+      compare_files(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(compare_files(files.to.c_str(), files.from.c_str()), result);
+  EXPECT_EQ(same_files(files.from.c_str(), files.to.c_str()), result < 2);
+  return result;
+}
+
+TEST(zxsys2, files_that_hold_the_same_differ_in_whole_seconds_alone) {
+  if (kit::on_windows()) GTEST_SKIP() << "tests can set no parts of seconds";
+  const Files files;
+  for (const std::size_t size : {0, 1, 24'576, 100'000}) {
+    write_file(files.from, some_bytes(size));
+    write_file(files.to, some_bytes(size));
+    const std::chrono::sys_seconds second{std::chrono::seconds(1'000'000'000)};
+    const auto time = std::chrono::file_clock::from_sys(second);
+    const auto part = std::chrono::milliseconds(999);
+    fs::last_write_time(files.from, time);
+    fs::last_write_time(files.to, time);
+    EXPECT_EQ(compared(files), 0);
+    fs::last_write_time(files.to, time + part);
+    EXPECT_EQ(compared(files), 0);
+    fs::last_write_time(files.to, time + std::chrono::seconds(1));
+    EXPECT_EQ(compared(files), 1);
+    fs::last_write_time(files.from, time + part);
+    EXPECT_EQ(compared(files), 1);
+  }
+}
+
+TEST(zxsys2, the_times_of_two_files_decide_when_their_bytes_agree) {
+  const Files files;
+  write_file(files.to, Files::k_from_bytes);
+  fs::last_write_time(files.to, fs::last_write_time(files.from));
+  EXPECT_EQ(compared(files), 0);
+  set_time(files.to, 10);
+  EXPECT_EQ(compared(files), 1);
+}
+
+TEST(zxsys2, files_differ_in_any_byte) {
+  const Files files;
+  const std::string bytes = some_bytes(100'000);
+  write_file(files.from, bytes);
+  for (const std::size_t place :
+       {0, 1, 24'575, 24'576, 24'577, 49'152, 99'999}) {
+    std::string other = bytes;
+    other[place] = static_cast<char>(other[place] ^ 1);
+    write_file(files.to, other);
+    fs::last_write_time(files.to, fs::last_write_time(files.from));
+    EXPECT_EQ(compared(files), 2) << place;
+  }
+}
+
+TEST(zxsys2, files_of_two_sizes_and_what_is_no_file_are_unlike) {
+  const Files files;
+  EXPECT_EQ(compared(files), 3);
+  write_file(files.to, std::string(Files::k_from_bytes) + "!");
+  EXPECT_EQ(compared(files), 3);
+  write_file(files.to, "");
+  EXPECT_EQ(compared(files), 3);
+  for (const std::string& other :
+       {files.missing, files.in_missing_folder, files.folder.path()}) {
+    EXPECT_EQ(compare_files(files.from.c_str(), other.c_str()), 3) << other;
+    EXPECT_EQ(compare_files(other.c_str(), files.from.c_str()), 3) << other;
+    EXPECT_EQ(compare_files(other.c_str(), other.c_str()), 3) << other;
+    EXPECT_FALSE(same_files(other.c_str(), other.c_str())) << other;
+  }
+}
+
+TEST(zxsys2, a_file_is_the_same_as_itself) {
+  const Files files;
+  EXPECT_EQ(compare_files(files.from.c_str(), files.from.c_str()), 0);
+  EXPECT_TRUE(same_files(files.from.c_str(), files.from.c_str()));
+}
+
+TEST(zxsys2, a_failed_read_of_a_comparison_is_fatal_and_then_they_differ) {
+  const Files files;
+  write_file(files.to, Files::k_from_bytes);
+  // Each file is read up to its end before the other.
+  for (const int n : {1, 2, 3, 4}) {
+    SCOPED_TRACE(n);
+    const std::string& name = n <= 2 ? files.from : files.to;
+    const auto compare = [&] {
+      return compare_files(files.from.c_str(), files.to.c_str());
+    };
+    Faults faults;
+    faults.fail_nth(Call::read, n);
+    expect_failure([&] { compare(); }, 1014,
+                   "read: " + quoted(name) + " operation failed", name);
+    faults.fail_nth(Call::read, n);
+    kit::with_failures_dropped([&] { EXPECT_EQ(compare(), 2); });
+  }
+}
+
+// The number for these digits is well known.
+TEST(zxsys2, the_model_of_the_checksum_is_the_right_one) {
+  EXPECT_EQ(checksum("123456789"), 0x29B1u);
+}
+
+TEST(zxsys2, the_checksum_is_that_of_all_bytes) {
+  const Files files;
+  for (const std::size_t size :
+       {0, 1, 9, 24'575, 24'576, 24'577, 49'152, 100'000}) {
+    const std::string bytes = some_bytes(size);
+    write_file(files.from, bytes);
+    EXPECT_EQ(file_crc(files.from.c_str()), checksum(bytes)) << size;
+  }
+  write_file(files.from, "123456789");
+  EXPECT_EQ(file_crc(files.from.c_str()), 0x29B1u);
+}
+
+TEST(zxsys2, each_failure_of_a_checksum_has_its_message) {
+  const Files files;
+  for (const std::string& name : {files.missing, files.folder.path()}) {
+    expect_failure([&] { file_crc(name.c_str()); }, 1002,
+                   "open: Can't open file " + quoted(name) + " for reading",
+                   name);
+    kit::with_failures_dropped(
+        [&] { EXPECT_EQ(file_crc(name.c_str()), checksum("")); });
+  }
+  const auto sum = [&] { file_crc(files.from.c_str()); };
+  Faults faults;
+  for (const int n : {1, 2}) {  // the second reads behind the last byte
+    faults.fail_nth(Call::read, n);
+    expect_failure(sum, 1014,
+                   "read: " + quoted(files.from) + " operation failed",
+                   files.from);
+    faults.fail_nth(Call::read, n);
+    kit::with_failures_dropped(sum);
+  }
+  faults.fail_nth(Call::close, 1);
+  expect_failure(sum, 1010, "close: " + quoted(files.from) + " failed",
+                 files.from);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+// ---- deleting
 
 TEST(zxsys2, deleting_in_three_ways_deletes) {
   const struct {
@@ -502,11 +1182,6 @@ TEST(zxsys2, what_cannot_be_deleted_is_told) {
 
 // ---- copying
 
-void set_time(const std::string& path, int hours_ago) {
-  fs::last_write_time(
-      path, fs::file_time_type::clock::now() - std::chrono::hours(hours_ago));
-}
-
 TEST(zxsys2, a_copy_has_the_bytes_the_time_and_the_permissions) {
   const Files files;
   set_time(files.from, 1000);
@@ -544,9 +1219,7 @@ TEST(zxsys2, copies_of_every_size_are_complete) {
   const Files files;
   for (const std::size_t size :
        {0, 1, 49'151, 49'152, 49'153, 65'536, 98'304, 98'305, 1'000'000}) {
-    std::string bytes(size, '\0');
-    for (std::size_t i = 0; i < size; ++i)
-      bytes[i] = static_cast<char>((i + i / 255) & 0xFF);
+    const std::string bytes = some_bytes(size);
     write_file(files.from, bytes);
     cpfile(files.from.c_str(), files.to.c_str());
     EXPECT_TRUE(read_file(files.to) == bytes) << size;
@@ -620,60 +1293,112 @@ constexpr CopyFault k_copy_faults[] = {
     {Call::open, 1, 1002, "open: Can't open file '%' for reading", true},
     {Call::open, 2, 1004, "create: Can't open file '%' for writing", false},
     {Call::read, 1, 1014, "read: '%' operation failed", true},
+    {Call::read, 2, 1014, "read: '%' operation failed", true},
     {Call::write, 1, 1016, "write: failed on '%'", false},
-    {Call::flush, 1, 1020, "flush: '%' operation failed", false},
+    {Call::write, 2, 1016, "write: failed on '%'", false},
     {Call::close, 1, 1010, "close: '%' failed", true},
     {Call::close, 2, 1010, "close: '%' failed", false},
 };
+
+// Only where the source is to go does the copy have to be on the device.
+constexpr CopyFault k_device_fault = {Call::flush, 1, 1020,
+                                      "flush: '%' operation failed", false};
 
 std::string filled(std::string text, const std::string& argument) {
   return text.replace(text.find('%'), 1, argument);
 }
 
-// Runs `copy` with each of the faults; each time `old` must keep its bytes.
-// The source is large enough to be written in its middle.
-void expect_copy_faults(const Files& files, const std::string& target,
-                        const std::function<void()>& copy) {
-  const std::string bytes(200'000, 'x');
+// The names of temporary copies in a folder.
+Names copies_in(const std::string& folder) {
+  Names names = names_in(folder);
+  std::erase_if(
+      names, [](const std::string& name) { return !name.ends_with(".cpy"); });
+  return names;
+}
+
+// Runs `copy` with a fault: the old target must keep its bytes, and so must
+// the source.  What the copy had come to lies beside the target.
+void expect_copy_fault(const CopyFault& fault, const Files& files,
+                       const std::string& target,
+                       const std::function<void()>& copy) {
+  SCOPED_TRACE(testing::Message()
+               << kit::name_of(fault.call) << ' ' << fault.n);
+  const std::string bytes(200'000, 'x');  // written in the middle as well
   write_file(files.from, bytes);
-  for (const CopyFault& fault : k_copy_faults) {
-    SCOPED_TRACE(testing::Message()
-                 << kit::name_of(fault.call) << ' ' << fault.n);
-    write_file(target, Files::k_to_bytes);
-    const std::uint32_t tried = names_tried(files.folder);
-    const Ticks zero(0);
-    const std::string copy_name =
-        text_of(with_slash(dir_part(target.c_str()))) + "tmp" +
-        std::to_string(tried + 1) + ".cpy";
-    const std::string& name = fault.names_source ? files.from : copy_name;
+  write_file(target, Files::k_to_bytes);
+  const std::string folder = fs::path(target).parent_path().string();
+  const std::uint32_t tried = names_tried(files.folder);
+  const Ticks zero(0);
+  const std::string copy_name = "tmp" + std::to_string(tried + 1) + ".cpy";
+  const std::string shown = text_of(dir_part(target.c_str())) + copy_name;
+  const std::string& name = fault.names_source ? files.from : shown;
+  {
     Faults faults;
     faults.fail_nth(fault.call, fault.n, zxplat::k_err_disk_full);
     expect_failure(copy, fault.number, filled(fault.message, name), name);
-    EXPECT_EQ(read_file(target), Files::k_to_bytes);
-    EXPECT_TRUE(read_file(files.from) == bytes);
   }
+  EXPECT_EQ(read_file(target), Files::k_to_bytes);
+  EXPECT_TRUE(read_file(files.from) == bytes);
+  const Names copies = copies_in(folder);
+  EXPECT_EQ(std::count(copies.begin(), copies.end(), copy_name),
+            fault.call == Call::open ? 0 : 1);
 }
 
 TEST(zxsys2, a_copy_that_fails_half_way_leaves_the_old_target) {
   const Files files;
-  expect_copy_faults(files, files.to,
-                     [&] { cpfile(files.from.c_str(), files.to.c_str()); });
+  for (const CopyFault& fault : k_copy_faults)
+    expect_copy_fault(fault, files, files.to,
+                      [&] { cpfile(files.from.c_str(), files.to.c_str()); });
+}
+
+TEST(zxsys2, a_copy_is_not_forced_to_the_device) {
+  const Files files;
+  const Faults calls;
+  cpfile(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(calls.count(Call::flush), 0);
+}
+
+// Runs `copy` with a fault that is dropped: nothing is replaced or lost.
+void expect_dropped_copy_fault(const CopyFault& fault, const Files& files,
+                               const std::string& target,
+                               const std::function<void()>& copy) {
+  // The bytes are all there by the time that the source is closed.
+  if (fault.call == Call::close && fault.n == 1) return;
+  SCOPED_TRACE(testing::Message()
+               << kit::name_of(fault.call) << ' ' << fault.n);
+  const std::string bytes(200'000, 'x');
+  write_file(files.from, bytes);
+  write_file(target, Files::k_to_bytes);
+  {
+    Faults faults;
+    faults.fail_nth(fault.call, fault.n);
+    kit::with_failures_dropped(copy);
+  }
+  EXPECT_EQ(read_file(target), Files::k_to_bytes);
+  EXPECT_TRUE(read_file(files.from) == bytes);
 }
 
 TEST(zxsys2, behind_dropped_failures_an_incomplete_copy_replaces_nothing) {
   const Files files;
-  const std::string bytes(200'000, 'x');
-  write_file(files.from, bytes);
-  for (const CopyFault& fault : k_copy_faults) {
-    if (fault.call == Call::close) continue;  // the bytes are there by then
-    SCOPED_TRACE(kit::name_of(fault.call));
-    Faults faults;
-    faults.fail_nth(fault.call, fault.n);
-    kit::with_failures_dropped(
-        [&] { cpfile(files.from.c_str(), files.to.c_str()); });
-    EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
-    EXPECT_TRUE(read_file(files.from) == bytes);
-  }
+  for (const CopyFault& fault : k_copy_faults)
+    expect_dropped_copy_fault(fault, files, files.to, [&] {
+      cpfile(files.from.c_str(), files.to.c_str());
+    });
+}
+
+// What a copy may be read by while it is no more than begun.
+TEST(zxsys2, a_copy_is_its_owners_alone_until_it_is_complete) {
+  if (kit::on_windows()) GTEST_SKIP() << "every file can be read here";
+  const Files files;
+  fs::permissions(files.from, fs::perms::owner_read | fs::perms::owner_write);
+  Faults faults;
+  faults.fail_nth(Call::write, 1);
+  kit::with_failures_dropped(
+      [&] { cpfile(files.from.c_str(), files.to.c_str()); });
+  const Names left = copies_in(files.folder.path());
+  ASSERT_EQ(left.size(), 1u);
+  EXPECT_EQ(fs::status(files.folder.file(left[0])).permissions(),
+            fs::perms::owner_read | fs::perms::owner_write);
 }
 
 TEST(zxsys2, a_copy_that_cannot_get_its_name_is_deleted) {
@@ -685,6 +1410,45 @@ TEST(zxsys2, a_copy_that_cannot_get_its_name_is_deleted) {
                  files.to);
   EXPECT_EQ(names_in(files.folder.path()), (Names{"from"}));
   EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+// The copy has the permissions of its source by then.
+TEST(zxsys2, a_copy_that_may_not_be_written_is_deleted_all_the_same) {
+  const Files files;
+  make_read_only(files.from);
+  {
+    Faults faults;
+    faults.fail_nth(Call::rename, 1, zxplat::k_err_denied);
+    expect_failure([&] { cpfile(files.from.c_str(), files.missing.c_str()); },
+                   1038,
+                   "cpfile: failed to rename tmp to " + quoted(files.missing),
+                   files.missing);
+  }
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+  make_read_only(files.to);
+  for (const std::string& target : {files.to, files.from}) {
+    expect_failure([&] { cpfile(files.from.c_str(), target.c_str()); }, 1027,
+                   "delefile: cant del " + quoted(target), target);
+    EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+  }
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+}
+
+TEST(zxsys2, a_copy_whose_time_cannot_be_set_fails_an_assertion) {
+  const Files files;
+  // The source goes while it is being closed.
+  static const Files* now;
+  now = &files;
+  Faults faults;
+  zxplat::files.close = [](zxplat::Fd fd) {
+    const bool closed = zxplat::system_files.close(fd);
+    fs::remove(now->from);
+    return closed;
+  };
+  expect_assertion_at([&] { cpfile(files.from.c_str(), files.to.c_str()); },
+                      "zxsys2:174");
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
 }
 
 TEST(zxsys2, the_reason_of_a_failed_rename_of_a_copy_outlives_its_deletion) {
@@ -863,6 +1627,24 @@ TEST(zxsys2, a_rename_that_cannot_cross_becomes_a_copy) {
   }
 }
 
+TEST(zxsys2, a_copy_in_place_of_a_rename_is_forced_to_the_device) {
+  const Files files;
+  Faults faults;
+  faults.fail_nth(Call::rename, 1, zxplat::k_err_other_device);
+  move_file(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(faults.count(Call::flush), 1);
+}
+
+TEST(zxsys2, a_source_whose_copy_is_not_on_the_device_stays) {
+  const Files files;
+  Faults faults;
+  faults.fail_nth(Call::rename, 1, zxplat::k_err_other_device);
+  faults.fail_nth(Call::flush, 1);
+  kit::with_failures_dropped(
+      [&] { move_file(files.from.c_str(), files.to.c_str()); });
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
 TEST(zxsys2, a_copy_in_place_of_a_rename_that_gets_no_name_keeps_the_source) {
   for (const int error : k_errors_of_devices) {
     SCOPED_TRACE(error);
@@ -951,8 +1733,13 @@ TEST(zxsys2, across_devices_the_old_target_outlives_every_failed_copy) {
   if (!device.is_there()) GTEST_SKIP() << "there is one device only";
   const Files files;
   const std::string target = device.file("target");
-  expect_copy_faults(files, target,
-                     [&] { move_file(files.from.c_str(), target.c_str()); });
+  const auto move = [&] { move_file(files.from.c_str(), target.c_str()); };
+  for (const CopyFault& fault : k_copy_faults)
+    expect_copy_fault(fault, files, target, move);
+  expect_copy_fault(k_device_fault, files, target, move);
+  for (const CopyFault& fault : k_copy_faults)
+    expect_dropped_copy_fault(fault, files, target, move);
+  expect_dropped_copy_fault(k_device_fault, files, target, move);
 }
 
 TEST(zxsys2, across_devices_an_undeletable_target_is_fatal_and_stays) {
@@ -980,6 +1767,690 @@ TEST(zxsys2, across_devices_a_missing_source_leaves_the_target) {
       "open: Can't open file " + quoted(files.missing) + " for reading",
       files.missing);
   EXPECT_EQ(read_file(target), Files::k_to_bytes);
+}
+
+TEST(zxsys2, a_file_is_copied_to_another_device) {
+  const OtherDevice device;
+  if (!device.is_there()) GTEST_SKIP() << "there is one device only";
+  const Files files;
+  const std::string target = device.file("target");
+  const Faults calls;
+  cpfile(files.from.c_str(), target.c_str());
+  EXPECT_EQ(calls.count(Call::flush), 0);
+  EXPECT_EQ(read_file(target), Files::k_from_bytes);
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+  EXPECT_EQ(names_in(device.path()), (Names{"target"}));
+}
+
+// A disk of 64 kilobytes, for one test.
+class SmallDisk {
+ public:
+  SmallDisk() {
+    if (kit::on_windows()) return;
+    is_mounted = kit::run_process({"mount", "-t", "tmpfs", "-o", "size=64k",
+                                   "tmpfs", folder.path()})
+                     .exit_code == 0;
+  }
+  SmallDisk(const SmallDisk&) = delete;
+  SmallDisk& operator=(const SmallDisk&) = delete;
+  ~SmallDisk() {
+    if (is_mounted) kit::run_process({"umount", folder.path()});
+  }
+
+  bool is_there() const { return is_mounted; }
+  std::string file(const std::string& name) const { return folder.file(name); }
+
+ private:
+  TempDir folder;
+  bool is_mounted = false;
+};
+
+TEST(zxsys2, a_full_disk_loses_neither_source_nor_target) {
+  const SmallDisk disk;
+  if (!disk.is_there()) GTEST_SKIP() << "no disk can be mounted here";
+  const Files files;
+  const std::string bytes = some_bytes(200'000);
+  const std::string target = disk.file("target");
+  write_file(files.from, bytes);
+  write_file(target, Files::k_to_bytes);
+  for (const auto operation : {cpfile, move_file}) {
+    const auto run = [&] { operation(files.from.c_str(), target.c_str()); };
+    const kit::Failure failure = kit::failure_of(run);
+    EXPECT_TRUE(failure.message.starts_with("1016: write: failed on "))
+        << failure.message;
+    kit::with_failures_dropped(run);
+    EXPECT_TRUE(read_file(files.from) == bytes);
+    EXPECT_EQ(read_file(target), Files::k_to_bytes);
+  }
+}
+
+TEST(zxsys2, a_full_disk_is_told_by_those_who_write_to_it) {
+  const SmallDisk disk;
+  if (!disk.is_there()) GTEST_SKIP() << "no disk can be mounted here";
+  expect_no_writing(disk.file("new"));
+  const WorkingIn there(disk.file(""));
+  EXPECT_FALSE(space_for("."));  // 64 kilobytes are too few anyway
+}
+
+// ---- the time of a file
+
+TEST(zxsys2, a_file_gets_the_time_of_another) {
+  const Files files;
+  set_time(files.from, 1000);
+  copy_time(files.from.c_str(), files.to.c_str());
+  EXPECT_EQ(fs::last_write_time(files.to), fs::last_write_time(files.from));
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
+}
+
+TEST(zxsys2, a_time_that_cannot_be_copied_fails_an_assertion) {
+  const Files files;
+  const auto expect_at = [](const std::string& from, const std::string& to,
+                            const char* place) {
+    const auto copy = [&] { copy_time(from.c_str(), to.c_str()); };
+    expect_assertion_at(copy, place);
+    kit::with_failures_dropped(copy);
+  };
+  expect_at(files.missing, files.to, "zxsys2:174");
+  expect_at(files.in_missing_folder, files.to, "zxsys2:174");
+  expect_at(files.missing, files.missing, "zxsys2:174");
+  expect_at(files.from, files.missing, "zxsys2:177");
+  expect_at(files.from, files.in_missing_folder, "zxsys2:177");
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+// ---- files by a pattern
+
+// A folder with three files, one more in a folder below, and an empty one.
+class Tree {
+ public:
+  Tree() {
+    fs::create_directories(source + "/below");
+    fs::create_directory(target);
+    for (const char* name : {"a.txt", "b.txt", "c.dat", "below/d.txt"})
+      write_file(source + "/" + name, name);
+  }
+
+  Names sources() const { return names_in(source); }
+  Names targets() const { return names_in(target); }
+
+  const TempDir folder;
+  const std::string source = folder.file("source");
+  const std::string target = folder.file("target");
+  const std::string texts = source + "\\*.txt";
+  const std::string all_texts = source + "\\\\*.txt";
+};
+
+TEST(zxsys2, files_of_a_pattern_are_deleted) {
+  const Tree tree;
+  delfiles((tree.source + "\\*.none").c_str());
+  EXPECT_EQ(tree.sources().size(), 4u);
+  delfiles(tree.texts.c_str());
+  EXPECT_EQ(tree.sources(), (Names{"below", "c.dat"}));
+  delfiles(tree.all_texts.c_str());
+  EXPECT_TRUE(names_in(tree.source + "/below").empty());
+  delfiles((tree.source + "\\c.dat").c_str());
+  EXPECT_EQ(tree.sources(), (Names{"below"}));
+  delfiles((tree.source + "\\missing").c_str());
+}
+
+TEST(zxsys2, a_file_of_a_pattern_that_cannot_be_deleted_is_fatal) {
+  const Tree tree;
+  make_read_only(tree.source + "/a.txt");
+  const kit::Failure failure =
+      kit::failure_of([&] { delfiles(tree.texts.c_str()); });
+  EXPECT_TRUE(failure.message.starts_with("1027: delefile: cant del '"))
+      << failure.message;
+  EXPECT_TRUE(failure.message.ends_with("a.txt'")) << failure.message;
+  kit::with_failures_dropped([&] { delfiles(tree.texts.c_str()); });
+  EXPECT_EQ(tree.sources(), (Names{"a.txt", "below", "c.dat"}));
+}
+
+TEST(zxsys2, files_of_a_pattern_are_copied) {
+  const Tree tree;
+  cpfiles2dir((tree.source + "\\*.none").c_str(), tree.target.c_str());
+  EXPECT_EQ(tree.targets(), Names());
+  cpfiles2dir(tree.texts.c_str(), tree.target.c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt"}));
+  EXPECT_EQ(read_file(tree.target + "/b.txt"), "b.txt");
+  cpfiles2dir((tree.source + "\\c.dat").c_str(), (tree.target + "\\").c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt", "c.dat"}));
+  cpfiles2dir(tree.all_texts.c_str(), (tree.target + "/").c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt", "c.dat", "d.txt"}));
+  EXPECT_EQ(tree.sources(), (Names{"a.txt", "b.txt", "below", "c.dat"}));
+}
+
+TEST(zxsys2, files_of_a_pattern_are_moved) {
+  const Tree tree;
+  write_file(tree.target + "/a.txt", "old");
+  mvfiles2dir(tree.texts.c_str(), tree.target.c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt"}));
+  EXPECT_EQ(read_file(tree.target + "/a.txt"), "a.txt");
+  EXPECT_EQ(tree.sources(), (Names{"below", "c.dat"}));
+  mvfiles2dir(tree.all_texts.c_str(), tree.target.c_str());
+  EXPECT_EQ(tree.targets(), (Names{"a.txt", "b.txt", "d.txt"}));
+}
+
+TEST(zxsys2, files_are_copied_into_the_folder_that_they_are_in) {
+  const Tree tree;
+  for (int i = 0; i < 200; ++i)
+    write_file(tree.source + "/" + std::to_string(i) + ".txt", "x");
+  const Names before = tree.sources();
+  cpfiles2dir(tree.texts.c_str(), tree.source.c_str());
+  EXPECT_EQ(tree.sources(), before);
+  EXPECT_EQ(read_file(tree.source + "/a.txt"), "a.txt");
+}
+
+TEST(zxsys2, files_are_not_moved_into_the_folder_that_they_are_in) {
+  const Tree tree;
+  const auto move = [&] {
+    mvfiles2dir(tree.texts.c_str(), tree.source.c_str());
+  };
+  expect_assertion_at(move, "zxsys2:287");
+  kit::with_failures_dropped(move);
+  EXPECT_EQ(tree.sources().size(), 4u);
+  EXPECT_EQ(read_file(tree.source + "/a.txt"), "a.txt");
+}
+
+TEST(zxsys2, files_by_a_pattern_need_a_directory) {
+  const Tree tree;
+  const std::string file = tree.source + "/c.dat";
+  for (const std::string& dir :
+       {tree.folder.file("none"), file, file + "\\", std::string()}) {
+    SCOPED_TRACE(dir);
+    const auto copy = [&] { cpfiles2dir(tree.texts.c_str(), dir.c_str()); };
+    const auto move = [&] { mvfiles2dir(tree.texts.c_str(), dir.c_str()); };
+    expect_failure(copy, 1034, "cpfiles2dir: bad dir name " + quoted(dir), dir);
+    expect_failure(move, 1035, "mvfiles2dir: bad dir name " + quoted(dir), dir);
+    kit::with_failures_dropped(copy);
+    kit::with_failures_dropped(move);
+  }
+  EXPECT_EQ(tree.sources(), (Names{"a.txt", "b.txt", "below", "c.dat"}));
+  EXPECT_EQ(tree.targets(), Names());
+}
+
+TEST(zxsys2, a_plain_name_of_no_file_is_fatal_to_copy_or_move) {
+  const Tree tree;
+  const std::string missing = tree.source + "\\none";
+  const std::string message =
+      "open: Can't open file " + quoted(missing) + " for reading";
+  for (const auto operation : {cpfiles2dir, mvfiles2dir}) {
+    const auto run = [&] { operation(missing.c_str(), tree.target.c_str()); };
+    expect_failure(run, 1002, message, missing);
+    kit::with_failures_dropped(run);
+  }
+  EXPECT_EQ(tree.targets(), Names());
+}
+
+// ---- making and deleting folders
+
+TEST(zxsys2, a_directory_is_made_whatever_separators_end_its_name) {
+  const TempDir folder;
+  Names expected;
+  for (const char* ending : {"", "\\", "/", "\\\\", "//", "/\\/\\"}) {
+    const std::string name = "d" + std::to_string(expected.size());
+    expected.push_back(name);
+    EXPECT_TRUE(try_createdir((folder.path() + "\\" + name + ending).c_str()))
+        << ending;
+  }
+  createdir((folder.path() + "\\last\\").c_str());
+  expected.push_back("last");
+  EXPECT_EQ(names_in(folder.path()), expected);
+}
+
+TEST(zxsys2, a_directory_that_cannot_be_made_is_told) {
+  const Files files;
+  const std::string inner = files.folder.path() + "/inner";
+  fs::create_directory(inner);
+  for (const std::string& name :
+       {files.from, inner, inner + "\\", files.in_missing_folder,
+        files.from + "\\new", std::string()}) {
+    SCOPED_TRACE(name);
+    EXPECT_FALSE(try_createdir(name.c_str()));
+    const auto create = [&] { createdir(name.c_str()); };
+    expect_failure(create, 1030, "createdir: failed " + quoted(name), name);
+    kit::with_failures_dropped(create);
+  }
+  Faults faults;
+  faults.fail_all(Call::make_folder, zxplat::k_err_denied);
+  EXPECT_FALSE(try_createdir(files.missing.c_str()));
+  expect_failure([&] { createdir(files.missing.c_str()); }, 1030,
+                 "createdir: failed " + quoted(files.missing), files.missing);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "inner", "to"}));
+  EXPECT_EQ(read_file(files.from), Files::k_from_bytes);
+}
+
+TEST(zxsys2, an_empty_directory_is_deleted) {
+  const TempDir folder;
+  fs::create_directory(folder.file("a"));
+  fs::create_directory(folder.file("b"));
+  deldir(folder.file("a").c_str());
+  deldir((folder.path() + "\\b\\").c_str());
+  EXPECT_EQ(names_in(folder.path()), Names());
+}
+
+TEST(zxsys2, a_directory_that_cannot_be_deleted_is_fatal) {
+  const Files files;
+  const std::string inner = files.folder.path() + "/inner";
+  fs::create_directory(inner);
+  const auto expect_stays = [](const std::string& name) {
+    SCOPED_TRACE(name);
+    const auto remove = [&] { deldir(name.c_str()); };
+    expect_failure(remove, 1031, "del dir: failed " + quoted(name), name);
+    kit::with_failures_dropped(remove);
+  };
+  for (const std::string& name :
+       {files.folder.path(), files.from, files.missing, files.in_missing_folder,
+        std::string()})
+    expect_stays(name);
+  Faults faults;
+  faults.fail_all(Call::remove_folder, zxplat::k_err_denied);
+  expect_stays(inner);
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "inner", "to"}));
+}
+
+// What folders the system was told to make, in their order.
+class MadeFolders {
+ public:
+  MadeFolders() {
+    names.clear();
+    zxplat::files.make_folder = [](std::string_view name) {
+      names.emplace_back(name);
+      return zxplat::system_files.make_folder(name);
+    };
+  }
+  MadeFolders(const MadeFolders&) = delete;
+  MadeFolders& operator=(const MadeFolders&) = delete;
+  ~MadeFolders() { zxplat::files = zxplat::system_files; }
+
+  static inline Names names;
+};
+
+TEST(zxsys2, a_chain_of_folders_is_made_from_the_outermost_on) {
+  const TempDir folder;
+  const MadeFolders made;
+  const std::string a = folder.path() + "\\a";
+  EXPECT_TRUE(make_path((a + "\\b\\c").c_str()));
+  EXPECT_EQ(made.names, (Names{a, a + "\\b", a + "\\b\\c"}));
+  EXPECT_TRUE(fs::is_directory(folder.file("a/b/c")));
+  EXPECT_TRUE(make_path((a + "\\b\\c").c_str()));
+  EXPECT_TRUE(make_path((a + "\\b").c_str()));
+  EXPECT_EQ(made.names.size(), 3u);
+  make_path_or_die((a + "\\d\\e").c_str());
+  EXPECT_TRUE(fs::is_directory(folder.file("a/d/e")));
+}
+
+TEST(zxsys2, separators_at_the_end_and_in_pairs_do_not_count) {
+  const TempDir folder;
+  const WorkingIn there(folder.path());
+  const std::string path = folder.path();
+  for (const char* ending : {"\\", "/", "//", "\\\\", "/\\/\\"}) {
+    EXPECT_TRUE(make_path((path + "/a/b" + ending).c_str())) << ending;
+    EXPECT_TRUE(fs::is_directory("a/b")) << ending;
+    fs::remove_all("a");
+  }
+  for (const char* chain : {"/a//b", "//a/b", "/a\\\\b", "\\a/b", "/a///b"}) {
+    EXPECT_TRUE(make_path((path + chain).c_str())) << chain;
+    EXPECT_TRUE(fs::is_directory("a/b")) << chain;
+    fs::remove_all("a");
+  }
+  EXPECT_FALSE(make_path("a//b"));
+  EXPECT_EQ(names_in("."), Names());
+}
+
+TEST(zxsys2, a_relative_chain_must_begin_with_a_folder_that_is_there) {
+  const TempDir folder;
+  const WorkingIn there(folder.path());
+  for (const char* name : {"new", "new\\", "new\\a", "new/a/b", "\\", "/"}) {
+    const bool is_root = name[1] == '\0';
+    EXPECT_EQ(make_path(name), is_root) << name;
+  }
+  EXPECT_EQ(names_in("."), Names());
+  EXPECT_TRUE(make_path(".\\new"));
+  EXPECT_TRUE(make_path("new\\a\\b"));
+  EXPECT_TRUE(make_path("new/a"));
+  EXPECT_TRUE(make_path("."));
+  EXPECT_TRUE(fs::is_directory("new/a/b"));
+}
+
+TEST(zxsys2, the_native_drive_may_begin_a_chain) {
+  if (kit::on_windows()) GTEST_SKIP() << "names begin with a drive anyway";
+  const TempDir folder;
+  const WorkingIn there(folder.path());
+  EXPECT_TRUE(make_path(("c:" + folder.path() + "/a/b").c_str()));
+  EXPECT_TRUE(make_path("C:x\\y"));
+  EXPECT_TRUE(make_path("C:"));
+  EXPECT_TRUE(make_path("C:\\"));
+  EXPECT_EQ(names_in("."), (Names{"a", "x"}));
+}
+
+TEST(zxsys2, a_path_that_cannot_be_made_is_told_by_the_number_of_chg_dir) {
+  const Files files;
+  for (const std::string& name :
+       {std::string(), files.from, files.from + "\\new", files.from + "\\a\\b",
+        std::string("1:\\new"), std::string("new")}) {
+    SCOPED_TRACE(name);
+    EXPECT_FALSE(make_path(name.c_str()));
+    const auto make = [&] { make_path_or_die(name.c_str()); };
+    expect_failure(make, 1032, "chg dir: failed " + quoted(name), name);
+    kit::with_failures_dropped(make);
+  }
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+TEST(zxsys2, a_chain_ends_where_a_folder_cannot_be_made) {
+  const TempDir folder;
+  Faults faults;
+  faults.fail_nth(Call::make_folder, 2, zxplat::k_err_disk_full);
+  EXPECT_FALSE(make_path((folder.path() + "\\a\\b\\c").c_str()));
+  EXPECT_EQ(faults.count(Call::make_folder), 2);
+  EXPECT_EQ(names_in(folder.path()), Names{"a"});
+  EXPECT_EQ(names_in(folder.file("a")), Names());
+}
+
+// ---- changing the working directory
+
+TEST(zxsys2, the_working_directory_changes_and_the_old_one_comes_back) {
+  const TempDir folder;
+  const WorkingIn there(folder.path());
+  fs::create_directories("a/b");
+  const std::string start = text_of(get_cwd());
+  const struct {
+    std::string name;
+    std::string now;
+  } rows[] = {{"a", "\\a"},       {"b\\", "\\a\\b"}, {"..", "\\a"},
+              {".\\b", "\\a\\b"}, {start, ""},       {start + "\\a\\", "\\a"},
+              {"..", ""},         {"a/b", "\\a\\b"}, {"", "\\a\\b"}};
+  std::string before = start;
+  for (const auto& row : rows) {
+    EXPECT_EQ(text_of(chg_dir(row.name.c_str())), before) << row.name;
+    before = start + row.now;
+    EXPECT_EQ(text_of(get_cwd()), before) << row.name;
+  }
+  EXPECT_EQ(text_of(chg_dir("\\")), before);
+  EXPECT_EQ(text_of(get_cwd()),
+            in_library_form(fs::current_path().root_path().string()));
+}
+
+TEST(zxsys2, a_working_directory_that_there_is_not_is_fatal) {
+  const Files files;
+  const WorkingIn there(files.folder.path());
+  const std::string start = text_of(get_cwd());
+  for (const std::string& name :
+       {files.missing, files.in_missing_folder, files.from, std::string("none"),
+        std::string("C:"), std::string("1:\\")}) {
+    SCOPED_TRACE(name);
+    expect_failure([&] { chg_dir(name.c_str()); }, 1032,
+                   "chg dir: failed " + quoted(name), name);
+    kit::with_failures_dropped(
+        [&] { EXPECT_EQ(text_of(chg_dir(name.c_str())), start); });
+    EXPECT_EQ(text_of(get_cwd()), start);
+  }
+}
+
+// ---- disks
+
+// A disk with this room under every letter; the letters that were asked for.
+class FakeDisk {
+ public:
+  explicit FakeDisk(const zxplat::DiskSpace& space) {
+    now = space;
+    letters.clear();
+    zxplat::files.disk_space = [](char letter, zxplat::DiskSpace& out) {
+      letters += letter == '\0' ? '0' : letter;
+      out = now;
+      return true;
+    };
+  }
+  FakeDisk(const FakeDisk&) = delete;
+  FakeDisk& operator=(const FakeDisk&) = delete;
+  ~FakeDisk() { zxplat::files = zxplat::system_files; }
+
+  static inline std::string letters;
+
+ private:
+  static inline zxplat::DiskSpace now;
+};
+
+TEST(zxsys2, free_space_is_counted_in_whole_units_of_sectors) {
+  constexpr std::int32_t k_most = 0x7FFFFFFF;
+  const struct {
+    zxplat::DiskSpace space;  // clusters, sectors in each, bytes in each
+    std::uint32_t unit;
+    std::int32_t expected;
+  } rows[] = {
+      {{0, 8, 512}, 1, 0},
+      {{1000, 8, 512}, 1, 4'096'000},
+      // 8000 sectors are 7 times 1024 of them.
+      {{1000, 8, 512}, 1024, 7 * 512},
+      {{127, 8, 512}, 1024, 0},
+      {{128, 8, 512}, 1024, 512},
+      {{1, 1, 4096}, 1, 4096},
+      {{1, 1, 512}, 2, 0},
+      // 2^31 bytes are one too many.
+      {{4'194'303, 1, 512}, 1, 2'147'483'136},
+      {{4'194'304, 1, 512}, 1, k_most},
+      {{4'194'304, 1, 512}, 2, 1 << 30},
+      {{0xFFFFFFFF, 64, 4096}, 1, k_most},
+      // 2^35 sectors do not fit 32 bits.
+      {{std::uint64_t{1} << 32, 8, 512}, 1 << 16, 1 << 28},
+      {{0xFFFFFFFF, 1, 512}, 0xFFFFFFFF, 512},
+      {{0xFFFFFFFE, 1, 512}, 0xFFFFFFFF, 0},
+  };
+  for (const auto& row : rows) {
+    const FakeDisk disk(row.space);
+    EXPECT_EQ(diskfree('C', row.unit), row.expected)
+        << row.space.free_clusters << ' ' << row.unit;
+  }
+}
+
+TEST(zxsys2, bytes_and_kilobytes_are_units) {
+  const FakeDisk disk({100'000, 8, 512});
+  EXPECT_EQ(disk_bytes('C'), 409'600'000);
+  EXPECT_EQ(disk_kb('d'), 781 * 512);  // 800000 / 1024
+  EXPECT_EQ(disk_kb('\0'), 781 * 512);
+  EXPECT_TRUE(drive_ok('e'));
+  EXPECT_EQ(disk.letters, "Cd0e");
+}
+
+TEST(zxsys2, a_unit_of_no_bytes_fails_an_assertion) {
+  EXPECT_ASSERTION(diskfree('\0', 0), "zxsys2");
+  kit::with_failures_dropped([] { EXPECT_EQ(diskfree('\0', 0), 0); });
+}
+
+TEST(zxsys2, the_current_drive_has_space) {
+  EXPECT_GT(disk_bytes('\0'), 0);
+  EXPECT_GT(disk_kb('C'), 0);
+  EXPECT_GT(disk_kb('c'), 0);
+  EXPECT_TRUE(drive_ok('C'));
+  EXPECT_TRUE(drive_ok('c'));
+}
+
+void expect_no_drive(char letter) {
+  SCOPED_TRACE(letter);
+  const std::function<std::int32_t()> questions[] = {
+      [=] { return diskfree(letter, 512); }, [=] { return disk_bytes(letter); },
+      [=] { return disk_kb(letter); }};
+  for (const auto& question : questions) {
+    expect_failure([&] { question(); }, 1028, "diskfree: bad drive", "");
+    kit::with_failures_dropped([&] { EXPECT_EQ(question(), 0); });
+  }
+}
+
+TEST(zxsys2, a_drive_that_there_is_not_is_fatal) {
+  expect_no_drive('1');
+  expect_no_drive('\\');
+  std::error_code ignored;
+  if (kit::on_windows() && fs::exists("Q:\\", ignored)) return;
+  expect_no_drive('Q');
+  expect_no_drive('q');
+  EXPECT_FALSE(drive_ok('Q'));
+  EXPECT_FALSE(drive_ok('q'));
+  EXPECT_FALSE(space_for("Q:\\"));
+  EXPECT_FALSE(space_for("q:x"));
+}
+
+TEST(zxsys2, a_disk_that_cannot_be_asked_is_no_good_drive) {
+  Faults faults;
+  faults.fail_all(Call::disk_space, zxplat::k_err_io);
+  expect_no_drive('C');
+  expect_no_drive('\0');
+  EXPECT_FALSE(drive_ok('C'));
+  EXPECT_FALSE(space_for("C:\\"));
+}
+
+TEST(zxsys2, a_drive_is_asked_for_by_a_letter) {
+  for (const char byte : {'\0', '1', '@', '[', '`', '{', '\xe0'}) {
+    expect_assertion_at([=] { drive_ok(byte); }, "zxsys2:519");
+    kit::with_failures_dropped([=] { EXPECT_FALSE(drive_ok(byte)); });
+  }
+}
+
+TEST(zxsys2, there_is_space_from_512000_bytes_on) {
+  const TempDir folder;
+  {
+    const FakeDisk disk({999, 1, 512});
+    EXPECT_FALSE(space_for(folder.path().c_str()));
+  }
+  {
+    const FakeDisk disk({1000, 1, 512});
+    EXPECT_TRUE(space_for(folder.path().c_str()));
+  }
+  {
+    const FakeDisk disk({4'194'304, 8, 512});
+    EXPECT_TRUE(space_for(folder.path().c_str()));
+  }
+  EXPECT_EQ(names_in(folder.path()), Names());
+}
+
+TEST(zxsys2, space_is_looked_for_on_the_drive_of_the_path) {
+  const FakeDisk disk({1000, 1, 512});
+  space_for("x");
+  EXPECT_EQ(disk.letters, "0");
+  space_for("q:\\none");
+  EXPECT_EQ(disk.letters, "0QQ");
+}
+
+TEST(zxsys2, space_is_for_files_in_a_directory) {
+  const Files files;
+  const FakeDisk disk({1000, 1, 512});
+  const WorkingIn there(files.folder.path());
+  for (const std::string& path :
+       {files.folder.path(), std::string("."), files.folder.path() + "\\"})
+    EXPECT_TRUE(space_for(path.c_str())) << path;
+  for (const std::string& path :
+       {files.from, files.missing, std::string("none")})
+    EXPECT_FALSE(space_for(path.c_str())) << path;
+  Faults faults;
+  faults.fail_all(Call::open, zxplat::k_err_denied);
+  EXPECT_FALSE(space_for(files.folder.path().c_str()));
+  EXPECT_EQ(names_in(files.folder.path()), (Names{"from", "to"}));
+}
+
+// ---- the environment
+
+TEST(zxsys2, a_variable_has_its_value_or_none) {
+  kit::set_variable("ZX_SYS2_TEST", "a value;");
+  EXPECT_EQ(text_of(get_env("ZX_SYS2_TEST")), "a value;");
+  kit::set_variable("ZX_SYS2_TEST", nullptr);
+  EXPECT_EQ(text_of(get_env("ZX_SYS2_TEST")), "");
+  EXPECT_EQ(text_of(get_env("")), "");
+}
+
+// ---- standard output
+
+ZX_CASE(zxsys2_redirects) {
+  init_zxlib_args(argc, argv);
+  std::printf("printf before,");
+  std::fflush(stdout);
+  oprint("oprint before");
+  redirect_stdout(argv[1]);
+  oprint("oprint after,");
+  g_stdout.flush();
+  std::printf("printf after;");
+  std::fflush(stdout);
+  oprint("at the end.");
+  return 0;
+}
+
+TEST(zxsys2, standard_output_goes_to_the_end_of_a_file) {
+  const TempDir folder;
+  const std::string file = folder.file("out");
+  const std::string line = "oprint after,printf after;at the end.";
+  std::string expected;
+  for (int i = 0; i < 2; ++i) {
+    const kit::ProcessResult process =
+        kit::run_case("zxsys2_redirects", {file});
+    EXPECT_EQ(process.exit_code, 0);
+    EXPECT_EQ(process.out, "printf before,oprint before");
+    EXPECT_EQ(process.err, "");
+    expected += line;
+    EXPECT_EQ(read_file(file), expected);
+  }
+}
+
+// Its arguments: the file, the call that is to fail, and whether the failure
+// is to be dropped.
+ZX_CASE(zxsys2_fails_to_redirect) {
+  kit::start();
+  Faults faults;
+  if (!faults.parse(argv[2])) return 1;
+  const auto redirect = [&] { redirect_stdout(argv[1]); };
+  if (std::string(argv[3]) == "dropped")
+    kit::with_failures_dropped(redirect);
+  else
+    redirect();
+  oprint("and on");
+  return 0;
+}
+
+struct RedirectRow {
+  const char* fault;
+  const char* position;
+  bool is_redirected;  // by then
+};
+constexpr RedirectRow k_redirect_rows[] = {{"open:1", "zxsys2:630", false},
+                                           {"bind:1", "zxsys2:631", false},
+                                           {"close:1", "zxsys2:632", true}};
+
+// What a case printed where it should have, and nothing anywhere else.
+std::string printed(const RedirectRow& row, const std::string& end,
+                    int exit_code) {
+  SCOPED_TRACE(row.fault);
+  const TempDir folder;
+  const std::string file = folder.file("out");
+  write_file(file, "");
+  kit::ProcessOptions options;
+  options.directory = folder.path();
+  const kit::ProcessResult process = kit::run_case(
+      "zxsys2_fails_to_redirect", {file, row.fault, end}, options);
+  EXPECT_EQ(process.exit_code, exit_code);
+  EXPECT_EQ(row.is_redirected ? process.out : read_file(file), "");
+  return row.is_redirected ? read_file(file) : process.out;
+}
+
+TEST(zxsys2, each_failed_call_of_a_redirection_fails_an_assertion) {
+  for (const RedirectRow& row : k_redirect_rows) {
+    const std::string text = printed(row, "told", 100);
+    const std::string start =
+        "\r\np v Fatal Error 1000: bailed out: " + std::string(row.position);
+    EXPECT_TRUE(text.starts_with(start)) << text;
+  }
+}
+
+TEST(zxsys2, behind_a_dropped_failure_standard_output_still_goes_somewhere) {
+  for (const RedirectRow& row : k_redirect_rows)
+    EXPECT_EQ(printed(row, "dropped", 0), "and on");
+}
+
+TEST(zxsys2, standard_output_does_not_go_where_no_file_can_be) {
+  const Files files;
+  make_read_only(files.to);
+  for (const std::string& name :
+       {files.to, files.folder.path(), files.in_missing_folder}) {
+    expect_assertion_at([&] { redirect_stdout(name.c_str()); }, "zxsys2:630");
+    kit::with_failures_dropped([&] { redirect_stdout(name.c_str()); });
+  }
+  EXPECT_EQ(read_file(files.to), Files::k_to_bytes);
 }
 
 }  // namespace
