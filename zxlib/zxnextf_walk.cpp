@@ -2,6 +2,8 @@
 // Tests: tests/zxlib/zxnextf_test.cpp.
 
 #include <algorithm>
+#include <cstring>
+#include <memory>
 
 #include "zxaa.h"
 #include "zxnextf.h"
@@ -70,13 +72,22 @@ void list_folder(const zxStr& folder, const zxStr& pattern, Wanted wanted,
   if (any_capitals) drop_repetitions(out);
 }
 
-// Puts the elements from `from` on in front of a list, in their order.
+// Puts the elements from `from` on in front of a list, in their order.  What
+// is in the list moves as one block of bytes: it can be long, and each
+// specification in it passes here.
 void put_in_front(zxQVA<zxStr>& list, const zxQVA<zxStr>& elements,
                   std::int32_t from) {
+  static_assert(zx_relocatable<zxStr>);
   const std::int32_t before = list.length();
-  for (std::int32_t i = from; i < elements.length(); ++i)
-    list.append(elements.get(i));
-  std::rotate(list.begin(), list.begin() + before, list.end());
+  const std::int32_t added = elements.length() - from;
+  list.set_length(before + added);
+  if (added <= 0 || list.length() != before + added) return;
+  zxStr* const first = list.begin();
+  std::destroy(first + before, list.end());
+  std::memmove(static_cast<void*>(first + added),
+               static_cast<const void*>(first),
+               zx_size(before) * sizeof *first);
+  std::uninitialized_copy(elements.begin() + from, elements.end(), first);
 }
 
 // The same specification for each folder below that of `path`.

@@ -1384,6 +1384,133 @@ TEST(zxstr, only_ascii_letters_change_their_case) {
   EXPECT_TRUE(is_shared_empty(none));
 }
 
+// --------------------------------------------------------------- trimming --
+
+TEST(zxstr, trim_removes_white_space_at_both_ends) {
+  const struct {
+    std::string_view text;
+    std::string_view expected;
+  } rows[] = {
+      {"", ""},
+      {"a", "a"},
+      {" a", "a"},
+      {"a ", "a"},
+      {" a b ", "a b"},
+      {"  a  b  ", "a  b"},
+      {"\t\n\v\f\r a \r\f\v\n\t", "a"},
+      {" ", ""},
+      {" \t\r\n ", ""},
+      {"\x08 a \x0E", "\x08 a \x0E"},
+      {"\0 a \0"sv, "\0 a \0"sv},
+      {" \0 "sv, "\0"sv},
+      {"\xA0 a \x85", "\xA0 a \x85"},
+      {" \xE0 ", "\xE0"},
+  };
+  for (const auto& row : rows) {
+    zxStr s = str(row.text);
+    trim(s);
+    EXPECT_EQ(text_of(s), row.expected) << testing::PrintToString(row.text);
+    EXPECT_EQ(s.c_str()[s.length()], '\0');
+  }
+}
+
+TEST(zxstr, trim_knows_every_byte) {
+  for (int byte = 0; byte < 256; ++byte) {
+    const std::string c(1, static_cast<char>(byte));
+    const bool is_space = byte == 32 || (byte >= 9 && byte <= 13);
+    zxStr s = str(c + "x" + c);
+    trim(s);
+    EXPECT_EQ(text_of(s), is_space ? "x" : c + "x" + c) << byte;
+  }
+}
+
+TEST(zxstr, trim_keeps_the_sharing_unless_there_is_something_to_remove) {
+  zxStr s = str("a b");
+  const zxStr sharer = s;
+  trim(s);
+  EXPECT_TRUE(share(s, sharer));
+  zxStr wide = str(" a b\n");
+  const zxStr kept = wide;
+  trim(wide);
+  EXPECT_EQ(text_of(wide), "a b");
+  EXPECT_EQ(text_of(kept), " a b\n");
+  EXPECT_EQ(refs(kept), 1);
+}
+
+TEST(zxstr, trim_of_white_space_alone_leaves_the_empty_string) {
+  zxStr s = str(" \t ");
+  const zxStr sharer = s;
+  trim(s);
+  EXPECT_TRUE(is_shared_empty(s));
+  EXPECT_EQ(text_of(sharer), " \t ");
+  trim(s);
+  EXPECT_TRUE(is_shared_empty(s));
+}
+
+TEST(zxstr, trim_works_in_the_string_itself) {
+  zxStr s = str(std::string(10, ' ') + std::string(500, 'x') + "y\n");
+  const zxStrRep* const block = s.representation();
+  trim(s);
+  EXPECT_EQ(text_of(s), std::string(500, 'x') + "y");
+  EXPECT_EQ(s.representation(), block);
+  zxIStr inner(" inner ");
+  trim(inner);
+  EXPECT_EQ(text_of(inner), "inner");
+}
+
+TEST(zxstr, strip_line_end_removes_one_line_end) {
+  const struct {
+    std::string_view text;
+    std::string_view expected;
+  } rows[] = {
+      {"", ""},
+      {"a", "a"},
+      {"a\n", "a"},
+      {"a\r\n", "a"},
+      {"a\r", "a\r"},
+      {"a\n\r", "a\n\r"},
+      {"a\n\n", "a\n"},
+      {"a\r\n\r\n", "a\r\n"},
+      {"a\r\r\n", "a\r"},
+      {"a\n\r\n", "a\n"},
+      {"a \n", "a "},
+      {"\n", ""},
+      {"\r\n", ""},
+      {"\r", "\r"},
+      {"a\nb", "a\nb"},
+      {"a\n\0"sv, "a\n\0"sv},
+      {"\0\r\n"sv, "\0"sv},
+  };
+  for (const auto& row : rows) {
+    zxStr s = str(row.text);
+    strip_line_end(s);
+    EXPECT_EQ(text_of(s), row.expected) << testing::PrintToString(row.text);
+    EXPECT_EQ(s.c_str()[s.length()], '\0');
+    zxIStr inner(str(row.text));
+    strip_line_end(inner);
+    EXPECT_EQ(text_of(inner), row.expected);
+  }
+}
+
+TEST(zxstr, strip_line_end_leaves_the_sharers_alone) {
+  zxStr s = str("a\r\n");
+  const zxStr sharer = s;
+  strip_line_end(s);
+  EXPECT_EQ(text_of(s), "a");
+  EXPECT_EQ(text_of(sharer), "a\r\n");
+  zxStr plain = str("a");
+  const zxStr other = plain;
+  strip_line_end(plain);
+  EXPECT_TRUE(share(plain, other));
+}
+
+TEST(zxstr, strip_line_end_keeps_the_block) {
+  zxStr s = str("line\n");
+  const zxStrRep* const block = s.representation();
+  strip_line_end(s);
+  EXPECT_EQ(s.representation(), block);
+}
+
 // ---------------------------------------------------------------- numbers --
 
 TEST(zxstr, to_int_reads_decimal_integers) {
