@@ -8,7 +8,7 @@
 //
 // What was written waits in the stream's buffer: bytes that the system
 // refuses may be told by a later write, the flush or the close, and the close
-// tells them in any case.
+// tells them in any case, but for a standard stream, which it only flushes.
 //
 // After a failure that was dropped (see zxatsys.h) an operation returns
 // false, 0, -1 or an empty text and leaves the object as it is.

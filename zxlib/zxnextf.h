@@ -127,7 +127,8 @@ bool name_matches(std::string_view pattern, std::string_view name);
 // are not entered.  Empty specifications are skipped.
 //
 // Names that were matched come back in lower case, the folder included, each
-// once, in the system's order; a plain name comes back as it is, whether or
+// once, in the system's order; the folder keeps its spelling if it would be
+// another one in lower case.  A plain name comes back as it is, whether or
 // not there is such a file.
 bool next_file(zxQVA<zxStr>& list, zxStr& name, bool with_dirs = false);
 

@@ -2,8 +2,6 @@
 // Tests: tests/zxlib/zxnextf_test.cpp.
 
 #include <algorithm>
-#include <cstring>
-#include <memory>
 
 #include "zxaa.h"
 #include "zxnextf.h"
@@ -51,43 +49,48 @@ void drop_repetitions(zxQVA<zxStr>& names) {
   names.set_length(kept);
 }
 
-// The paths of a folder's entries whose names match, in lower case.  Where
-// the system tells case apart, two entries can come out alike: a name in
-// capitals must have been among them.
+// The folder's part of the names that are found in it: in lower case, unless
+// that is the name of another folder, where the system tells case apart.
+zxStr prefix_of(const zxStr& folder) {
+  const zxStr prefix = with_slash(folder);
+  if (!holds_capitals(prefix.view())) return prefix;
+  zxStr lowered = prefix;
+  lowered.to_lower();
+  const bool is_other =
+      zxplat::kind_of(lowered.view()) == zxplat::NameKind::directory &&
+      !zxplat::same_file(lowered.view(), prefix.view());
+  return is_other ? prefix : lowered;
+}
+
+// A name in lower case behind a folder's part.
+zxStr path_of(const zxStr& prefix, std::string_view name) {
+  zxStr lowered(name);
+  lowered.to_lower();
+  return prefix + lowered;
+}
+
+// The paths of a folder's entries whose names match.  Two entries can come
+// out alike in lower case: a name in capitals must have been among them.
 void list_folder(const zxStr& folder, const zxStr& pattern, Wanted wanted,
                  zxQVA<zxStr>& out) {
-  const zxStr prefix = with_slash(folder);
+  const zxStr prefix = prefix_of(folder);
   bool any_capitals = false;
   FolderReader reader(folder.view());
   for (FolderEntry entry; reader.next(entry);) {
     if (!is_wanted(entry, wanted)) continue;
     if (!name_matches(pattern.view(), entry.name)) continue;
     any_capitals = any_capitals || holds_capitals(entry.name);
-    zxStr path;
-    path.build(prefix.c_str(), prefix.length(), entry.name.data(),
-               zx_count(entry.name.size()));
-    path.to_lower();
-    out.append(path);
+    out.append(path_of(prefix, entry.name));
   }
   if (any_capitals) drop_repetitions(out);
 }
 
-// Puts the elements from `from` on in front of a list, in their order.  What
-// is in the list moves as one block of bytes: it can be long, and each
-// specification in it passes here.
+// Puts the elements from `from` on in front of a list, in their order.
 void put_in_front(zxQVA<zxStr>& list, const zxQVA<zxStr>& elements,
                   std::int32_t from) {
-  static_assert(zx_relocatable<zxStr>);
-  const std::int32_t before = list.length();
-  const std::int32_t added = elements.length() - from;
-  list.set_length(before + added);
-  if (added <= 0 || list.length() != before + added) return;
-  zxStr* const first = list.begin();
-  std::destroy(first + before, list.end());
-  std::memmove(static_cast<void*>(first + added),
-               static_cast<const void*>(first),
-               zx_size(before) * sizeof *first);
-  std::uninitialized_copy(elements.begin() + from, elements.end(), first);
+  const std::int32_t count = elements.length() - from;
+  list.grow_front(count);
+  for (std::int32_t i = 0; i < count; ++i) list.get(i) = elements.get(from + i);
 }
 
 // The same specification for each folder below that of `path`.

@@ -7,10 +7,11 @@
 //
 //   names       byte strings in Win32 form: the backslash separates, the
 //               forward slash is accepted, "C:" is understood.  At most
-//               k_max_name bytes; a name with a NUL byte inside is refused
-//               (k_err_bad_name).  Natively there is one drive, "C:" or
-//               nothing; a name that is not there as spelled is looked for
-//               without regard to ASCII case, the exact spelling first.
+//               k_max_name bytes; a name with a NUL byte or one of *?"<>|
+//               inside is refused (k_err_bad_name).  Natively there is one
+//               drive, "C:" or nothing; a name that is not there as spelled is
+//               looked for without regard to ASCII case, the exact spelling
+//               first.
 //   descriptors small integers, 0 to 2 the standard streams.  All byte
 //               streams are binary.
 //   failures    a result that says so, and then the system's number in
@@ -74,7 +75,8 @@ enum class OpenMode {
   read,            // existing file, reading
   create,          // writing; made, or cut to nothing
   create_new,      // writing; refused (80) if the name is taken, even by a link
-  create_private,  // as create_new, for the owner's eyes alone
+  create_private,  // as create_new, for the owner's eyes alone; on Windows
+                   // for those that the folder is for
   read_write,      // existing file, both; refused without the right to write
   append,          // writing, always at the end; made if it is missing.  The
                    // position after opening is the end.
@@ -162,7 +164,8 @@ struct FileCalls {
   // it stood for before; `from` stays.
   bool (*bind)(Fd from, Fd to);
 
-  // The room on the disk of a drive, 0 for the current one.
+  // The room on the disk of a drive, 0 for the current one; the one drive
+  // that there is natively has the disk of the working directory.
   bool (*disk_space)(char letter, DiskSpace& space);
 };
 
@@ -173,6 +176,9 @@ extern FileCalls files;
 
 // Writes all of a text by files.write; false if the system refused bytes.
 bool write_all(Fd fd, std::string_view text);
+
+// True for the name of the null device, "nul" in any case.
+bool is_null_device(std::string_view name);
 
 // What a name stands for.  Links are followed.
 enum class NameKind {
@@ -208,6 +214,9 @@ bool same_file(std::string_view a, std::string_view b);
 // False if it is known that a rename of the file `from` to the name `to`
 // would have to cross devices; true otherwise, also when it cannot be told.
 bool on_one_device(std::string_view from, std::string_view to);
+
+// Gives a file the write permission without which it cannot be deleted.
+bool make_writable(std::string_view name);
 
 // Gives the file `to` the permissions of `from`.
 bool copy_permissions(std::string_view from, std::string_view to);

@@ -1,5 +1,6 @@
 // zxplat_common.cpp - what both targets have in common: writing all of a
-// text, message boxes that are written instead of shown.
+// text, the name of the null device, message boxes that are written instead
+// of shown.
 // Tested by tests/zxlib/zxplat_test.cpp.
 
 #include <algorithm>
@@ -18,6 +19,11 @@ bool write_all(Fd fd, std::string_view text) {
     text.remove_prefix(static_cast<std::size_t>(done));
   }
   return true;
+}
+
+bool is_null_device(std::string_view name) {
+  return name.size() == 3 && (name[0] | 0x20) == 'n' &&
+         (name[1] | 0x20) == 'u' && (name[2] | 0x20) == 'l';
 }
 
 }  // namespace zxplat

@@ -21,7 +21,6 @@ using posix::fail_with;
 using posix::find;
 using posix::folder_of;
 using posix::is_absent;
-using posix::is_null_device;
 using posix::last_component;
 using posix::on_existing;
 using posix::Path;
@@ -66,7 +65,8 @@ int checked(int fd, int flags) {
   const int access = flags & O_ACCMODE;
   if (access == O_RDWR && S_ISFIFO(status.st_mode)) return give_up(fd, EACCES);
   if (access != O_RDONLY && is_read_only(status)) return give_up(fd, EACCES);
-  // From here on a reader waits for its writer.
+  // From here on a reader waits for its writer; if there is none yet, it is at
+  // the end.
   if (::fcntl(fd, F_SETFL, flags & O_APPEND) != 0) return give_up(fd, errno);
   return fd;
 }
@@ -468,6 +468,14 @@ bool on_one_device(std::string_view from, std::string_view to) {
   const bool crosses = crosses_devices(from, to);
   set_last_error(number);  // nothing that this call meets is its failure
   return !crosses;
+}
+
+bool make_writable(std::string_view name) {
+  Path path;
+  Status status;
+  if (!status_of_file(name, path, status)) return false;
+  const mode_t mode = (status.st_mode & k_permissions) | S_IWUSR;
+  return ::chmod(path.text, mode) == 0 || fail_on(path);
 }
 
 bool copy_permissions(std::string_view from, std::string_view to) {

@@ -18,7 +18,6 @@ using posix::fail_on;
 using posix::fail_with;
 using posix::find;
 using posix::is_absent;
-using posix::is_null_device;
 using posix::is_printer;
 using posix::on_existing;
 using posix::Path;

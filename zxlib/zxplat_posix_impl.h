@@ -23,9 +23,6 @@ struct Path {
   std::size_t length;
 };
 
-// True for the name of the null device.
-bool is_null_device(std::string_view name);
-
 // True for a name of the printer, which this system has none of.
 bool is_printer(std::string_view name);
 

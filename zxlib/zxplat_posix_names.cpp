@@ -53,6 +53,9 @@ int number_of(int error) {
   return k_err_io;
 }
 
+// What no name can have on Windows.  A colon is let through: it is usual here.
+constexpr std::string_view k_refused_bytes("*?\"<>|\0", 7);
+
 constexpr bool is_slash(char c) { return c == '\\' || c == '/'; }
 
 constexpr char fold(char c) {
@@ -81,7 +84,7 @@ bool is_unc(std::string_view name) {
 // The number that refuses a name by its form alone, or k_err_none.
 int refusal(std::string_view name) {
   if (name.empty()) return k_err_path_not_found;
-  if (name.find('\0') != name.npos) return k_err_bad_name;
+  if (name.find_first_of(k_refused_bytes) != name.npos) return k_err_bad_name;
   if (name.size() > k_max_name) return k_err_bad_name;
   if (is_null_device(name) || is_printer(name)) return k_err_not_found;
   if (is_unc(name)) return k_err_path_not_found;
@@ -240,8 +243,6 @@ bool is_folder(const Path& path) {
 }
 
 }  // namespace
-
-bool is_null_device(std::string_view name) { return folds_alike(name, "nul"); }
 
 bool is_printer(std::string_view name) {
   return folds_alike(name, "prn") || folds_alike(name, "lpt1");

@@ -70,12 +70,6 @@ void Attempt::restore() const { set_last_error(before); }
 
 void Attempt::settle_failure() { set_last_error(number_of_failure()); }
 
-bool is_null_device(std::string_view name) {
-  return name.size() == 3 && (name[0] == 'n' || name[0] == 'N') &&
-         (name[1] == 'u' || name[1] == 'U') &&
-         (name[2] == 'l' || name[2] == 'L');
-}
-
 bool to_name(std::string_view name, Name& out) {
   if (name.empty()) return fail_with(k_err_path_not_found);
   if (name.find('\0') != name.npos) return fail_with(k_err_bad_name);

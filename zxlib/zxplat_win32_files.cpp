@@ -19,7 +19,6 @@ namespace {
 
 using win32::Attempt;
 using win32::fail_with;
-using win32::is_null_device;
 using win32::Name;
 using win32::to_name;
 
@@ -436,6 +435,17 @@ bool on_one_device(std::string_view from, std::string_view to) {
   const bool crosses = crosses_devices(from, to);
   attempt.restore();  // nothing that this call meets is its failure
   return !crosses;
+}
+
+bool make_writable(std::string_view name) {
+  Name text;
+  if (!to_name(name, text)) return false;
+  const Attempt attempt;
+  const DWORD attributes = ::GetFileAttributesA(text.text);
+  const DWORD wanted =
+      attributes & ~static_cast<DWORD>(FILE_ATTRIBUTE_READONLY);
+  return attempt.settle(attributes != INVALID_FILE_ATTRIBUTES &&
+                        ::SetFileAttributesA(text.text, wanted) != 0);
 }
 
 bool copy_permissions(std::string_view from, std::string_view to) {

@@ -37,7 +37,7 @@ bool is_dots(std::string_view name) { return name == "." || name == ".."; }
 
 // The system puts a question mark for what its code page does not have.
 bool is_usable(std::string_view name) {
-  return name.find('?') == name.npos && !win32::is_null_device(name);
+  return name.find('?') == name.npos && !is_null_device(name);
 }
 
 using Data = WIN32_FIND_DATAA;

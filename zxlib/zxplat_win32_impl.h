@@ -40,9 +40,6 @@ struct Name {
   char text[k_max_name + 1];
 };
 
-// True for the name of the null device.
-bool is_null_device(std::string_view name);
-
 // Closes a name by a NUL.  False with the number set if no file can have
 // that name; the null device is none.
 bool to_name(std::string_view name, Name& out);

@@ -133,6 +133,20 @@ class zxQVA {
     return value;
   }
 
+  // Makes n default elements ahead of the others, which become the first ones.
+  // Room is made for about as many again, so that repeated calls cost no more
+  // than the elements that they make.
+  void grow_front(std::int32_t n) {
+    if (!check() || !ZX_ASSERT(n >= 0)) return;
+    if (n > offset && !make_room_in_front(n)) return;
+    for (; n > 0; --n) {
+      ::new (static_cast<void*>(first - 1)) T();
+      --first;
+      --offset;
+      ++count;
+    }
+  }
+
   // ---- sizing
   // Destroys the elements behind the first n, or grows to n.
   void set_length(std::int32_t n) {
@@ -248,6 +262,19 @@ class zxQVA {
     reserve(wanted > INT32_MAX ? INT32_MAX : static_cast<std::int32_t>(wanted),
             0);
     return i < capacity;
+  }
+
+  // Room for n elements ahead of the first one.
+  bool make_room_in_front(std::int32_t n) {
+    const std::int64_t wanted = std::int64_t{n} + count;
+    const std::int64_t total = wanted + count;
+    if (total >= k_limit) {
+      bail_code(2205);
+      return false;
+    }
+    if (total > capacity) resize_block(static_cast<std::int32_t>(total));
+    slide_to(static_cast<std::int32_t>(wanted));
+    return true;
   }
 
   static void move_bytes(T* to, const T* from, std::int32_t n) {

@@ -59,7 +59,7 @@ enum class Safety { source_stays, source_goes };
 // failure was dropped on the way.
 zxStr copy_beside(const zxStr& from, const zxStr& to, Safety safety) {
   zxBFile in;
-  in.open_or_die(from);
+  in.open_or_die(from == "-" ? zxStr(".\\-") : from);  // the file, no stream
   if (!in.is_open()) return {};
   zxBFile out;
   const zxStr name = create_unique_or_die(out, &zxBFile::try_create_private,
@@ -74,26 +74,16 @@ zxStr copy_beside(const zxStr& from, const zxStr& to, Safety safety) {
   return {};
 }
 
-// A copy of a file without write permission has none either, which keeps it
-// from being deleted; then it takes that of a fresh file.
-void delete_copy(const zxStr& copy) {
-  if (zxplat::files.remove(copy.view())) return;
-  zxBFile fresh;
-  zxStr name;
-  const bool is_made =
-      create_unique(fresh, &zxBFile::try_create_private, dir_part(copy), "cpy",
-                    name) == zxUnique::created;
-  if (!is_made) return;
-  fresh.close();
-  zxplat::copy_permissions(name.view(), copy.view());
-  zxplat::files.remove(name.view());
-  zxplat::files.remove(copy.view());
-}
-
 // Deletes a copy that cannot take its place; the failure shows its own cause.
-bool give_copy_up(const zxStr& copy, std::int32_t message, const zxStr& to) {
+// Where the file that was deleted to make place was the source itself, the
+// copy is all that there is of it, and stays.
+bool give_copy_up(const zxStr& from, const zxStr& copy, std::int32_t message,
+                  const zxStr& to) {
   const int reason = zxplat::last_error();
-  delete_copy(copy);
+  if (zxplat::kind_of(from.view()) != zxplat::NameKind::missing) {
+    zxplat::make_writable(copy.view());
+    zxplat::files.remove(copy.view());
+  }
   zxplat::set_last_error(reason);
   bail_code(message, to);
   return false;
@@ -105,10 +95,10 @@ bool copy_file(const zxStr& from, const zxStr& to, Safety safety) {
   if (copy.is_empty()) return false;
   copy_time(from, copy);
   zxplat::copy_permissions(from.view(), copy.view());
-  if (!try_delete(to)) return give_copy_up(copy, 1027, to);
+  if (!try_delete(to)) return give_copy_up(from, copy, 1027, to);
   const bool renamed = zxplat::files.rename(copy.view(), to.view()) ==
                        zxplat::RenameResult::done;
-  return renamed || give_copy_up(copy, 1038, to);
+  return renamed || give_copy_up(from, copy, 1038, to);
 }
 
 bool crosses_devices(zxplat::RenameResult result) {
@@ -164,7 +154,8 @@ void move_file(const zxStr& from, const zxStr& to) {
   const bool onto_folder =
       zxplat::kind_of(to.view()) == zxplat::NameKind::directory;
   if (!ZX_ASSERT_AT(!onto_folder, "zxsys2", 288)) return;
-  if (!zxplat::name_taken(from.view())) return bail_code(1002, from);
+  if (zxplat::is_null_device(from.view()) || !zxplat::name_taken(from.view()))
+    return bail_code(1002, from);
 
   // An old target must outlive a copy that may fail half way.
   if (!zxplat::on_one_device(from.view(), to.view()))
@@ -226,7 +217,8 @@ void createdir(const zxStr& name) {
 }
 
 bool make_path(const zxStr& name) {
-  if (name.is_empty()) return false;
+  if (name.is_empty() || zx_size(name.length()) > zxplat::k_max_name)
+    return false;
   zxQVA<zxStr> missing;  // the innermost first
   zxStr path = without_final_separators(name);
   while (!isfile(path, "d")) {
@@ -237,8 +229,11 @@ bool make_path(const zxStr& name) {
     path = without_final_separators(above);
     if (path.length() >= missing.last().length()) return false;
   }
-  while (missing.length() > 0)
-    if (!try_createdir(missing.pop_last())) return false;
+  while (missing.length() > 0) {
+    const zxStr next = missing.pop_last();
+    // Another process may have been faster.
+    if (!try_createdir(next) && !isfile(next, "d")) return false;
+  }
   return true;
 }
 

@@ -52,7 +52,8 @@ bool file2conflines(const zxStr& name, zxQVA<zxStr>& lines,
 
 // Copies `size` bytes from where `in` stands to where `out` stands, or all up
 // to the end of `in` for -1.  Fatal if `in` has fewer or a read fails (1014),
-// or a write fails (1016).
+// or a write fails (1016).  What has no end, such as some devices, is read up
+// to the size that it tells, but at least 0x7FFFFFFF bytes (then 1014).
 void copy_stream(zxBFile& in, zxBFile& out, std::int32_t size = -1);
 
 // Adds the bytes of `from` to the end of `to`, which is made if it is missing.
@@ -82,7 +83,8 @@ std::uint16_t file_crc(const zxStr& name);
 // beside `to`, so that `to` is replaced by a complete copy only.  Fatal if
 // `from` cannot be opened (1002), the copy not be made (1004, 1010, 1014,
 // 1016, 1037), `to` not be deleted (1027) or the copy not be renamed
-// (1038); in the last two cases the copy is deleted.
+// (1038); in the last two cases the copy is deleted, unless `to` was the file
+// `from` itself: then the copy is all that is left of it, and stays.
 void cpfile(const zxStr& from, const zxStr& to);
 
 // Renames a file, replacing `to`; across devices it is copied as by
@@ -154,8 +156,8 @@ std::int32_t disk_kb(char drive_letter);
 // fails an assertion.
 bool drive_ok(char drive_letter);
 
-// True if there are 512000 bytes left on the drive of a path, or on the
-// current one, and files can be made in the directory `path`.
+// True if there are 512000 bytes left on the drive that a path names, or on
+// the current one, and files can be made in the directory `path`.
 bool space_for(const zxStr& path);
 
 // ---------------------------------------------- temporary, environment --

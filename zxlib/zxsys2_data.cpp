@@ -40,14 +40,21 @@ std::int32_t read_block(zxBFile& file, char* room, std::int32_t size) {
   return got;
 }
 
-// How much to ask for next: all that the file seems to have and a byte more,
-// which shows its end; a pipe, or a file that grows, tells too little.
+// Writes bytes; true, if the call came back, says that they were taken.
+bool write_block(zxBFile& file, const char* bytes, std::int32_t size) {
+  file.write(bytes, size);
+  return file.is_open() && !file.handle->error();
+}
+
+// How much to ask for next: as much again as came, but not more than a byte
+// behind what the file seems to have, which shows its end.  A pipe, or a file
+// that grows, tells too little, and one with holes too much.
 std::int32_t next_block(zxBFile& file, std::int32_t done) {
-  const std::int64_t seen = file.handle->size() - done;
-  const std::int64_t block =
-      std::max<std::int64_t>({seen + 1, k_read_block, done});
-  return static_cast<std::int32_t>(
-      std::min<std::int64_t>(block, k_most_read - done));
+  const std::int64_t unread = file.handle->size() - done;
+  std::int32_t block = std::max(k_read_block, done);
+  if (unread > 0 && unread < block)
+    block = static_cast<std::int32_t>(unread) + 1;
+  return std::min(block, k_most_read - done);
 }
 
 // Reads lines, each of which `clean` is called on; those that come out empty
@@ -95,11 +102,19 @@ std::int64_t time_of(const zxStr& name) {
   return zxplat::status_of(name.view()).modified;
 }
 
-// True if the bytes came.
+// True if the bytes came and were taken.
 bool copy_block(zxBFile& in, zxBFile& out, char* room, std::int32_t size) {
-  if (!in.read_all(room, size)) return false;
-  out.write(room, size);
-  return true;
+  return in.read_all(room, size) && write_block(out, room, size);
+}
+
+void copy_to_end(zxBFile& in, zxBFile& out, char* room) {
+  std::int64_t left = INT32_MAX;
+  if (in.is_open()) left = std::max(left, in.handle->size());
+  while (const std::int32_t got = read_block(in, room, k_copy_block)) {
+    left -= got;
+    if (left < 0) return bail_code(1014, in.name);
+    if (!write_block(out, room, got)) return;
+  }
 }
 
 }  // namespace
@@ -144,8 +159,8 @@ bool file2str(const zxStr& name, zxStr& text) {
     got = read_block(file, room + done, block);
     done += got;
   } while (got == block && done < k_most_read);
-  text.set_length(done);
   const bool is_read = !file.handle->error();
+  text.set_length(is_read ? done : 0);
   file.close(no_detail);
   return is_read;
 }
@@ -170,9 +185,7 @@ void copy_stream(zxBFile& in, zxBFile& out, std::int32_t size) {
   if (!ZX_ASSERT(size >= -1)) return;
   zxStr block;
   char* const room = block.buffer(k_copy_block);
-  if (size == -1)
-    while (const std::int32_t got = read_block(in, room, k_copy_block))
-      out.write(room, got);
+  if (size == -1) return copy_to_end(in, out, room);
   for (std::int32_t left = size; left > 0; left -= k_copy_block)
     if (!copy_block(in, out, room, std::min(left, k_copy_block))) return;
 }
