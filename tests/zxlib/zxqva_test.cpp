@@ -428,6 +428,48 @@ TEST(zxqva, growth_takes_the_room_in_front_back) {
   EXPECT_EQ(array.get(12), 0);
 }
 
+TEST(zxqva, elements_made_in_front_push_the_others_back) {
+  zxQVA<zxStr> array;
+  array.append("c");
+  array.append("d");
+  array.grow_front(2);
+  EXPECT_TRUE(array.get(0).is_empty());
+  array.get(0) = "a";
+  array.get(1) = "b";
+  std::string all;
+  for (const zxStr& text : array) all += text.c_str();
+  EXPECT_EQ(all, "abcd");
+}
+
+TEST(zxqva, room_in_front_is_made_for_as_many_again) {
+  zxQVA<int> array;
+  fill(array, 10);  // in a block of 32
+  array.grow_front(3);
+  EXPECT_EQ(shape_of(array), "32 13 10");
+  array.grow_front(10);
+  EXPECT_EQ(shape_of(array), "32 23 0");
+  array.grow_front(1);
+  EXPECT_EQ(shape_of(array), "47 24 23");
+  array.grow_front(0);
+  EXPECT_EQ(shape_of(array), "47 24 23");
+  zxQVA<int> empty;
+  empty.grow_front(0);
+  EXPECT_EQ(shape_of(empty), "0 0 0");
+  empty.grow_front(1);
+  EXPECT_EQ(shape_of(empty), "1 1 0");
+}
+
+// As many moves as elements, give or take, and not their square.
+TEST(zxqva, a_million_elements_go_in_front_one_by_one) {
+  zxQVA<int> array;
+  constexpr int k_count = 1'000'000;
+  for (int i = 0; i < k_count; ++i) {
+    array.grow_front(1);
+    array.get(0) = i;
+  }
+  for (int i = 0; i < k_count; ++i) ASSERT_EQ(array.get(i), k_count - 1 - i);
+}
+
 // ----------------------------------------------------------------- sizing --
 
 TEST(zxqva, set_length_destroys_or_makes_elements) {
@@ -522,6 +564,7 @@ TEST(zxqva, negative_sizes_are_assertions) {
   EXPECT_ASSERTION(array.reserve(5, -1), "zxqva");
   EXPECT_ASSERTION(array.reserve(INT_MIN, INT_MIN), "zxqva");
   EXPECT_ASSERTION(array.slide_to(-1), "zxqva");
+  EXPECT_ASSERTION(array.grow_front(-1), "zxqva");
   EXPECT_EQ(shape_of(array), "32 2 0");
 }
 
@@ -572,6 +615,7 @@ void expect_limit(int limit) {
   EXPECT_FAILURE(array.reserve(INT_MAX, INT_MAX), k_too_big, k_line);
   EXPECT_FAILURE(array.ref(INT_MAX), k_too_big, k_line);
   EXPECT_FAILURE(array.grow_to(INT_MAX), k_too_big, k_line);
+  EXPECT_FAILURE(array.grow_front(INT_MAX), k_too_big, k_line);
   EXPECT_FAILURE(array.set_length(INT_MAX), k_too_big, k_line);
   // One less is asked of the heap.
   EXPECT_FAILURE(array.reserve(limit - 1, 0), "2000: malloc: out of mem",
@@ -628,6 +672,7 @@ const Operation k_checked_operations[] = {
     {"reserve", [](zxQVA<int>& a) { a.reserve(100, 0); }},
     {"grow_to", [](zxQVA<int>& a) { a.grow_to(100); }},
     {"slide_to", [](zxQVA<int>& a) { a.slide_to(1); }},
+    {"grow_front", [](zxQVA<int>& a) { a.grow_front(1); }},
 };
 
 const struct {
@@ -692,6 +737,8 @@ TEST(zxqva, a_dropped_failure_gives_a_neutral_value_and_changes_nothing) {
     array.reserve(-1, 0);
     array.reserve(INT_MAX, INT_MAX);
     array.slide_to(31);
+    array.grow_front(-1);
+    array.grow_front(INT_MAX);
   });
   EXPECT_EQ(shape_of(array), "32 2 0");
   EXPECT_TRUE(array.get(0) == "a");
@@ -749,6 +796,14 @@ struct Model {
     all.pop_front();
     ++offset;
   }
+  void grow_front(int n) {
+    if (n > offset) {
+      capacity = std::max(capacity, n + 2 * count());
+      offset = n + count();
+    }
+    offset -= n;
+    all.insert(all.begin(), static_cast<std::size_t>(n), "");
+  }
   void set_length(int n) {
     if (n > count())
       grow_to(n - 1);
@@ -764,7 +819,7 @@ class Pair {
   void step() {
     const std::string text = std::to_string(random());
     const int i = static_cast<int>(random() % 40);
-    switch (random() % 14) {
+    switch (random() % 15) {
       case 0:
       case 1:
       case 2:
@@ -799,6 +854,10 @@ class Pair {
         break;
       case 12:
         cut();
+        break;
+      case 13:
+        real.grow_front(i);
+        model.grow_front(i);
         break;
       default:
         ASSERT_EQ(
