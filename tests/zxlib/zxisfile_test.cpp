@@ -39,6 +39,7 @@ using kit::write_file;
 using Names = std::vector<std::string>;
 
 constexpr std::int32_t k_most = std::numeric_limits<std::int32_t>::max();
+constexpr std::int32_t k_least = std::numeric_limits<std::int32_t>::min();
 constexpr std::int32_t k_untouched = -77;
 
 // ---------------------------------------------------------------- helpers --
@@ -286,6 +287,9 @@ TEST(zxisfile, times_end_at_32_bits) {
     EXPECT_EQ(told_of(place.file).time, k_most);
     EXPECT_EQ(file_time(str(place.file)), k_most);
   }
+  // Some file systems end there themselves.
+  set_seconds(place.file, std::int64_t{k_least} - 100'000'000);
+  EXPECT_EQ(told_of(place.file).time, k_least);
 }
 
 // ------------------------------------------------------------ the letters --
