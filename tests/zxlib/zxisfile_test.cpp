@@ -10,7 +10,6 @@
 #include <chrono>
 #include <cstdint>
 #include <filesystem>
-#include <functional>
 #include <limits>
 #include <random>
 #include <string>
@@ -651,6 +650,40 @@ TEST(zxisfile, a_name_that_another_process_takes_first_is_its_own) {
   EXPECT_EQ(faults.count(Call::open), 30);
   EXPECT_EQ(faults.count(Call::remove), 0);
   EXPECT_TRUE(names_in(folder.path()).empty());
+}
+
+// Another process makes the file just ahead of the first one that is made
+// here.
+class Rival {
+ public:
+  Rival() {
+    made.clear();
+    zxplat::files.open = [](std::string_view name, zxplat::OpenMode mode) {
+      if (made.empty()) {
+        made = name;
+        const zxplat::Fd fd =
+            zxplat::system_files.open(name, zxplat::OpenMode::create_new);
+        zxplat::system_files.write(fd, "rival", 5);
+        zxplat::system_files.close(fd);
+      }
+      return zxplat::system_files.open(name, mode);
+    };
+  }
+  Rival(const Rival&) = delete;
+  Rival& operator=(const Rival&) = delete;
+  ~Rival() { zxplat::files.open = zxplat::system_files.open; }
+
+  static inline std::string made;
+};
+
+TEST(zxisfile, a_file_that_appears_in_between_is_neither_cut_nor_deleted) {
+  const TempDir folder;
+  const Rival rival;
+  EXPECT_TRUE(holds(folder.path(), "dw"));
+  const Names left = names_in(folder.path());
+  ASSERT_EQ(left.size(), 1U);
+  EXPECT_TRUE(Rival::made.ends_with(left[0]));
+  EXPECT_EQ(kit::read_file(folder.file(left[0])), "rival");
 }
 
 TEST(zxisfile, no_failing_system_call_ends_the_process) {
