@@ -10,7 +10,6 @@
 #include <chrono>
 #include <cstdint>
 #include <filesystem>
-#include <functional>
 #include <limits>
 #include <random>
 #include <string>
@@ -39,6 +38,7 @@ using kit::write_file;
 using Names = std::vector<std::string>;
 
 constexpr std::int32_t k_most = std::numeric_limits<std::int32_t>::max();
+constexpr std::int32_t k_least = std::numeric_limits<std::int32_t>::min();
 constexpr std::int32_t k_untouched = -77;
 
 // ---------------------------------------------------------------- helpers --
@@ -286,6 +286,9 @@ TEST(zxisfile, times_end_at_32_bits) {
     EXPECT_EQ(told_of(place.file).time, k_most);
     EXPECT_EQ(file_time(str(place.file)), k_most);
   }
+  // Some file systems end there themselves.
+  set_seconds(place.file, std::int64_t{k_least} - 100'000'000);
+  EXPECT_EQ(told_of(place.file).time, k_least);
 }
 
 // ------------------------------------------------------------ the letters --
@@ -647,6 +650,40 @@ TEST(zxisfile, a_name_that_another_process_takes_first_is_its_own) {
   EXPECT_EQ(faults.count(Call::open), 30);
   EXPECT_EQ(faults.count(Call::remove), 0);
   EXPECT_TRUE(names_in(folder.path()).empty());
+}
+
+// Another process makes the file just ahead of the first one that is made
+// here.
+class Rival {
+ public:
+  Rival() {
+    made.clear();
+    zxplat::files.open = [](std::string_view name, zxplat::OpenMode mode) {
+      if (made.empty()) {
+        made = name;
+        const zxplat::Fd fd =
+            zxplat::system_files.open(name, zxplat::OpenMode::create_new);
+        zxplat::system_files.write(fd, "rival", 5);
+        zxplat::system_files.close(fd);
+      }
+      return zxplat::system_files.open(name, mode);
+    };
+  }
+  Rival(const Rival&) = delete;
+  Rival& operator=(const Rival&) = delete;
+  ~Rival() { zxplat::files.open = zxplat::system_files.open; }
+
+  static inline std::string made;
+};
+
+TEST(zxisfile, a_file_that_appears_in_between_is_neither_cut_nor_deleted) {
+  const TempDir folder;
+  const Rival rival;
+  EXPECT_TRUE(holds(folder.path(), "dw"));
+  const Names left = names_in(folder.path());
+  ASSERT_EQ(left.size(), 1U);
+  EXPECT_TRUE(Rival::made.ends_with(left[0]));
+  EXPECT_EQ(kit::read_file(folder.file(left[0])), "rival");
 }
 
 TEST(zxisfile, no_failing_system_call_ends_the_process) {
