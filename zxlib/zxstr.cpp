@@ -481,6 +481,7 @@ zxStr operator+(char a, const zxStr& b) {
 }
 
 void trim(zxStr& text) {
+  if (!text.check()) return;
   const char* first = text.begin();
   const char* last = text.end();
   while (first < last && zx_is_space(*first)) ++first;
@@ -491,8 +492,8 @@ void trim(zxStr& text) {
 }
 
 void strip_line_end(zxStr& text) {
+  if (!text.check() || !text.view().ends_with('\n')) return;
   std::int32_t length = text.length();
-  if (!text.view().ends_with('\n')) return;
   --length;
   if (length > 0 && text[length - 1] == '\r') --length;
   text.set_length(length);

@@ -2200,6 +2200,8 @@ const Operation k_checked_operations[] = {
        s = other;
      }},
     {"assign temporary", [](zxStr& s) { s = zxStr("x"); }},
+    {"trim", [](zxStr& s) { trim(s); }},
+    {"strip_line_end", [](zxStr& s) { strip_line_end(s); }},
     {"assign text", [](zxStr& s) { s = "x"; }},
     {"assign byte", [](zxStr& s) { s = 'x'; }},
     {"build", [](zxStr& s) { s.build("x", 1); }},
