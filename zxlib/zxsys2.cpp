@@ -10,7 +10,7 @@
 
 namespace {
 
-constinit zxStr temp_directory;
+constinit zxStr temp_dir;
 
 // What a directory must have free to count as one with space.
 constexpr std::int32_t k_least_space = 512000;
@@ -289,12 +289,12 @@ bool space_for(const zxStr& path) {
 // ---- temporary files, the environment
 
 const zxStr& temp_path() {
-  if (temp_directory.is_empty())
-    temp_directory = with_slash(text_of(zxplat::temp_directory, 575));
-  return temp_directory;
+  if (temp_dir.is_empty())
+    temp_dir = with_slash(text_of(zxplat::temp_directory, 575));
+  return temp_dir;
 }
 
-void clear_temp_path() { temp_directory.clear(); }
+void clear_temp_path() { temp_dir.clear(); }
 
 zxStr uniqfile(const zxStr& directory, const char* extension) {
   zxStr name;

@@ -107,12 +107,16 @@ bool copy_block(zxBFile& in, zxBFile& out, char* room, std::int32_t size) {
   return in.read_all(room, size) && write_block(out, room, size);
 }
 
+// More bytes than a 31-bit size counts must be those of a file that has them.
+bool is_endless(zxBFile& in, std::int64_t copied) {
+  return copied > INT32_MAX && copied > in.handle->size();
+}
+
 void copy_to_end(zxBFile& in, zxBFile& out, char* room) {
-  std::int64_t left = INT32_MAX;
-  if (in.is_open()) left = std::max(left, in.handle->size());
+  std::int64_t copied = 0;
   while (const std::int32_t got = read_block(in, room, k_copy_block)) {
-    left -= got;
-    if (left < 0) return bail_code(1014, in.name);
+    copied += got;
+    if (is_endless(in, copied)) return bail_code(1014, in.name);
     if (!write_block(out, room, got)) return;
   }
 }
