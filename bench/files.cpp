@@ -30,18 +30,21 @@ constexpr std::size_t k_file_size = 100'000'000;
 
 // Lengths as text files have them: most lines short or empty, some a
 // paragraph, and now and then one that no buffer holds.
-std::size_t random_length(std::mt19937& random) {
+std::size_t mixed_length(std::mt19937& random) {
   const std::size_t kind = random() % 1000;
   if (kind == 0) return random() % 200'000;
   if (kind < 50) return random() % 3000;
   return random() % 120;
 }
 
+// Lines of settings and lists: what a line costs counts, not its bytes.
+std::size_t short_length(std::mt19937& random) { return random() % 50; }
+
 // A file of its own in the folder for temporary files, up to the end of the
 // program.
 class LinesFile {
  public:
-  LinesFile() {
+  explicit LinesFile(std::size_t (*random_length)(std::mt19937&)) {
     std::mt19937 random(1);
     std::string text;
     while (text.size() < k_file_size) {
@@ -62,8 +65,13 @@ class LinesFile {
   std::size_t lines = 0;
 };
 
-const LinesFile& lines_file() {
-  static const LinesFile file;
+const LinesFile& mixed_file() {
+  static const LinesFile file(mixed_length);
+  return file;
+}
+
+const LinesFile& short_file() {
+  static const LinesFile file(short_length);
   return file;
 }
 
@@ -98,7 +106,8 @@ std::size_t read_by_std(const char* name) {
   return count;
 }
 
-void read_lines(benchmark::State& state, std::size_t (*read)(const char*)) {
+void read_lines(benchmark::State& state, const LinesFile& (*lines_file)(),
+                std::size_t (*read)(const char*)) {
   const LinesFile& file = lines_file();
   for (auto _ : state) {
     if (read(file.name.c_str()) == file.lines) continue;
@@ -108,15 +117,25 @@ void read_lines(benchmark::State& state, std::size_t (*read)(const char*)) {
   state.counters["operations"] = static_cast<double>(file.lines);
 }
 
-BENCHMARK_CAPTURE(read_lines, ours, read_by_gets)->Name("lines_c/ours");
-BENCHMARK_CAPTURE(read_lines, c, read_by_c)->Name("lines_c/peer");
-BENCHMARK_CAPTURE(read_lines, ours, read_by_gets)->Name("lines_std/ours");
-BENCHMARK_CAPTURE(read_lines, std, read_by_std)->Name("lines_std/peer");
+void register_rows(const std::string& lines, const LinesFile& (*file)()) {
+  const struct {
+    const char* side;
+    std::size_t (*read)(const char*);
+  } sides[] = {{"_c/ours", read_by_gets},
+               {"_c/peer", read_by_c},
+               {"_std/ours", read_by_gets},
+               {"_std/peer", read_by_std}};
+  for (const auto& one : sides)
+    benchmark::RegisterBenchmark((lines + one.side).c_str(), read_lines, file,
+                                 one.read);
+}
 
 }  // namespace
 
 int main(int argc, char** argv) {
   init_zxlib_args(1, argv);
+  register_rows("mixed", mixed_file);
+  register_rows("short", short_file);
   benchmark::Initialize(&argc, argv);
   if (benchmark::ReportUnrecognizedArguments(argc, argv)) return 1;
   benchmark::RunSpecifiedBenchmarks();

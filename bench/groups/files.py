@@ -1,4 +1,4 @@
-"""Reading a file of 100 MB line by line and copying one of 500 MB, beside
+"""Reading files of 100 MB line by line and copying one of 500 MB, beside
 other ways to do so.
 
 The lines are read by bench/files.cpp, whose figures are nanoseconds per line.
@@ -22,11 +22,10 @@ def line_rows(bench):
     program = kit.GoogleBenchmark("bench_files", bench,
                                   bench.rounds(REPETITIONS))
     return [
-        program.compared("lines of mixed lengths, ns", "lines_c",
-                         "getline of C", firm=1.0),
-        program.compared("lines of mixed lengths, ns", "lines_std",
-                         "std::getline", firm=1.0),
-    ]
+        program.compared("lines, %s, ns" % lengths, "%s_%s" % (lengths, what),
+                         peer, firm=1.0)
+        for lengths in ("mixed", "short")
+        for what, peer in (("c", "getline of C"), ("std", "std::getline"))]
 
 
 def make_source(path):
