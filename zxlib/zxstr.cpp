@@ -183,6 +183,21 @@ zxStr& zxStr::operator=(char byte) {
 
 void zxStr::build(const char* a, std::int32_t a_length, const char* b,
                   std::int32_t b_length) {
+  // One text into a block of the string's own that holds it: the usual case
+  // of a string that is used again and again.
+  const bool is_simple = is_sound(*rep) && rep->refs == 1 && b_length == 0 &&
+                         a != nullptr && a_length >= 0 &&
+                         a_length <= rep->capacity;
+  if (!is_simple) return build_in_general(a, a_length, b, b_length);
+  copy_text(rep->data, a, zx_size(a_length));
+  rep->length = a_length;
+  rep->data[a_length] = '\0';
+}
+
+[[gnu::noinline]] void zxStr::build_in_general(const char* a,
+                                               std::int32_t a_length,
+                                               const char* b,
+                                               std::int32_t b_length) {
   if (!check() || !ZX_ASSERT(b != nullptr || b_length == 0) ||
       !ZX_ASSERT(a != nullptr && a_length >= 0 && b_length >= 0))
     return;

@@ -223,6 +223,8 @@ class zxStr {
     ++rep->refs;
   }
   void start(const char* characters, std::int32_t length);
+  void build_in_general(const char* a, std::int32_t a_length, const char* b,
+                        std::int32_t b_length);
   void release() {
     if (rep->refs != 0 && --rep->refs == 0) zx_realloc(rep, 0);
   }

@@ -54,6 +54,7 @@ TEST(zxnextf_page, each_specification_stands_for_the_names_beside_it) {
   const kit::WorkingIn there(folder.path());
   int rows = 0;
   for (const auto& cells : kit::rows_in(k_page)) {
+    if (cells.size() != 2) continue;  // what differs between systems
     if (cells[0].find_first_of("\\/") == std::string::npos) continue;
     EXPECT_EQ(names_of(cells[0]), words_of(cells[1])) << cells[0];
     ++rows;
@@ -67,6 +68,7 @@ TEST(zxnextf_page, each_letter_of_the_page_asks_something) {
   const kit::TempDir folder;
   std::string letters;
   for (const auto& cells : kit::rows_in(k_page)) {
+    if (cells.size() != 2) continue;
     const Names words = words_of(cells[0]);
     for (const std::string& word : words)
       if (word.size() <= 2) letters += word[0];
