@@ -354,9 +354,8 @@ FileStatus status_from(const char* path, const Answer& answer) {
       (answer.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
   const auto high = static_cast<std::int64_t>(answer.nFileSizeHigh);
   struct __stat64 guess;
-  const bool is_executable =
-      is_folder ||
-      (::_stat64(path, &guess) == 0 && (guess.st_mode & _S_IEXEC) != 0);
+  const bool is_executable = is_folder || (::_stat64(path, &guess) == 0 &&
+                                           (guess.st_mode & _S_IEXEC) != 0);
   return {is_folder ? NameKind::directory : NameKind::file,
           is_folder ? 0 : high << 32 | answer.nFileSizeLow,
           seconds_of(answer.ftLastWriteTime), is_executable};

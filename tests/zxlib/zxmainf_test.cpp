@@ -273,8 +273,7 @@ TEST(zxmainf, a_stream_that_cannot_be_switched_to_binary_fails_an_assertion) {
   static zxStream stream(zxplat::k_stdin_fd);
   zxBFile file;
   zxplat::files.set_mode = [](zxplat::Fd, zxplat::StreamMode) { return false; };
-  EXPECT_FAILURE(file.attach("-", stream),
-                 "1000: bailed out: zxmainf:44 ",
+  EXPECT_FAILURE(file.attach("-", stream), "1000: bailed out: zxmainf:44 ",
                  "[1000-1000-0/E-0/E/zxmainf:44/]");
   kit::with_failures_dropped([&] { file.attach("-", stream); });
   zxplat::files.set_mode = zxplat::system_files.set_mode;
