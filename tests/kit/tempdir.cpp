@@ -2,6 +2,7 @@
 
 #include "tempdir.h"
 
+#include <algorithm>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -69,6 +70,25 @@ void write_file(const std::string& path, std::string_view bytes) {
   out.write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
   out.close();
   if (!out) throw std::runtime_error("cannot write " + path);
+}
+
+std::vector<std::string> names_in(const std::string& folder) {
+  std::vector<std::string> names;
+  for (const auto& entry : fs::directory_iterator(folder))
+    names.push_back(entry.path().filename().string());
+  std::sort(names.begin(), names.end());
+  return names;
+}
+
+void make_read_only(const std::string& path) {
+  constexpr fs::perms k_write =
+      fs::perms::owner_write | fs::perms::group_write | fs::perms::others_write;
+  fs::permissions(path, k_write, fs::perm_options::remove);
+}
+
+bool is_read_only(const std::string& path) {
+  return (fs::status(path).permissions() & fs::perms::owner_write) ==
+         fs::perms::none;
 }
 
 }  // namespace kit

@@ -4,6 +4,7 @@
 
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace kit {
 
@@ -46,6 +47,15 @@ std::string read_file(const std::string& path);
 // Makes the file, or replaces what is in it.  Throws std::runtime_error if
 // that fails.
 void write_file(const std::string& path, std::string_view bytes);
+
+// The names in a folder, sorted.
+std::vector<std::string> names_in(const std::string& folder);
+
+// Takes all permission to write from a file.
+void make_read_only(const std::string& path);
+
+// True if its owner has none.
+bool is_read_only(const std::string& path);
 
 }  // namespace kit
 

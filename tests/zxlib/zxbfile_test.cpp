@@ -22,6 +22,7 @@
 #include <utility>
 #include <vector>
 
+#include "file_model.h"
 #include "kit/cases.h"
 #include "kit/failure.h"
 #include "kit/faults.h"
@@ -1895,20 +1896,9 @@ TEST_F(zxbfile, a_lock_keeps_other_processes_out) {
 
 // ---- random operations
 
-// What the file is, byte by byte, and where the object stands.
-struct Model {
-  std::string bytes;
-  std::size_t at = 0;
-  bool met_end = false;
+// A file and the lines of it that were counted.
+struct Model : FileModel {
   std::int32_t lines = 0;
-
-  std::string read(std::size_t size) {
-    const std::size_t start = std::min(at, bytes.size());
-    const std::string got = bytes.substr(start, size);
-    at += got.size();
-    if (got.size() < size) met_end = true;
-    return got;
-  }
 
   std::string line() {
     const std::size_t feed =
@@ -1919,16 +1909,8 @@ struct Model {
     return got;
   }
 
-  void write(std::string_view text) {
-    if (text.empty()) return;
-    if (bytes.size() < at + text.size()) bytes.resize(at + text.size());
-    bytes.replace(at, text.size(), text);
-    at += text.size();
-  }
-
   void seek(std::size_t place) {
-    at = place;
-    met_end = false;
+    FileModel::seek(place);
     if (place == 0) lines = 0;
   }
 };

@@ -14,6 +14,7 @@
 #include <utility>
 #include <vector>
 
+#include "file_model.h"
 #include "kit/cases.h"
 #include "kit/failure.h"
 #include "kit/faults.h"
@@ -491,33 +492,6 @@ TEST(zxfile, behind_the_end_there_is_nothing_to_read_but_room_to_write) {
 
 // ---- random operations
 
-// What the file is, byte by byte, and where the stream stands.
-struct Model {
-  std::string bytes;
-  std::size_t at = 0;
-  bool met_end = false;
-
-  std::string read(std::size_t size) {
-    const std::size_t start = std::min(at, bytes.size());
-    const std::string got = bytes.substr(start, size);
-    at += got.size();
-    if (got.size() < size) met_end = true;
-    return got;
-  }
-
-  void write(std::string_view text) {
-    if (text.empty()) return;
-    if (bytes.size() < at + text.size()) bytes.resize(at + text.size());
-    bytes.replace(at, text.size(), text);
-    at += text.size();
-  }
-
-  void seek(std::size_t place) {
-    at = place;
-    met_end = false;
-  }
-};
-
 class Random {
  public:
   explicit Random(unsigned seed) : engine(seed) {}
@@ -583,7 +557,7 @@ class Duel {
 
   bool close() { return stream.close(); }
 
-  Model model;
+  FileModel model;
 
  private:
   void read() {

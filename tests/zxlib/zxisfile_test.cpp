@@ -32,6 +32,8 @@ namespace fs = std::filesystem;
 using namespace std::string_literals;
 using kit::Call;
 using kit::Faults;
+using kit::make_read_only;
+using kit::names_in;
 using kit::TempDir;
 using kit::WorkingIn;
 using kit::write_file;
@@ -73,21 +75,6 @@ Told told_of(const std::string& name, const char* tests = nullptr) {
   Told told = {};
   told.result = isfile(str(name), tests, &told.size, &told.time);
   return told;
-}
-
-Names names_in(const std::string& folder) {
-  Names names;
-  for (const auto& entry : fs::directory_iterator(folder))
-    names.push_back(entry.path().filename().string());
-  std::sort(names.begin(), names.end());
-  return names;
-}
-
-void make_read_only(const std::string& path) {
-  fs::permissions(
-      path,
-      fs::perms::owner_write | fs::perms::group_write | fs::perms::others_write,
-      fs::perm_options::remove);
 }
 
 // A folder with a file and a folder in it.

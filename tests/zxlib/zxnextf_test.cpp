@@ -22,6 +22,7 @@
 #include "kit/faults.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
+#include "kit/ticks.h"
 #include "zxmainf.h"
 #include "zxplat.h"
 #include "zxsfmt.h"
@@ -33,7 +34,9 @@ namespace fs = std::filesystem;
 using namespace std::string_literals;
 using kit::Call;
 using kit::Faults;
+using kit::names_in;
 using kit::TempDir;
+using kit::Ticks;
 using kit::WorkingIn;
 using kit::write_file;
 using Names = std::vector<std::string>;
@@ -65,14 +68,6 @@ std::string lower(std::string text) {
 Names sorted(Names names) {
   std::sort(names.begin(), names.end());
   return names;
-}
-
-// The names in a folder, sorted.
-Names names_in(const std::string& folder) {
-  Names names;
-  for (const auto& entry : fs::directory_iterator(folder))
-    names.push_back(entry.path().filename().string());
-  return sorted(names);
 }
 
 std::string repeated(const std::string& text, int count) {
@@ -675,21 +670,6 @@ TEST(zxnextf, names_with_a_blank_are_quoted) {
 }
 
 // ------------------------------------------------------------ unique names --
-
-// Time stands still at `now` milliseconds.
-class Ticks {
- public:
-  explicit Ticks(std::uint32_t ticks) {
-    now = ticks;
-    zxplat::process.ticks = [] { return now; };
-  }
-  Ticks(const Ticks&) = delete;
-  Ticks& operator=(const Ticks&) = delete;
-  ~Ticks() { zxplat::process.ticks = zxplat::system_process.ticks; }
-
- private:
-  static inline std::uint32_t now;
-};
 
 // A folder whose next unique names are known, since time stands still.
 class UniqueFolder {

@@ -26,6 +26,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
+using kit::make_read_only;
 using kit::TempDir;
 using kit::WorkingIn;
 using namespace std::string_view_literals;
@@ -141,12 +142,6 @@ std::vector<std::string> spellings_in(const std::string& folder) {
 }
 
 using Names = std::vector<std::string>;
-
-void make_read_only(const std::string& path) {
-  constexpr fs::perms k_write =
-      fs::perms::owner_write | fs::perms::group_write | fs::perms::others_write;
-  fs::permissions(path, k_write, fs::perm_options::remove);
-}
 
 std::string with_slashes(std::string name, char slash) {
   for (char& c : name) {

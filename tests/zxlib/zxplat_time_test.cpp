@@ -97,7 +97,7 @@ struct Zone {
 constexpr Zone k_zones[] = {
     {"UTC0", 0, false},           {"EST5EDT", 18'000, true},
     {"IST-2IDT", -7200, true},    {"NPT-5:45", -20'700, false},
-    {"XXX-14", -50'400, false},   {"YYY12", 43'200, false},
+    {"LNT-14", -50'400, false},   {"BKT12", 43'200, false},
     {"NST3:30NDT", 12'600, true},
 };
 

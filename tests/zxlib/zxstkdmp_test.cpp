@@ -37,6 +37,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
+using kit::names_in;
 using kit::TempDir;
 using zxplat::k_no_fd;
 
@@ -701,14 +702,6 @@ TEST(zxstkdmp, names_of_any_length_are_tried_in_bounds) {
 }
 
 // ------------------------------------------------------------- real files --
-
-std::vector<std::string> names_in(const std::string& folder) {
-  std::vector<std::string> names;
-  for (const auto& entry : fs::directory_iterator(folder))
-    names.push_back(entry.path().filename().string());
-  std::sort(names.begin(), names.end());
-  return names;
-}
 
 TEST(zxstkdmp, the_file_is_replaced_by_each_dump) {
   const TempDir dir;

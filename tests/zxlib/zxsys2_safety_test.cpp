@@ -24,19 +24,13 @@ namespace fs = std::filesystem;
 
 using kit::Call;
 using kit::Faults;
+using kit::make_read_only;
+using kit::names_in;
 using kit::read_file;
 using kit::TempDir;
 using kit::WorkingIn;
 using kit::write_file;
 using Names = std::vector<std::string>;
-
-Names names_in(const std::string& folder) {
-  Names names;
-  for (const auto& entry : fs::directory_iterator(folder))
-    names.push_back(entry.path().filename().string());
-  std::sort(names.begin(), names.end());
-  return names;
-}
 
 // What the files of a folder hold, one after the other.
 std::string all_in(const std::string& folder) {
@@ -44,13 +38,6 @@ std::string all_in(const std::string& folder) {
   for (const std::string& name : names_in(folder))
     all += read_file(folder + "/" + name);
   return all;
-}
-
-void make_read_only(const std::string& path) {
-  fs::permissions(
-      path,
-      fs::perms::owner_write | fs::perms::group_write | fs::perms::others_write,
-      fs::perm_options::remove);
 }
 
 // ---- one file under both names

@@ -26,6 +26,7 @@
 #include "kit/process.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
+#include "kit/ticks.h"
 #include "zxmainf.h"
 #include "zxplat.h"
 #include "zxsfmt.h"
@@ -36,8 +37,12 @@ namespace fs = std::filesystem;
 
 using kit::Call;
 using kit::Faults;
+using kit::is_read_only;
+using kit::make_read_only;
+using kit::names_in;
 using kit::read_file;
 using kit::TempDir;
+using kit::Ticks;
 using kit::WorkingIn;
 using kit::write_file;
 using Names = std::vector<std::string>;
@@ -65,30 +70,6 @@ void expect_assertion_at(const std::function<void()>& statement,
   expect_failure(statement, 1000, "bailed out: " + position + " ", position);
 }
 
-// The names in a folder, sorted.
-Names names_in(const std::string& folder) {
-  Names names;
-  for (const auto& entry : fs::directory_iterator(folder))
-    names.push_back(entry.path().filename().string());
-  std::sort(names.begin(), names.end());
-  return names;
-}
-
-// Time stands still at `now` milliseconds.
-class Ticks {
- public:
-  explicit Ticks(std::uint32_t ticks) {
-    now = ticks;
-    zxplat::process.ticks = [] { return now; };
-  }
-  Ticks(const Ticks&) = delete;
-  Ticks& operator=(const Ticks&) = delete;
-  ~Ticks() { zxplat::process.ticks = zxplat::system_process.ticks; }
-
- private:
-  static inline std::uint32_t now;
-};
-
 // Variables of the environment that name the temporary folder; they, and
 // the library's memory of them, are as before at the end.
 class TempVariables {
@@ -114,18 +95,6 @@ class TempVariables {
   static constexpr const char* k_names[] = {"TMPDIR", "TMP", "TEMP"};
   Names before;
 };
-
-void make_read_only(const std::string& path) {
-  fs::permissions(
-      path,
-      fs::perms::owner_write | fs::perms::group_write | fs::perms::others_write,
-      fs::perm_options::remove);
-}
-
-bool is_read_only(const std::string& path) {
-  return (fs::status(path).permissions() & fs::perms::owner_write) ==
-         fs::perms::none;
-}
 
 // ---- the two folders of the process
 
