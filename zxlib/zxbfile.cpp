@@ -156,6 +156,14 @@ void zxBFile::fastio() {
 
 // ---- reading and writing
 
+// The part of read() and try_read() behind their checks.
+bool zxBFile::read_some(void* buffer, std::int32_t size, std::int32_t* got) {
+  const std::int32_t count =
+      static_cast<std::int32_t>(handle->read(buffer, zx_size(size)));
+  if (got != nullptr) *got = count;
+  return count == size || (got != nullptr && count != 0);
+}
+
 bool zxBFile::read(void* buffer, std::int32_t size, std::int32_t* got,
                    const BailDetail& detail) {
   if (got != nullptr) *got = 0;
@@ -164,21 +172,15 @@ bool zxBFile::read(void* buffer, std::int32_t size, std::int32_t* got,
     return false;
   }
   if (!ZX_ASSERT(size >= 0)) return false;
-  const std::int32_t count =
-      static_cast<std::int32_t>(handle->read(buffer, zx_size(size)));
-  if (got != nullptr) *got = count;
-  if (count == size || (got != nullptr && count != 0)) return true;
+  if (read_some(buffer, size, got)) return true;
   if (handle->error() || !handle->eof()) bail_code(1014, name, detail);
   return false;
 }
 
 bool zxBFile::try_read(void* buffer, std::int32_t size, std::int32_t* got) {
   if (got != nullptr) *got = 0;
-  if (!ZX_ASSERT(size >= 0) || handle == nullptr) return false;
-  const std::int32_t count =
-      static_cast<std::int32_t>(handle->read(buffer, zx_size(size)));
-  if (got != nullptr) *got = count;
-  return count == size || (got != nullptr && count != 0);
+  return ZX_ASSERT(size >= 0) && handle != nullptr &&
+         read_some(buffer, size, got);
 }
 
 bool zxBFile::read_all(void* buffer, std::size_t size,

@@ -200,6 +200,7 @@ class zxBFile {
  private:
   bool open_as(const zxStr& file_name, zxplat::OpenMode mode);
   bool is_standard() const;
+  bool read_some(void* buffer, std::int32_t size, std::int32_t* got);
   void count_lines(std::int32_t more);
   bool read_line(zxStr& text);
   bool seek_as_told(std::int32_t position);

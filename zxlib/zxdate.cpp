@@ -10,10 +10,11 @@
 #include "zxtime.h"
 
 using zxdate_detail::DateFields;
+using zxdate_detail::is_between;
+using zxdate_detail::k_first_year;
 
 namespace {
 
-constexpr std::int32_t k_first_year = 1970;
 constexpr std::int32_t k_last_year = 2057;
 constexpr std::int32_t k_days_of_four_years = 1461;
 
@@ -64,11 +65,6 @@ constexpr std::int32_t year_in_full(std::int32_t year, std::int32_t last) {
   if (year >= 0 && year <= 57) return year + 2000;
   if (year >= 70 && year <= last) return year + 1900;
   return year;
-}
-
-constexpr bool is_between(std::int32_t low, std::int32_t value,
-                          std::int32_t high) {
-  return value >= low && value <= high;
 }
 
 // The day count of fields in their ranges; a day beyond its month is one of

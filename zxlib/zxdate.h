@@ -151,6 +151,13 @@ static_assert(sizeof(zxDate) == 2);
 // What zxTime goes by as well.
 namespace zxdate_detail {
 
+inline constexpr std::int32_t k_first_year = 1970;
+
+constexpr bool is_between(std::int32_t low, std::int32_t value,
+                          std::int32_t high) {
+  return value >= low && value <= high;
+}
+
 struct DateFields {
   std::int32_t year;
   std::int32_t month;

@@ -21,15 +21,10 @@ constexpr bool is_illegal(char c) {
   return std::string_view("\"*:<>?|").find(c) != std::string_view::npos;
 }
 
-// True if a name begins with a drive, as in "C:".
-bool has_drive(std::string_view path) {
-  return path.size() >= 2 && zx_is(path[0], k_class_latin) && path[1] == ':';
-}
-
 // True for what keeps its final backslash: "\" and "X:\".
 bool is_root(std::string_view path) {
   return path == "\\" ||
-         (path.size() == 3 && has_drive(path) && path[2] == '\\');
+         (path.size() == 3 && path_has_drive(path) && path[2] == '\\');
 }
 
 // True if the part of a name behind drive or server has legal syntax.
@@ -73,6 +68,10 @@ bool is_free(const zxStr& name) {
 
 // ---- taking apart
 
+bool path_has_drive(std::string_view path) {
+  return path.size() >= 2 && zx_is(path[0], k_class_latin) && path[1] == ':';
+}
+
 // Where the part behind drive or server begins.
 std::int32_t zxPath::take_drive_or_server() {
   const std::string_view text = path.view();
@@ -81,7 +80,7 @@ std::int32_t zxPath::take_drive_or_server() {
     server = zxStr(text.substr(2, end == text.npos ? end : end - 2));
     return 2 + server.length();
   }
-  if (!has_drive(text)) return 0;
+  if (!path_has_drive(text)) return 0;
   drive_letter = zx_upper(text[0]);
   drive = drive_letter - 'A' + 1;
   return 2;
@@ -148,7 +147,7 @@ bool path_relative(const zxStr& path) { return zxPath(path, true).relative; }
 zxStr with_slash(const zxStr& directory) {
   const std::string_view text = directory.view();
   if (text.empty() || text.back() == '\\') return directory;
-  if (text.size() == 2 && has_drive(text)) return directory;
+  if (text.size() == 2 && path_has_drive(text)) return directory;
   if (text.back() != '/') return directory + '\\';
   zxStr result = directory;
   result.at(result.length() - 1) = '\\';

@@ -52,6 +52,9 @@ struct zxPath {
   void strip_directory();
 };
 
+// True if a name begins with a drive, as in "C:".
+bool path_has_drive(std::string_view path);
+
 // The directory with a backslash at its end: unchanged if it is empty, ends
 // in one or is just a drive such as "C:", so that "C:" and "x" join to
 // "C:x", a name relative to the drive.  A final forward slash is replaced.

@@ -42,8 +42,9 @@ void drop_repetitions(zxQVA<zxStr>& names) {
   zxSA<bool> known;
   std::int32_t kept = 0;
   for (const zxStr& name : names) {
-    if (known.contains(name)) continue;
-    known.ref(name) = true;
+    bool& is_known = known.ref(name);
+    if (is_known) continue;
+    is_known = true;
     names.get(kept++) = name;
   }
   names.set_length(kept);

@@ -5,6 +5,8 @@
 #include <cstdint>
 #include <string_view>
 
+#include "zxplat.h"
+
 namespace zxplat::common {
 
 // Where boxes go that are not to be shown: adds the text to the place that
@@ -24,6 +26,16 @@ class BoxText {
   char room[20480];
   std::size_t used = 0;
 };
+
+// True for the two entries that every folder has.
+inline bool is_dots(std::string_view name) {
+  return name == "." || name == "..";
+}
+
+// True if the local clock can show a moment.
+inline bool has_fields(std::int64_t moment) {
+  return moment >= 0 && moment <= k_last_moment;
+}
 
 // Writes all bytes to standard error, if it takes them.
 void write_to_standard_error(std::string_view text);

@@ -8,11 +8,13 @@
 #include <sys/statvfs.h>
 #include <unistd.h>
 
+#include "zxplat_impl.h"
 #include "zxplat_posix_impl.h"
 
 namespace zxplat {
 namespace {
 
+using common::is_dots;
 using posix::fail;
 using posix::fail_on;
 using posix::fail_with;
@@ -41,8 +43,6 @@ int open_folder(std::string_view name) {
   if (fd == k_no_fd) fail_on(path);
   return fd;
 }
-
-bool is_dots(std::string_view name) { return name == "." || name == ".."; }
 
 // True if the name, put behind a folder, names the entry and nothing else.
 bool is_usable(std::string_view name) {

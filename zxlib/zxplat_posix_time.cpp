@@ -3,19 +3,13 @@
 
 #include <time.h>
 
+#include "zxplat_impl.h"
 #include "zxplat_posix_impl.h"
 
 namespace zxplat {
-namespace {
-
-bool has_fields(std::int64_t moment) {
-  return moment >= 0 && moment <= k_last_moment;
-}
-
-}  // namespace
 
 bool local_time(std::int64_t moment, std::tm& fields) {
-  if (!has_fields(moment)) return posix::fail_with(k_err_bad_parameter);
+  if (!common::has_fields(moment)) return posix::fail_with(k_err_bad_parameter);
   const time_t time = moment;
   ::tzset();
   std::tm found;

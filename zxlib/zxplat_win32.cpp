@@ -70,6 +70,12 @@ void Attempt::restore() const { set_last_error(before); }
 
 void Attempt::settle_failure() { set_last_error(number_of_failure()); }
 
+std::int64_t seconds_since_1970(std::uint32_t high, std::uint32_t low) {
+  constexpr std::int64_t k_per_second = 10'000'000;
+  constexpr std::int64_t k_1970 = 11'644'473'600;  // in seconds
+  return (std::int64_t{high} << 32 | low) / k_per_second - k_1970;
+}
+
 bool to_name(std::string_view name, Name& out) {
   if (name.empty()) return fail_with(k_err_path_not_found);
   if (name.find('\0') != name.npos) return fail_with(k_err_bad_name);
@@ -97,15 +103,10 @@ void end_process(int code) { std::exit(code); }
 
 void end_process_at_once(int code) { std::_Exit(code); }
 
-// The system counts tenths of microseconds from 1601-01-01.
-constexpr std::int64_t k_per_second = 10'000'000;
-constexpr std::int64_t k_1970 = 11'644'473'600;  // in seconds
-
 std::int64_t wall_clock() {
   FILETIME time;
   ::GetSystemTimeAsFileTime(&time);
-  const auto high = static_cast<std::int64_t>(time.dwHighDateTime);
-  return (high << 32 | time.dwLowDateTime) / k_per_second - k_1970;
+  return win32::seconds_since_1970(time.dwHighDateTime, time.dwLowDateTime);
 }
 
 std::uint32_t uptime() { return ::GetTickCount(); }

@@ -338,14 +338,6 @@ bool copy_from(std::string_view from, std::string_view to,
                         call(target.text, information));
 }
 
-// The system counts tenths of microseconds from 1601-01-01.
-std::int64_t seconds_of(const FILETIME& time) {
-  constexpr std::int64_t k_per_second = 10'000'000;
-  constexpr std::int64_t k_1970 = 11'644'473'600;  // in seconds
-  const auto high = static_cast<std::int64_t>(time.dwHighDateTime);
-  return (high << 32 | time.dwLowDateTime) / k_per_second - k_1970;
-}
-
 // What an answer of the system on a file comes to; the two structures that
 // it answers in have these fields alike.
 template <typename Answer>
@@ -358,7 +350,9 @@ FileStatus status_from(const char* path, const Answer& answer) {
                                            (guess.st_mode & _S_IEXEC) != 0);
   return {is_folder ? NameKind::directory : NameKind::file,
           is_folder ? 0 : high << 32 | answer.nFileSizeLow,
-          seconds_of(answer.ftLastWriteTime), is_executable};
+          win32::seconds_since_1970(answer.ftLastWriteTime.dwHighDateTime,
+                                    answer.ftLastWriteTime.dwLowDateTime),
+          is_executable};
 }
 
 bool bind_to(Fd from, Fd to) {

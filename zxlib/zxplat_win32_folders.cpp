@@ -6,11 +6,13 @@
 #include <cstring>
 #include <new>
 
+#include "zxplat_impl.h"
 #include "zxplat_win32_impl.h"
 
 namespace zxplat {
 namespace {
 
+using common::is_dots;
 using win32::Attempt;
 using win32::fail_with;
 using win32::Name;
@@ -32,8 +34,6 @@ bool to_pattern(std::string_view folder, Name& pattern) {
   std::strcpy(pattern.text + folder.size(), is_closed ? "*" : "\\*");
   return true;
 }
-
-bool is_dots(std::string_view name) { return name == "." || name == ".."; }
 
 // The system puts a question mark for what its code page does not have.
 bool is_usable(std::string_view name) {

@@ -4,6 +4,7 @@
 #define ZXPLAT_WIN32_IMPL_H
 
 #include <cstddef>
+#include <cstdint>
 #include <string_view>
 
 #include "zxplat.h"
@@ -43,6 +44,10 @@ struct Name {
 // Closes a name by a NUL.  False with the number set if no file can have
 // that name; the null device is none.
 bool to_name(std::string_view name, Name& out);
+
+// A time of the system, in tenths of microseconds from 1601-01-01 on and in
+// two halves, as seconds since 1970-01-01.
+std::int64_t seconds_since_1970(std::uint32_t high, std::uint32_t low);
 
 // The calls of FileCalls on folders and disks.
 bool make_folder(std::string_view name);

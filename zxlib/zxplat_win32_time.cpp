@@ -3,16 +3,14 @@
 
 #include <time.h>
 
+#include "zxplat_impl.h"
 #include "zxplat_win32_impl.h"
 
 namespace zxplat {
 namespace {
 
+using common::has_fields;
 using win32::Attempt;
-
-bool has_fields(std::int64_t moment) {
-  return moment >= 0 && moment <= k_last_moment;
-}
 
 }  // namespace
 

@@ -508,8 +508,7 @@ void trim(zxStr& text) {
 
 void strip_line_end(zxStr& text) {
   if (!text.check() || !text.view().ends_with('\n')) return;
-  std::int32_t length = text.length();
-  --length;
+  std::int32_t length = text.length() - 1;
   if (length > 0 && text[length - 1] == '\r') --length;
   text.set_length(length);
 }

@@ -131,10 +131,7 @@ bool ends_in_separator(const zxStr& path) {
 
 // The name without separators at its end, as far as it is no root.
 zxStr without_final_separators(zxStr path) {
-  const std::string_view text = path.view();
-  const bool has_drive =
-      text.size() > 1 && zx_is(text[0], k_class_latin) && text[1] == ':';
-  const std::int32_t shortest = has_drive ? 3 : 1;
+  const std::int32_t shortest = path_has_drive(path.view()) ? 3 : 1;
   while (path.length() > shortest && ends_in_separator(path))
     path.set_length(path.length() - 1);
   return path;

@@ -8,11 +8,12 @@
 #include "zxplat.h"
 
 using zxdate_detail::DateFields;
+using zxdate_detail::is_between;
+using zxdate_detail::k_first_year;
 
 namespace {
 
 constexpr std::int32_t k_seconds_of_day = 86400;
-constexpr std::int32_t k_first_year = 1970;
 constexpr std::int32_t k_last_year = 2038;
 
 constexpr std::size_t k_form_room = 40;
@@ -20,11 +21,6 @@ constexpr const char* k_forms[] = {
     "%d-%m-%y %H:%M:%S", "%d-%m-%y",       "%H:%M:%S",
     "%y/%m/%d %H:%M:%S", "%d-%m-%y %H:%M", "%b-%d %H:%M",
 };
-
-constexpr bool is_between(std::int32_t low, std::int32_t value,
-                          std::int32_t high) {
-  return value >= low && value <= high;
-}
 
 // Of the forms' letters "%b" alone goes by the locale.  Nothing here changes
 // that of the C library, whose first one is plain English.

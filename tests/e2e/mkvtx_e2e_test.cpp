@@ -46,14 +46,6 @@ kit::ProcessResult run(std::vector<std::string> command,
   return kit::run_process(command, options);
 }
 
-std::vector<std::string> files_in(const std::string& folder) {
-  std::vector<std::string> names;
-  for (const auto& entry : fs::directory_iterator(folder))
-    names.push_back(entry.path().filename().string());
-  std::sort(names.begin(), names.end());
-  return names;
-}
-
 using Names = std::vector<std::string>;
 
 constexpr char k_good[] = "security 1 X\ntext 1 x\n";
@@ -67,7 +59,7 @@ TEST(mkvtx_e2e, the_sample_is_made_again_byte_for_byte) {
   EXPECT_EQ(result.exit_code, 0) << result.out;
   EXPECT_EQ(result.out, "23 entries, 21 records\r\n");
   EXPECT_EQ(result.err, "");
-  EXPECT_EQ(files_in(folder.path()), (Names{"D4WVTX.BIN", "D4WVTX.IDX"}));
+  EXPECT_EQ(kit::names_in(folder.path()), (Names{"D4WVTX.BIN", "D4WVTX.IDX"}));
   for (const std::string name : {"D4WVTX.IDX", "D4WVTX.BIN"}) {
     SCOPED_TRACE(name);
     EXPECT_TRUE(kit::read_file(folder.file(name)) ==
@@ -98,8 +90,9 @@ TEST(mkvtx_e2e, r9q_changes_the_names) {
   const auto result = run({"mkvtx", "-r9q", "t.txt", "out"}, folder);
   EXPECT_EQ(result.exit_code, 0);
   EXPECT_EQ(result.out, "1 entries, 1 records\r\n");
-  EXPECT_EQ(files_in(folder.file("out")), (Names{"R9QVTX.BIN", "R9QVTX.IDX"}));
-  EXPECT_EQ(files_in(folder.path()), (Names{"out", "t.txt"}));
+  EXPECT_EQ(kit::names_in(folder.file("out")),
+            (Names{"R9QVTX.BIN", "R9QVTX.IDX"}));
+  EXPECT_EQ(kit::names_in(folder.path()), (Names{"out", "t.txt"}));
 }
 
 TEST(mkvtx_e2e, the_directory_may_end_in_a_separator) {
@@ -109,7 +102,7 @@ TEST(mkvtx_e2e, the_directory_may_end_in_a_separator) {
     kit::write_file(folder.file("t.txt"), k_good);
     fs::create_directory(folder.file("out"));
     EXPECT_EQ(run({"mkvtx", "t.txt", "out" + end}, folder).exit_code, 0);
-    EXPECT_EQ(files_in(folder.file("out")),
+    EXPECT_EQ(kit::names_in(folder.file("out")),
               (Names{"D4WVTX.BIN", "D4WVTX.IDX"}));
   }
 }
@@ -117,7 +110,7 @@ TEST(mkvtx_e2e, the_directory_may_end_in_a_separator) {
 TEST(mkvtx_e2e, the_text_may_come_from_the_standard_input) {
   const kit::TempDir folder;
   EXPECT_EQ(run({"mkvtx", "-"}, folder, k_good).exit_code, 0);
-  EXPECT_EQ(files_in(folder.path()), (Names{"D4WVTX.BIN", "D4WVTX.IDX"}));
+  EXPECT_EQ(kit::names_in(folder.path()), (Names{"D4WVTX.BIN", "D4WVTX.IDX"}));
 }
 
 TEST(mkvtx_e2e, bad_arguments_show_the_usage) {
@@ -139,7 +132,7 @@ TEST(mkvtx_e2e, bad_arguments_show_the_usage) {
     EXPECT_EQ(result.exit_code, 1);
     EXPECT_EQ(result.out, "");
     EXPECT_EQ(result.err.substr(0, row.start.size()), row.start);
-    EXPECT_EQ(files_in(folder.path()), Names());
+    EXPECT_EQ(kit::names_in(folder.path()), Names());
   }
 }
 
@@ -155,7 +148,7 @@ TEST(mkvtx_e2e, an_error_in_the_text_writes_nothing) {
   EXPECT_NE(result.out.find(" 1.00 Fatal Error t.txt(4): '1..5' is no number"),
             std::string::npos)
       << result.out;
-  EXPECT_EQ(files_in(folder.path()),
+  EXPECT_EQ(kit::names_in(folder.path()),
             (Names{"D4WVTX.BIN", "MKVTX.dmp", "t.txt"}));
   EXPECT_EQ(kit::read_file(folder.file("D4WVTX.BIN")), "old");
 }
@@ -166,7 +159,7 @@ TEST(mkvtx_e2e, a_text_that_is_not_there_is_an_error) {
   EXPECT_EQ(result.exit_code, 100);
   EXPECT_NE(result.out.find(" Fatal Error 1002: "), std::string::npos)
       << result.out;
-  EXPECT_EQ(files_in(folder.path()), Names{"MKVTX.dmp"});
+  EXPECT_EQ(kit::names_in(folder.path()), Names{"MKVTX.dmp"});
 }
 
 TEST(mkvtx_e2e, a_directory_that_is_not_there_is_an_error) {
@@ -174,7 +167,7 @@ TEST(mkvtx_e2e, a_directory_that_is_not_there_is_an_error) {
   kit::write_file(folder.file("t.txt"), k_good);
   const auto result = run({"mkvtx", "t.txt", "none"}, folder);
   EXPECT_EQ(result.exit_code, 100);
-  EXPECT_EQ(files_in(folder.path()), (Names{"MKVTX.dmp", "t.txt"}));
+  EXPECT_EQ(kit::names_in(folder.path()), (Names{"MKVTX.dmp", "t.txt"}));
 }
 
 // The last move fails, when all is written and the data file has its name.
@@ -184,7 +177,7 @@ TEST(mkvtx_e2e, a_move_that_fails_leaves_no_temporary_file) {
   fs::create_directory(folder.file("D4WVTX.IDX"));
   const auto result = run({"mkvtx", "t.txt"}, folder);
   EXPECT_EQ(result.exit_code, 100);
-  EXPECT_EQ(files_in(folder.path()),
+  EXPECT_EQ(kit::names_in(folder.path()),
             (Names{"D4WVTX.BIN", "D4WVTX.IDX", "MKVTX.dmp", "t.txt"}));
 }
 

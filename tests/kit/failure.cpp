@@ -141,4 +141,18 @@ testing::AssertionResult is_assertion_of(const Failure& failure,
          << (failure.failed ? "'" + failure.message + "'" : "came back");
 }
 
+std::string line_of(int number, const std::string& text,
+                    const BailDetail& detail) {
+  const std::string n = std::to_string(number);
+  return "[" + n + "-" + n + "-" + std::to_string(detail.number) + "/E-0/E/" +
+         text.substr(0, 12) + "/" +
+         (detail.text != nullptr ? detail.text : "") + "]";
+}
+
+void expect_assertion_at(const std::function<void()>& statement,
+                         const std::string& position) {
+  EXPECT_FAILURE(statement(), "1000: bailed out: " + position + " ",
+                 line_of(1000, position));
+}
+
 }  // namespace kit

@@ -18,6 +18,8 @@
 #include <string>
 #include <vector>
 
+#include "zxatsys.h"
+
 namespace kit {
 
 struct Failure {
@@ -46,6 +48,15 @@ void with_failures_dropped(const std::function<void()>& statement);
 // True if the failure is the assertion of a module, at any line.
 testing::AssertionResult is_assertion_of(const Failure& failure,
                                          const std::string& module);
+
+// The diagnostic line of a failure, whose text it cuts, as of Failure::line.
+std::string line_of(int number, const std::string& text,
+                    const BailDetail& detail = no_detail);
+
+// Runs a statement that must end in the assertion at a position such as
+// "zxsys2:398".
+void expect_assertion_at(const std::function<void()>& statement,
+                         const std::string& position);
 
 }  // namespace kit
 

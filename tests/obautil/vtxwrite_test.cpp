@@ -27,14 +27,6 @@ void parse(std::string_view text, VtxTable& table) {
       << error.line << ": " << error.what.c_str();
 }
 
-std::vector<std::string> files_in(const kit::TempDir& folder) {
-  std::vector<std::string> names;
-  for (const auto& entry : fs::directory_iterator(folder.path()))
-    names.push_back(entry.path().filename().string());
-  std::sort(names.begin(), names.end());
-  return names;
-}
-
 using Names = std::vector<std::string>;
 const Names k_d4w_pair = {"D4WVTX.BIN", "D4WVTX.IDX"};
 const Names k_r9q_pair = {"R9QVTX.BIN", "R9QVTX.IDX"};
@@ -102,7 +94,7 @@ TEST(vtxwrite, the_pair_holds_the_table_byte_for_byte) {
   VtxTable table;
   parse(k_text, table);
   write_vtx_table(table, name_of(folder.path()), k_d4w_names);
-  EXPECT_EQ(files_in(folder), k_d4w_pair);
+  EXPECT_EQ(kit::names_in(folder.path()), k_d4w_pair);
   EXPECT_EQ(kit::read_file(folder.file("D4WVTX.IDX")), expected_index());
   EXPECT_EQ(kit::read_file(folder.file("D4WVTX.BIN")), expected_data());
 }
@@ -112,7 +104,7 @@ TEST(vtxwrite, the_other_names_get_the_same_bytes) {
   VtxTable table;
   parse(k_text, table);
   write_vtx_table(table, name_of(folder.path() + "/"), k_r9q_names);
-  EXPECT_EQ(files_in(folder), k_r9q_pair);
+  EXPECT_EQ(kit::names_in(folder.path()), k_r9q_pair);
   EXPECT_EQ(kit::read_file(folder.file("R9QVTX.IDX")), expected_index());
   EXPECT_EQ(kit::read_file(folder.file("R9QVTX.BIN")), expected_data());
 }
@@ -133,7 +125,7 @@ TEST(vtxwrite, an_old_pair_is_replaced) {
   VtxTable table;
   parse(k_text, table);
   write_vtx_table(table, name_of(folder.path()), k_d4w_names);
-  EXPECT_EQ(files_in(folder), k_d4w_pair);
+  EXPECT_EQ(kit::names_in(folder.path()), k_d4w_pair);
   EXPECT_EQ(kit::read_file(folder.file("D4WVTX.IDX")), expected_index());
   EXPECT_EQ(kit::read_file(folder.file("D4WVTX.BIN")), expected_data());
 }
@@ -220,7 +212,7 @@ TEST(vtxwrite, a_directory_that_is_not_there_is_fatal) {
       kit::failure_of([&] { write_vtx_table(table, directory, k_d4w_names); });
   EXPECT_EQ(failure.exit_code, 100);
   clear_unfinished_vtx();
-  EXPECT_EQ(files_in(folder), Names());
+  EXPECT_EQ(kit::names_in(folder.path()), Names());
 }
 
 // A folder with an old pair, for writes that fail.
@@ -240,7 +232,7 @@ struct Failing {
 
   // A final name holds a whole file or is free, and no other name is left.
   void check_files(bool with_old) const {
-    for (const std::string& name : files_in(folder)) {
+    for (const std::string& name : kit::names_in(folder.path())) {
       const std::string bytes = kit::read_file(folder.file(name));
       if (name == "D4WVTX.IDX")
         EXPECT_TRUE(bytes == expected_index() ||
@@ -302,7 +294,7 @@ TEST(vtxwrite, a_failure_ahead_of_the_moves_leaves_the_old_pair) {
       EXPECT_TRUE(kit::failure_of([&] { test.write(); }).failed);
     }
     clear_unfinished_vtx();
-    EXPECT_EQ(files_in(test.folder), k_d4w_pair);
+    EXPECT_EQ(kit::names_in(test.folder.path()), k_d4w_pair);
     EXPECT_EQ(kit::read_file(test.folder.file("D4WVTX.IDX")), test.old_index);
     EXPECT_EQ(kit::read_file(test.folder.file("D4WVTX.BIN")), test.old_data);
   }
@@ -318,7 +310,7 @@ TEST(vtxwrite, a_dropped_failure_moves_nothing) {
       faults.fail_nth(call, 1);
       kit::with_failures_dropped([&] { test.write(); });
     }
-    EXPECT_EQ(files_in(test.folder), k_d4w_pair);
+    EXPECT_EQ(kit::names_in(test.folder.path()), k_d4w_pair);
     EXPECT_EQ(kit::read_file(test.folder.file("D4WVTX.IDX")), test.old_index);
     EXPECT_EQ(kit::read_file(test.folder.file("D4WVTX.BIN")), test.old_data);
   }
@@ -331,7 +323,7 @@ TEST(vtxwrite, clearing_with_nothing_unfinished_does_nothing) {
   write_vtx_table(table, name_of(folder.path()), k_d4w_names);
   clear_unfinished_vtx();
   clear_unfinished_vtx();
-  EXPECT_EQ(files_in(folder), k_d4w_pair);
+  EXPECT_EQ(kit::names_in(folder.path()), k_d4w_pair);
 }
 
 }  // namespace

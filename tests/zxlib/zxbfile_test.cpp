@@ -36,20 +36,12 @@ namespace fs = std::filesystem;
 
 using kit::Call;
 using kit::Faults;
+using kit::line_of;
 using kit::read_file;
 using kit::TempDir;
 using kit::write_file;
 
 constexpr BailDetail k_detail(7, "context");
-
-// The diagnostic line of a failure, whose text it cuts.
-std::string line_of(int number, const std::string& text,
-                    const BailDetail& detail = no_detail) {
-  const std::string n = std::to_string(number);
-  return "[" + n + "-" + n + "-" + std::to_string(detail.number) + "/E-0/E/" +
-         text.substr(0, 12) + "/" +
-         (detail.text != nullptr ? detail.text : "") + "]";
-}
 
 void expect_failure(const std::function<void()>& statement, int number,
                     const std::string& message, const std::string& text,

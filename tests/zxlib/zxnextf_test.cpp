@@ -33,6 +33,7 @@ namespace fs = std::filesystem;
 
 using namespace std::string_literals;
 using kit::Call;
+using kit::expect_assertion_at;
 using kit::Faults;
 using kit::names_in;
 using kit::TempDir;
@@ -46,18 +47,6 @@ using Names = std::vector<std::string>;
 std::string text_of(const zxStr& text) { return std::string(text.view()); }
 
 zxStr str(std::string_view text) { return zxStr(text); }
-
-// The diagnostic line of a failure, whose text it cuts.
-std::string line_of(int number, const std::string& text) {
-  const std::string n = std::to_string(number);
-  return "[" + n + "-" + n + "-0/E-0/E/" + text.substr(0, 12) + "/]";
-}
-
-void expect_assertion_at(const std::function<void()>& statement,
-                         const std::string& position) {
-  EXPECT_FAILURE(statement(), "1000: bailed out: " + position + " ",
-                 line_of(1000, position));
-}
 
 std::string lower(std::string text) {
   for (char& c : text)

@@ -16,6 +16,7 @@
 #include <vector>
 
 #include "kit/cases.h"
+#include "zones.h"
 #include "zxplat.h"
 
 namespace {
@@ -87,19 +88,6 @@ TEST(zxplat_time, the_first_and_the_last_moment_have_fields) {
 }
 
 // ---- zones, in processes of their own
-
-struct Zone {
-  const char* name;
-  std::int64_t behind;  // seconds of its standard time behind UTC
-  bool saves_daylight;
-};
-
-constexpr Zone k_zones[] = {
-    {"UTC0", 0, false},           {"EST5EDT", 18'000, true},
-    {"IST-2IDT", -7200, true},    {"NPT-5:45", -20'700, false},
-    {"LNT-14", -50'400, false},   {"BKT12", 43'200, false},
-    {"NST3:30NDT", 12'600, true},
-};
 
 // Winters all over the calendar, and one summer, in which all zones that
 // save daylight do so, whosever rules are taken.

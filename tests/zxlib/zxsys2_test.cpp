@@ -36,8 +36,10 @@ namespace {
 namespace fs = std::filesystem;
 
 using kit::Call;
+using kit::expect_assertion_at;
 using kit::Faults;
 using kit::is_read_only;
+using kit::line_of;
 using kit::make_read_only;
 using kit::names_in;
 using kit::read_file;
@@ -51,23 +53,12 @@ std::string text_of(const zxStr& text) { return std::string(text.view()); }
 
 std::string quoted(const std::string& text) { return "'" + text + "'"; }
 
-// The diagnostic line of a failure, whose text it cuts.
-std::string line_of(int number, const std::string& text) {
-  const std::string n = std::to_string(number);
-  return "[" + n + "-" + n + "-0/E-0/E/" + text.substr(0, 12) + "/]";
-}
-
 // Names are handed to the statement as plain text: strings that it shares
 // with the test would count as lost when it is jumped out of.
 void expect_failure(const std::function<void()>& statement, int number,
                     const std::string& message, const std::string& text) {
   EXPECT_FAILURE(statement(), std::to_string(number) + ": " + message,
                  line_of(number, text));
-}
-
-void expect_assertion_at(const std::function<void()>& statement,
-                         const std::string& position) {
-  expect_failure(statement, 1000, "bailed out: " + position + " ", position);
 }
 
 // Variables of the environment that name the temporary folder; they, and

@@ -22,6 +22,7 @@
 #include "kit/cases.h"
 #include "kit/failure.h"
 #include "kit/target.h"
+#include "zones.h"
 #include "zxplat.h"
 
 namespace {
@@ -129,19 +130,6 @@ class InZone {
 
  private:
   std::optional<std::string> before;
-};
-
-struct Zone {
-  const char* name;
-  std::int32_t behind;  // seconds of its standard time behind UTC
-  bool saves_daylight;
-};
-
-constexpr Zone k_zones[] = {
-    {"UTC0", 0, false},           {"EST5EDT", 18'000, true},
-    {"IST-2IDT", -7200, true},    {"NPT-5:45", -20'700, false},
-    {"LNT-14", -50'400, false},   {"BKT12", 43'200, false},
-    {"NST3:30NDT", 12'600, true},
 };
 
 // Time stands still at a moment.
