@@ -343,58 +343,107 @@ Tally compare_random(unsigned seed, int patterns, int subjects) {
 
 // ---- patterns that go back very often
 
-// A loop over alternatives that fit the same text in many ways, which fails,
-// beside something that does not.
-std::string hard_pattern(Random& random) {
-  static constexpr Flavour k_body = {.literals = "aaab"sv,
-                                     .depth = 1,
-                                     .pieces = 2,
-                                     .quantified = 35,
-                                     .literal = 14,
-                                     .byte_class = 0,
-                                     .class_letter = 0,
-                                     .any = 1,
-                                     .group = 3,
-                                     .plain_group = 3,
-                                     .anchor = 0,
-                                     .boundary = 0,
-                                     .back_reference = 0,
-                                     .field = 0};
-  constexpr std::string_view k_bodies[] = {
-      "a|aa", "a|a",    "a?b?|b",    "a*b|a", "aa?|b?a", "a|ab?|b", "a+|b",
-      "a*?b", "(a)|aa", "{{a|b}}|a", "a+b?",  "[ab]|a",  ".|a",     "a{1,2}"};
-  constexpr std::string_view k_tails[] = {"c", "$", "[cd]", "bbbc", "%t", "^"};
-  constexpr std::string_view k_rests[] = {"(a|b)*",    "{{a|b}}+", "a", ".*",
-                                          "(a|b|.)*$", "((a)|b)?", ""};
-  PatternWriter writer(random, k_body);
-  const auto loop = [&] {
-    const std::string body = random.percent(50)
-                                 ? std::string(random.pick(k_bodies))
-                                 : writer.pattern();
-    const bool captures = random.percent(50);
-    return (captures ? "(" : "{{") + body + (captures ? ")" : "}}") +
-           random.of("*+");
-  };
-  std::string hard = loop();
-  if (random.percent(40)) hard += loop();
-  hard += random.pick(k_tails);
-  const std::string rest =
-      random.percent(60) ? std::string(random.pick(k_rests)) : writer.pattern();
-  switch (random.below(4)) {
-    case 0:
-      return "^" + hard + "|" + rest;
-    case 1:
-      return "{{" + hard + "}}?" + rest;
-    case 2:
-      return "^(" + hard + "|" + rest + ")";
-    default:
-      return "(" + hard + ")?" + rest;
+constexpr Flavour k_ambiguous = {.literals = "aaab"sv,
+                                 .depth = 1,
+                                 .pieces = 2,
+                                 .quantified = 35,
+                                 .literal = 14,
+                                 .byte_class = 0,
+                                 .class_letter = 0,
+                                 .any = 1,
+                                 .group = 3,
+                                 .plain_group = 3,
+                                 .anchor = 0,
+                                 .boundary = 0,
+                                 .back_reference = 0,
+                                 .field = 0};
+
+// Writes patterns of which one part fits the same text in many ways and then
+// fails, beside another that does not fail.
+class HardPatternWriter {
+ public:
+  explicit HardPatternWriter(Random& random)
+      : random_(random), writer_(random, k_ambiguous) {}
+
+  std::string pattern() {
+    const std::string hard = many_ways() + tail();
+    switch (random_.below(5)) {
+      case 0:
+        return "^" + hard + "|" + rest();
+      case 1:
+        return "{{" + hard + "}}?" + rest();
+      case 2:
+        return "^(" + hard + "|" + rest() + ")";
+      case 3:
+        return "{{" + rest() + "|a}}{{" + hard + "|" + rest() + "}}";
+      default:
+        return "(" + hard + ")?" + rest();
+    }
   }
-}
+
+ private:
+  std::string many_ways() {
+    switch (random_.below(4)) {
+      case 0:
+        return loop(body()) + loop(body());
+      case 1:
+        return stars();
+      case 2:
+        return loop(loop(body()) + any_of({"b", "a?", "", "c?", "[ab]"}));
+      default:
+        return loop(body());
+    }
+  }
+
+  std::string body() {
+    if (random_.percent(50)) return writer_.pattern();
+    return any_of({"a|aa", "a|a", "a?b?|b", "a*b|a", "aa?|b?a", "a|ab?|b",
+                   "a+|b", "a*?b", "(a)|aa", "{{a|b}}|a", "a+b?", "[ab]|a",
+                   ".|a", "a{1,2}"});
+  }
+
+  std::string grouped(const std::string& text) {
+    return random_.percent(50) ? "(" + text + ")" : "{{" + text + "}}";
+  }
+
+  std::string loop(const std::string& text) {
+    return grouped(text) + random_.of("*+");
+  }
+
+  // Simple repetitions in a row.
+  std::string stars() {
+    std::string text;
+    const int count = random_.between(3, 5);
+    for (int i = 0; i < count; ++i) {
+      const std::string star =
+          any_of({".*", ".*?", "a*", "[ab]*", "a{0,3}", "a?", ".+", "`w*?"});
+      text += random_.percent(50) ? grouped(star) : star;
+    }
+    return text;
+  }
+
+  std::string tail() {
+    return any_of({"c", "$", "[cd]", "bbbc", "%t", "^", "{{c|dd}}", "`b`B"});
+  }
+
+  std::string rest() {
+    if (random_.percent(40)) return writer_.pattern();
+    return any_of(
+        {"(a|b)*", "{{a|b}}+", "a", ".*", "(a|b|.)*$", "((a)|b)?", ""});
+  }
+
+  template <std::size_t N>
+  std::string any_of(const std::string_view (&choices)[N]) {
+    return std::string(random_.pick(choices));
+  }
+
+  Random& random_;
+  PatternWriter writer_;
+};
 
 Subject hard_subject(Random& random) {
-  std::string text = noise(random, random.between(4, 10), "aaaaaab");
-  if (random.percent(40)) text += noise(random, random.between(1, 8), "a");
+  std::string text = noise(random, random.between(4, 9), "aaaaaab");
+  if (random.percent(40)) text += noise(random, random.between(1, 6), "a");
   if (random.percent(60)) text += random.of("bbcd");
   return {text};
 }
@@ -404,7 +453,7 @@ Tally compare_hard(unsigned seed, int patterns, int subjects, long steps) {
   Tally tally;
   const Budget budget{.steps = steps, .depth = 1500};
   for (int i = 0; i < patterns; ++i) {
-    compare(hard_pattern(random), subjects, budget, tally,
+    compare(HardPatternWriter(random).pattern(), subjects, budget, tally,
             [&](const Node&) { return hard_subject(random); });
     if (tally.differences >= k_most_differences) break;
   }
@@ -421,7 +470,7 @@ void expect_useful(const Tally& tally) {
 
 void expect_useful_and_hard(const Tally& tally) {
   EXPECT_GT(tally.costly_matches, tally.pairs / 20) << "of " << tally.pairs;
-  EXPECT_LT(tally.skipped, tally.pairs / 4) << "of " << tally.pairs;
+  EXPECT_LT(tally.skipped, tally.pairs / 25) << "of " << tally.pairs;
 }
 
 TEST(zxregexe_model, random_patterns_match_as_in_the_model) {
@@ -429,7 +478,7 @@ TEST(zxregexe_model, random_patterns_match_as_in_the_model) {
 }
 
 TEST(zxregexe_model, patterns_that_go_back_often_match_as_in_the_model) {
-  expect_useful_and_hard(compare_hard(2, 150, 4, 200'000));
+  expect_useful_and_hard(compare_hard(2, 150, 4, 400'000));
 }
 
 TEST(zxregexe_model_slow, a_million_random_pairs_match_as_in_the_model) {
