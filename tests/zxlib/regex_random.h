@@ -163,6 +163,7 @@ class PatternWriter {
   }
 
   Made piece(int depth) {
+    if (depth <= 1 && random_.percent(1)) return long_literal();
     Made made = atom(depth);
     if (!random_.percent(flavour_.quantified)) return made;
     std::string_view quantifier;
@@ -217,6 +218,14 @@ class PatternWriter {
     ++groups_;
     const Made body = choice(depth - 1);
     return {"(" + body.text + ")", false, body.has_width};
+  }
+
+  // A run that no one node can hold.
+  Made long_literal() {
+    Made made;
+    const int length = random_.between(120, 300);
+    for (int i = 0; i < length; ++i) made.text += random_.of("aaab");
+    return made;
   }
 
   // A byte as a literal, escaped where it must be and sometimes elsewhere.

@@ -322,6 +322,8 @@ Subject any_subject(Random& random, const Flavour& flavour, const Node& tree) {
   if (how > 45 && how < 70)
     subject.text = mutated(random, subject.text, random.between(1, 3), bytes);
   if (how > 92) subject.text = noise(random, random.between(0, 25), bytes);
+  if (flavour.depth == 1 && random.percent(8))
+    subject.text.insert(0, noise(random, random.between(50, 1500), bytes));
   if (random.percent(5)) subject.text += random.byte();
   if (random.percent(15))
     subject.before = random.percent(50) ? random.byte() : random.of(bytes);
