@@ -47,6 +47,7 @@ struct Flavour {
   int pieces = 4;             // of a sequence, at most
   int alternatives = 3;       // of a group, at most
   int quantified = 40;        // percent of the pieces
+  int empty = 10;             // percent of the bytes become {0,n}
   // How often each kind of atom comes, against each other.
   int literal = 10;
   int byte_class = 2;
@@ -76,6 +77,19 @@ inline constexpr Flavour k_nested = {.literals = "ab"sv,
                                      .boundary = 0,
                                      .back_reference = 0,
                                      .field = 0};
+// Loops whose passes can be empty.
+inline constexpr Flavour k_empty_passes = {.literals = "ab"sv,
+                                           .pieces = 2,
+                                           .quantified = 50,
+                                           .empty = 60,
+                                           .byte_class = 1,
+                                           .class_letter = 0,
+                                           .group = 8,
+                                           .plain_group = 8,
+                                           .anchor = 0,
+                                           .boundary = 0,
+                                           .back_reference = 1,
+                                           .field = 0};
 inline constexpr Flavour k_references = {.literals = "ab"sv,
                                          .byte_class = 0,
                                          .class_letter = 0,
@@ -165,6 +179,11 @@ class PatternWriter {
   Made piece(int depth) {
     if (depth <= 1 && random_.percent(1)) return long_literal();
     Made made = atom(depth);
+    if (made.is_byte && random_.percent(flavour_.empty)) {
+      made.text += random_.pick({"{0,2}", "{0}", "{0,}", "{0,1}?", "{0,2}"});
+      made.is_byte = false;
+      return made;
+    }
     if (!random_.percent(flavour_.quantified)) return made;
     std::string_view quantifier;
     if (made.is_byte)
