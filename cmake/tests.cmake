@@ -23,14 +23,19 @@ target_include_directories(zx_kit PUBLIC ${CMAKE_SOURCE_DIR}/tests)
 target_link_libraries(zx_kit PUBLIC hvl zxlib gtest PRIVATE zx_test_flags)
 
 set(test_globs)
-foreach(folder zxlib hvl obautil e2e)
+foreach(folder zxlib hvl obautil fuzz e2e)
   list(APPEND test_globs ${CMAKE_SOURCE_DIR}/tests/${folder}/*_test.cpp)
 endforeach()
 file(GLOB test_sources CONFIGURE_DEPENDS ${test_globs})
 
+# The functions that fuzzing feeds; their tests feed them with the corpora.
+file(GLOB fuzz_sources CONFIGURE_DEPENDS ${CMAKE_SOURCE_DIR}/fuzz/*.cpp)
+list(REMOVE_ITEM fuzz_sources ${CMAKE_SOURCE_DIR}/fuzz/entry.cpp)
+
 # vtx2csv comes whole, with the globals that every application defines; of the
 # other tools only the modules, as an application has one set of globals.
-add_executable(zx_tests ${kit_main} ${test_sources})
+add_executable(zx_tests ${kit_main} ${test_sources} ${fuzz_sources})
+target_include_directories(zx_tests PRIVATE ${CMAKE_SOURCE_DIR})
 target_link_libraries(zx_tests PRIVATE zx_test_flags vtx2csv_main)
 zx_take_modules(zx_tests ${zx_tools})
 target_link_libraries(zx_tests PRIVATE zx_kit hvl zxlib gtest)

@@ -1,0 +1,685 @@
+// The plan of a program.  From the bottom up: sets of bytes, what a choice
+// can go on with, steps, the block.
+//
+// What a plan saves the matcher must never show.  Two things could show: the
+// order of preference, and the counts of alternatives, which are not put back
+// when a try fails.  So a try may be skipped by the byte that it meets only
+// if, up to where it would fail, it writes no count that a later reader could
+// see.
+
+#include <algorithm>
+#include <bit>
+#include <cstring>
+
+#include "zxqva.h"
+#include "zxregexc_impl.h"
+
+using zxnode::Node;
+
+namespace {
+
+// ------------------------------------------------------------------ sets --
+
+// A set of bytes.
+struct ByteSet {
+  std::array<std::uint64_t, 4> bits{};
+
+  void add(unsigned byte) { bits[byte / 64] |= 1ULL << (byte % 64); }
+  void add(const ByteSet& other) {
+    for (std::size_t i = 0; i < bits.size(); ++i) bits[i] |= other.bits[i];
+  }
+  bool has(unsigned byte) const { return bits[byte / 64] >> (byte % 64) & 1; }
+  bool meets(const ByteSet& other) const {
+    for (std::size_t i = 0; i < bits.size(); ++i)
+      if ((bits[i] & other.bits[i]) != 0) return true;
+    return false;
+  }
+  bool operator==(const ByteSet&) const = default;
+};
+
+constexpr ByteSet complement(const ByteSet& set) {
+  ByteSet other;
+  for (std::size_t i = 0; i < other.bits.size(); ++i)
+    other.bits[i] = ~set.bits[i];
+  return other;
+}
+
+consteval ByteSet make_class_set(unsigned class_bits) {
+  ByteSet set;
+  for (unsigned c = 0; c < 256; ++c)
+    if ((zxCharClass[c] & class_bits) != 0)
+      set.bits[c / 64] |= 1ULL << (c % 64);
+  return set;
+}
+
+// The sets of the class nodes, by opcode.
+constexpr unsigned k_first_class = 10;
+constexpr auto k_class_sets = [] {
+  std::array<ByteSet, 10> sets;
+  sets[0] = make_class_set(k_class_hebdos);
+  sets[2] = make_class_set(k_class_hebrew);
+  sets[4] = make_class_set(k_regex_word_class);
+  sets[6] = make_class_set(k_class_space);
+  sets[8] = make_class_set(k_class_digit);
+  for (std::size_t i = 0; i < sets.size(); i += 2)
+    sets[i + 1] = complement(sets[i]);
+  return sets;
+}();
+
+constexpr ByteSet k_all_bytes = complement(ByteSet{});
+
+ByteSet anyof_set(Node node) {
+  ByteSet set;
+  const Node bitmap = zxnode::operand(node);
+  for (unsigned i = 0; i < k_bitmap_bytes; ++i)
+    set.bits[i / 8] |= std::uint64_t{static_cast<std::uint8_t>(~bitmap[i])}
+                       << (i % 8 * 8);
+  return set;
+}
+
+// The bytes that a node which takes at least one can begin with.
+ByteSet first_set(Node node) {
+  if (zxnode::info(node).class_bits != 0)
+    return k_class_sets[*node - k_first_class];
+  if (zxnode::is(node, zxNodeKind::any)) return k_all_bytes;
+  if (zxnode::is(node, zxNodeKind::anyof)) return anyof_set(node);
+  ByteSet set;
+  set.add(zxnode::operand(node)[1]);
+  return set;
+}
+
+// The set as ranges, if there are few of them.
+bool find_ranges(const ByteSet& set, zxByteRanges& ranges) {
+  ranges.count = 0;
+  for (unsigned c = 0; c < 256; ++c) {
+    if (!set.has(c)) continue;
+    unsigned last = c;
+    while (last < 255 && set.has(last + 1)) ++last;
+    if (ranges.count == zxByteRanges::k_most) return false;
+    ranges.low[ranges.count] = static_cast<std::uint8_t>(c);
+    ranges.span[ranges.count++] = static_cast<std::uint8_t>(last - c);
+    c = last;
+  }
+  return true;
+}
+
+zxByteRanges ranges_of(const ByteSet& set) {
+  zxByteRanges ranges{};
+  if (find_ranges(set, ranges)) return ranges;
+  ranges.complement = 1;
+  if (!find_ranges(complement(set), ranges)) ranges.count = k_many_ranges;
+  return ranges;
+}
+
+// Adds bit `mask` to the bytes of a table that belong to the set, eight at a
+// time: the eight bits are spread over eight bytes.
+void fill_table(std::uint8_t* table, const ByteSet& set, std::uint8_t mask) {
+  constexpr std::uint64_t k_ones = 0x0101010101010101;
+  constexpr std::uint64_t k_diagonal = 0x8040201008040201;
+  constexpr std::uint64_t k_low_bits = 0x7F7F7F7F7F7F7F7F;
+  for (unsigned i = 0; i < 32; ++i) {
+    const std::uint64_t eight = set.bits[i / 8] >> (i % 8 * 8) & 0xFF;
+    const std::uint64_t spread = (eight * k_ones) & k_diagonal;
+    const std::uint64_t is_set =
+        ((((spread & k_low_bits) + k_low_bits) | spread) >> 7) & k_ones;
+    std::uint64_t cell;
+    std::memcpy(&cell, table + 8 * i, sizeof cell);
+    cell |= is_set * mask;
+    std::memcpy(table + 8 * i, &cell, sizeof cell);
+  }
+}
+static_assert(std::endian::native == std::endian::little);
+
+// ------------------------------------------------- what a choice goes on with
+
+// Works out what a run can meet from a node on, up to the first byte that it
+// takes; the result stays "anything" where that could show (see the head) or
+// would take long to find out.
+class Outlook {
+ public:
+  enum class Purpose {
+    choice,  // of a choice inside the pattern
+    start,   // of a match as a whole
+  };
+  Outlook(Node node, Purpose purpose, bool program_has_loops)
+      : may_open(purpose == Purpose::start || !program_has_loops),
+        is_ahead_of_choices(purpose == Purpose::start) {
+    is_known = walk(node, false);
+    if (!is_known) bytes = k_all_bytes;
+  }
+
+  bool is_known;
+  bool at_end = false;  // the end of the subject can be met
+  ByteSet bytes;
+
+  std::uint8_t flags() const {
+    if (!is_known) return k_look_open;
+    return at_end ? k_look_end : 0;
+  }
+
+ private:
+  // `is_own`: the current group has been opened on the way, so that its count
+  // is written again before a later try reads it.
+  bool walk(Node node, bool is_own) {
+    while (budget-- > 0) {
+      if (zxnode::is_open(node)) {
+        if (!may_open) return false;
+        is_own = true;
+      } else if (zxnode::is(node, zxNodeKind::open0)) {
+        is_own = false;
+      } else if (zxnode::is(node, zxNodeKind::branch)) {
+        if (zxnode::next_alternative(node) != nullptr)
+          return walk_choice(node, is_own);
+        node = zxnode::operand(node);
+        continue;
+      } else if (takes_byte(node)) {
+        return true;
+      } else if (!is_passed(node)) {
+        return false;
+      }
+      node = zxnode::next(node);
+    }
+    return false;
+  }
+
+  bool walk_choice(Node branch, bool is_own) {
+    // A count that every try writes first is nobody's to read.
+    if (is_ahead_of_choices && !is_own) is_free = true;
+    is_ahead_of_choices = false;
+    if (!is_own && !is_free) return false;
+    for (; branch != nullptr; branch = zxnode::next_alternative(branch))
+      if (!walk(zxnode::operand(branch), is_own)) return false;
+    return true;
+  }
+
+  // Adds what the node takes; true if the way ends here.
+  bool takes_byte(Node node) {
+    if (zxnode::is_repeat(node)) {
+      bytes.add(first_set(zxnode::repeated(node)));
+      return zxnode::minimum(node) > 0;
+    }
+    if (zxnode::is(node, zxNodeKind::eol)) return at_end = true;
+    if (zxnode::is(node, zxNodeKind::field)) return takes_field(node);
+    if (zxnode::info(node).class_bits == 0 &&
+        !zxnode::is(node, zxNodeKind::exactly) &&
+        !zxnode::is(node, zxNodeKind::any) &&
+        !zxnode::is(node, zxNodeKind::anyof))
+      return false;
+    bytes.add(first_set(node));
+    return true;
+  }
+
+  bool takes_field(Node node);
+
+  // Nodes that take nothing: what stands behind them can still be met.
+  static bool is_passed(Node node) {
+    switch (static_cast<zxNodeKind>(*node)) {
+      case zxNodeKind::bol:
+      case zxNodeKind::wordb:
+      case zxNodeKind::nwordb:
+      case zxNodeKind::nothing:
+      case zxNodeKind::back:
+      case zxNodeKind::close0:
+      case zxNodeKind::star:
+      case zxNodeKind::starmin:
+      case zxNodeKind::curly:
+      case zxNodeKind::curlymin:
+        return true;
+      default:
+        return zxnode::is_close(node);
+    }
+  }
+
+  const bool may_open;
+  bool is_ahead_of_choices;
+  bool is_free = false;
+  int budget = 64;
+};
+
+void add_text(ByteSet& set, std::string_view bytes) {
+  for (const char c : bytes) set.add(static_cast<unsigned char>(c));
+}
+
+bool Outlook::takes_field(Node node) {
+  const std::uint8_t* operand = zxnode::operand(node);
+  const unsigned flags = operand[3];
+  if ((flags & k_field_blank) != 0) return false;
+  if ((flags & k_field_zero) == 0) bytes.add(' ');
+  switch (operand[4]) {
+    case 'x':
+      add_text(bytes, "abcdefABCDEF+-0123456789");
+      break;
+    case 'f':
+    case 'v':
+      bytes.add('.');
+      [[fallthrough]];
+    case 'd':
+      add_text(bytes, "+-0123456789");
+      break;
+    case 't':
+      add_text(bytes, "0123456789");
+      break;
+    case 'C':
+      add_text(bytes, "\"~'");
+      break;
+    default:
+      bytes = k_all_bytes;
+      break;
+  }
+  return true;
+}
+
+// ----------------------------------------------------------------- steps --
+
+// What stands for nodes in the table of steps by place.
+constexpr std::uint16_t k_skipped = 0xFFFF;      // has no step of its own
+constexpr std::uint16_t k_alternative = 0xFFFE;  // is a later alternative
+
+class Planner {
+ public:
+  Planner(const zxRegex& its_regex, zxRegexPlan& its_plan, zxStep* its_steps)
+      : regex(its_regex), plan(its_plan), steps(its_steps) {}
+
+  bool make() {
+    number_steps();
+    for (Node node = begin(); node < end(); node = following(node))
+      if (step_of(node) != k_skipped && !make_step(node)) return false;
+    finish();
+    return true;
+  }
+
+  const zxQVA<ByteSet>& all_sets() const { return sets; }
+
+ private:
+  // ---- nodes
+  Node begin() const { return regex.program() + 1; }
+  Node end() const { return regex.program() + regex.size; }
+  std::uint16_t place(Node node) const {
+    return static_cast<std::uint16_t>(node - regex.program());
+  }
+  static Node following(Node node) {
+    if (zxnode::is_repeat(node)) node = zxnode::repeated(node);
+    return node + zxnode::size_of(node);
+  }
+  std::uint16_t& step_of(Node node) { return step_at[place(node)]; }
+
+  // The node that a run comes to when it is sent to `node`: those that do
+  // nothing are passed.
+  Node arrived(Node node) {
+    while (step_of(node) == k_skipped)
+      node = zxnode::is(node, zxNodeKind::branch) ? zxnode::operand(node)
+                                                  : zxnode::next(node);
+    return node;
+  }
+  std::uint16_t step_behind(Node node) {
+    return step_of(arrived(zxnode::next(node)));
+  }
+
+  // ---- which nodes become steps
+  void number_steps() {
+    std::memset(step_at, 0, regex.size * sizeof step_at[0]);
+    find_loops();
+    int count = 0;
+    for (Node node = begin(); node < end(); node = following(node)) {
+      const bool has_step = is_step(node);
+      step_of(node) = has_step ? static_cast<std::uint16_t>(count) : k_skipped;
+      if (has_step) ++count;
+    }
+    plan.step_count = static_cast<std::uint16_t>(count);
+  }
+
+  bool is_step(Node node) {
+    switch (static_cast<zxNodeKind>(*node)) {
+      case zxNodeKind::nothing:
+      case zxNodeKind::close0:
+        return false;
+      case zxNodeKind::back:
+        return is_empty_star(node);
+      case zxNodeKind::branch:
+        return is_alternative(node);
+      default:
+        return true;
+    }
+  }
+
+  // True for the BRANCH nodes of a choice; those of a group with a single
+  // alternative do nothing.
+  bool is_alternative(Node branch) {
+    const Node other = zxnode::next_alternative(branch);
+    if (other != nullptr) step_of(other) = k_alternative;
+    return other != nullptr || step_of(branch) == k_alternative;
+  }
+
+  // ---- loops whose passes can be empty
+  //
+  // Only a counted repetition with a minimum of 0 makes them: it passes for
+  // something that takes a byte.
+  void find_loops() {
+    bool has_empty_counts = false;
+    for (Node node = begin(); node < end(); node = following(node)) {
+      if (zxnode::is(node, zxNodeKind::back)) has_loops = true;
+      if (zxnode::is(node, zxNodeKind::backref)) has_references = true;
+      if (zxnode::info(node).operand == zxOperand::counts &&
+          zxnode::minimum(node) == 0)
+        has_empty_counts = true;
+    }
+    looks_for_empty_passes = has_loops && has_empty_counts;
+  }
+
+  // x*: the BACK behind a body that can match empty.
+  bool is_empty_star(Node back) {
+    if (!looks_for_empty_passes) return false;
+    const Node branch = zxnode::next(back);
+    return zxnode::is(branch, zxNodeKind::branch) &&
+           zxnode::operand(branch) != back &&
+           can_pass(zxnode::operand(branch), back);
+  }
+
+  // x+: the BRANCH behind such a body, whose operand is the BACK.
+  bool is_empty_plus(Node branch) {
+    if (!looks_for_empty_passes) return false;
+    const Node back = zxnode::operand(branch);
+    return zxnode::is(back, zxNodeKind::back) &&
+           can_pass(zxnode::next(back), branch);
+  }
+
+  // True if a run can get from `from` to the later node `to` without taking
+  // a byte.  Links lead forward but for those of inner loops, which lead to
+  // where the loop can be left as well; so one walk from the end does it.
+  bool can_pass(Node from, Node to) {
+    zxQVA<Node> nodes;
+    for (Node node = from; node < to; node = following(node))
+      nodes.append(node);
+    passes_to(to) = true;
+    for (std::int32_t i = nodes.length(); i-- > 0;)
+      passes_to(nodes.get(i)) = passes_from(nodes.get(i), from, to);
+    return passes_to(from);
+  }
+
+  bool passes_from(Node node, Node from, Node to) {
+    const auto passes = [&](Node next) {
+      return next != nullptr && next >= from && next <= to && passes_to(next);
+    };
+    if (zxnode::is(node, zxNodeKind::back)) {
+      // The way out of the loop, from behind this place.
+      const Node head = zxnode::next(node);
+      const Node exit = zxnode::is(head, zxNodeKind::branch) && head < node
+                            ? zxnode::next(head)
+                            : nullptr;
+      return exit > node && passes(exit);
+    }
+    if (zxnode::is(node, zxNodeKind::branch)) {
+      for (Node other = node; other != nullptr;
+           other = zxnode::next_alternative(other))
+        if (passes(zxnode::operand(other))) return true;
+      return false;
+    }
+    return !takes_bytes(node) && passes(zxnode::next(node));
+  }
+
+  bool& passes_to(Node node) { return passing[place(node)]; }
+
+  static bool takes_bytes(Node node) {
+    if (zxnode::is_repeat(node)) return zxnode::minimum(node) > 0;
+    switch (static_cast<zxNodeKind>(*node)) {
+      case zxNodeKind::any:
+      case zxNodeKind::anyof:
+      case zxNodeKind::exactly:
+        return true;
+      case zxNodeKind::field: {
+        const std::uint8_t* operand = zxnode::operand(node);
+        return static_cast<std::int8_t>(operand[1]) != k_field_not_given ||
+               (operand[3] & k_field_blank) == 0;
+      }
+      default:
+        return zxnode::info(node).class_bits != 0;
+    }
+  }
+
+  // ---- filling steps
+  bool make_step(Node node) {
+    zxStep& step = steps[step_of(node)];
+    step = zxStep{};
+    if (zxnode::is(node, zxNodeKind::branch)) {
+      make_branch(step, node);
+      return true;
+    }
+    step.next =
+        zxnode::is(node, zxNodeKind::end) ? k_no_step : step_behind(node);
+    if (zxnode::is_open(node) || zxnode::is_close(node)) {
+      make_group(step, node);
+    } else if (zxnode::is_repeat(node)) {
+      make_repeat(step, node);
+    } else {
+      return make_plain(step, node);
+    }
+    return true;
+  }
+
+  bool make_plain(zxStep& step, Node node) {
+    switch (static_cast<zxNodeKind>(*node)) {
+      case zxNodeKind::end:
+        step.kind = zxStepKind::succeed;
+        break;
+      case zxNodeKind::bol:
+        step.kind = zxStepKind::at_start;
+        break;
+      case zxNodeKind::eol:
+        step.kind = zxStepKind::at_end;
+        break;
+      case zxNodeKind::any:
+        step.kind = zxStepKind::any;
+        break;
+      case zxNodeKind::exactly:
+        make_literal(step, node);
+        break;
+      case zxNodeKind::wordb:
+        step.kind = zxStepKind::word_edge;
+        break;
+      case zxNodeKind::nwordb:
+        step.kind = zxStepKind::no_word_edge;
+        break;
+      case zxNodeKind::open0:
+        step.kind = zxStepKind::open_plain;
+        break;
+      case zxNodeKind::back:
+        step.kind = zxStepKind::check_pass;
+        step.other = step_of(zxnode::next(zxnode::next(node)));
+        break;
+      case zxNodeKind::backref:
+        step.kind = zxStepKind::back_reference;
+        step.number = zxnode::operand(node)[1];
+        break;
+      case zxNodeKind::field:
+        step.kind = zxStepKind::field;
+        step.place = place(node);
+        plan.fields = static_cast<std::uint8_t>(plan.fields + 1);
+        break;
+      default:
+        if (!ZX_ASSERT(zxnode::info(node).class_bits != 0 ||
+                       zxnode::is(node, zxNodeKind::anyof)))
+          return false;
+        step.kind = zxStepKind::set;
+        use_set(first_set(node), step.table, step.mask);
+        break;
+    }
+    return true;
+  }
+
+  void make_literal(zxStep& step, Node node) {
+    const Node operand = zxnode::operand(node);
+    if (*operand == 1) {
+      step.kind = zxStepKind::byte;
+      step.number = operand[1];
+    } else {
+      step.kind = zxStepKind::literal;
+      step.number = *operand;
+      step.place = place(operand + 1);
+    }
+  }
+
+  void make_group(zxStep& step, Node node) {
+    const auto group = static_cast<std::uint8_t>(zxnode::group_of(node));
+    step.kind = zxnode::is_open(node) ? zxStepKind::open : zxStepKind::close;
+    step.number = group;
+    plan.groups = std::max(plan.groups, group);
+  }
+
+  void make_branch(zxStep& step, Node node) {
+    const Node other = zxnode::next_alternative(node);
+    step.kind =
+        is_empty_plus(node) ? zxStepKind::check_branch : zxStepKind::branch;
+    if (step.kind == zxStepKind::check_branch) has_empty_passes = true;
+    step.next = step_of(arrived(zxnode::operand(node)));
+    step.other = other == nullptr ? k_no_step : step_of(other);
+    look_from(zxnode::operand(node), step);
+  }
+
+  // Behind a byte of the set no shorter repetition can go on, if none of its
+  // bytes can be what follows: then there is nothing to go back to.
+  void make_repeat(zxStep& step, Node node) {
+    const ByteSet set = first_set(zxnode::repeated(node));
+    const int max = zxnode::maximum(node);
+    step.min = static_cast<std::uint16_t>(zxnode::minimum(node));
+    step.max = static_cast<std::uint16_t>(max);
+    use_set(set, step.table, step.mask);
+    const Outlook look = look_from(zxnode::next(node), step);
+    if (look.is_known && !set.meets(look.bytes))
+      step.kind = zxStepKind::repeat;
+    else
+      step.kind =
+          is_lazy(node) ? zxStepKind::repeat_lazy : zxStepKind::repeat_greedy;
+  }
+
+  static bool is_lazy(Node node) {
+    return zxnode::is(node, zxNodeKind::starmin) ||
+           zxnode::is(node, zxNodeKind::plusmin) ||
+           zxnode::is(node, zxNodeKind::curlymin);
+  }
+
+  Outlook look_from(Node node, zxStep& step) {
+    const Outlook look(node, Outlook::Purpose::choice, has_loops);
+    step.look_flags = look.flags();
+    if (look.is_known) use_set(look.bytes, step.look_table, step.look_mask);
+    return look;
+  }
+
+  // ---- sets
+  std::uint16_t set_number(const ByteSet& set) {
+    std::int32_t i = 0;
+    while (i < sets.length() && !(sets.get(i) == set)) ++i;
+    if (i == sets.length()) sets.append(set);
+    return static_cast<std::uint16_t>(i);
+  }
+
+  void use_set(const ByteSet& set, std::uint16_t& table, std::uint8_t& mask) {
+    const unsigned number = set_number(set);
+    table = static_cast<std::uint16_t>(number / 8);
+    mask = static_cast<std::uint8_t>(1U << (number % 8));
+  }
+
+  // ---- the whole
+  void finish() {
+    plan.first = step_of(arrived(begin()));
+    const Outlook start(begin(), Outlook::Purpose::start, has_loops);
+    plan.start_flags = start.flags();
+    plan.start_set = set_number(start.bytes);
+    plan.set_count = static_cast<std::uint16_t>(sets.length());
+    has_empty_passes |= has_empty_stars();
+    if (!has_references && !has_empty_passes)
+      plan.choice_bits |= k_plan_remembers;
+    if (!has_references) plan.choice_bits |= bits_of_first_repeat();
+  }
+
+  bool has_empty_stars() const {
+    return std::any_of(steps, steps + plan.step_count, [](const zxStep& step) {
+      return step.kind == zxStepKind::check_pass;
+    });
+  }
+
+  // What the first step says about tries from later starts, if it is a
+  // repetition without an upper limit.
+  std::uint8_t bits_of_first_repeat() const {
+    const zxStep* step = steps + plan.first;
+    while (step->kind == zxStepKind::open ||
+           step->kind == zxStepKind::open_plain)
+      step = steps + step->next;
+    if (step->kind < zxStepKind::repeat || step->max != k_no_limit ||
+        step->min > 1)
+      return 0;
+    if (sets.get(step->table * 8 + std::countr_zero(step->mask)) == k_all_bytes)
+      return k_plan_one_try;
+    return step->kind == zxStepKind::repeat ? k_plan_skips_run : 0;
+  }
+
+  const zxRegex& regex;
+  zxRegexPlan& plan;
+  zxStep* const steps;
+  zxQVA<ByteSet> sets;
+  bool has_loops = false;
+  bool has_references = false;
+  bool looks_for_empty_passes = false;
+  bool has_empty_passes = false;
+
+  static std::uint16_t step_at[32768];
+  static bool passing[32768];
+};
+
+std::uint16_t Planner::step_at[32768];
+bool Planner::passing[32768];
+
+// ----------------------------------------------------------------- block --
+
+constexpr std::size_t rounded_up(std::size_t size) {
+  return (size + zxRegex::k_plan_unit - 1) / zxRegex::k_plan_unit *
+         zxRegex::k_plan_unit;
+}
+
+// Resizes the block; what points into the program moves along.
+zxRegex* resize(zxRegex* regex, std::size_t size) {
+  const bool has_must = regex->regmust != nullptr;
+  const std::ptrdiff_t must =
+      has_must ? regex->regmust - reinterpret_cast<const char*>(regex) : 0;
+  auto* moved = static_cast<zxRegex*>(zx_realloc(regex, size));
+  if (moved != nullptr && has_must)
+    moved->regmust = reinterpret_cast<const char*>(moved) + must;
+  return moved;
+}
+
+void write_sets(zxRegexPlan& plan, const zxQVA<ByteSet>& sets) {
+  auto* ranges = const_cast<zxByteRanges*>(plan.sets());
+  auto* tables = const_cast<std::uint8_t*>(plan.tables());
+  std::memset(tables, 0, zx_size(sets.length() + 7) / 8 * 256);
+  for (std::int32_t i = 0; i < sets.length(); ++i) {
+    ranges[i] = ranges_of(sets.get(i));
+    fill_table(tables + i / 8 * 256, sets.get(i),
+               static_cast<std::uint8_t>(1U << (i % 8)));
+  }
+}
+
+}  // namespace
+
+zxRegex* regex_plan(zxRegex* regex, int node_count) {
+  const std::size_t plan_place =
+      rounded_up(zxRegex::k_program_place + regex->size);
+  const std::size_t steps_end =
+      plan_place + sizeof(zxRegexPlan) + zx_size(node_count) * sizeof(zxStep);
+  regex = resize(regex, steps_end);
+  if (regex == nullptr) return nullptr;
+  regex->plan_place =
+      static_cast<std::uint16_t>(plan_place / zxRegex::k_plan_unit);
+  auto* plan = const_cast<zxRegexPlan*>(regex->plan());
+  *plan = zxRegexPlan{};
+  Planner planner(*regex, *plan, const_cast<zxStep*>(plan->steps()));
+  if (!planner.make()) return regex;
+  const std::size_t sets_end = sizeof(zxRegexPlan) +
+                               plan->step_count * sizeof(zxStep) +
+                               plan->set_count * sizeof(zxByteRanges);
+  plan->tables_place = static_cast<std::uint32_t>(sets_end);
+  const std::size_t size =
+      plan_place + sets_end + (plan->set_count + 7U) / 8 * 256;
+  regex = resize(regex, size);
+  if (regex != nullptr)
+    write_sets(*const_cast<zxRegexPlan*>(regex->plan()), planner.all_sets());
+  return regex;
+}
