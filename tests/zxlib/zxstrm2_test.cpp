@@ -142,7 +142,7 @@ TEST(zxstrm2, a_replacement_is_read_within_its_length) {
     std::int32_t length;
     std::string_view result;
   } rows[] = {
-      {"`101", 3, "m10"},  // group 1 and 0
+      {"`101", 3, "m0"},  // group 1 and 0
       {"`1012", 4, "A"},  {"`12", 2, "m"},   {"xyz|", 2, "xy"},
       {"xyz", 0, ""},     {"x`1", 2, "x`"},  // nothing stands behind the escape
       {"x\\n", 2, "x\\"}, {"x``n", 3, "x`"}, {"`", 1, "`"},
@@ -615,7 +615,7 @@ const Texts k_pattern_words = {
     "$",  "`d+", "(ab)", "(x)?", "%d",  "(a|b)", "`1",   "{{a|bx}}", "(a|b)*"};
 const Texts k_subject_words = {"a", "b", "ab", "aa", "x", " ", "1", "-", "``"};
 const Texts k_replacement_words = {"x",  "yz", "`0",   "`1",    "`2",   "\\1",
-                                   "`9", "12", "`101", "\\012", "|",    "`|",
+                                   "`3", "12", "`101", "\\012", "|",    "`|",
                                    "``", "`n", "`q",   "0",     "[",    "]",
                                    "`",  "\\", "||",   "`1`2",  "`0`0", ""};
 
