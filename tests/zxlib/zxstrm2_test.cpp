@@ -682,6 +682,26 @@ TEST(zxstrm2, the_time_of_replacing_grows_with_the_text_alone) {
   }
 }
 
+// How often memory was taken, resized or given back.
+int memory_calls = 0;
+void* counting_realloc(void* block, std::size_t size) {
+  ++memory_calls;
+  return zx_heap_realloc(block, size);
+}
+
+TEST(zxstrm2, a_result_is_built_in_few_blocks) {
+  for (const char* pattern : {"b", "x*", ".", "b|c", "ab"}) {
+    zxStr text = str(std::string(200000, 'b'));
+    text.append("ab");
+    match(text, pattern);  // compiled, and the matcher has its stack
+    memory_calls = 0;
+    zx_realloc = counting_realloc;
+    EXPECT_TRUE(replace_all(text, pattern, "-"));
+    zx_realloc = zx_heap_realloc;
+    EXPECT_LT(memory_calls, 100) << pattern;
+  }
+}
+
 TEST(zxstrm2, a_long_text_is_replaced_in) {
   std::string subject;
   std::string expected;
