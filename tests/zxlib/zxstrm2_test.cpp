@@ -663,7 +663,7 @@ Clock::duration time_of(std::string_view unit, std::size_t n,
   return best;
 }
 
-TEST(zxstrm2, the_time_of_replacing_grows_with_the_text_alone) {
+TEST(zxstrm2_slow, the_time_of_replacing_grows_with_the_text_alone) {
   const struct {
     std::string_view unit;
     std::string_view pattern;
