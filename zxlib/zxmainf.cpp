@@ -8,6 +8,7 @@
 #include "zxplat.h"
 #include "zxsfmt.h"
 #include "zxstkdmp.h"
+#include "zxstrm.h"
 #include "zxsys2.h"
 
 constinit zxStr program_path;
@@ -103,6 +104,7 @@ void clear_at_exit() {
   current_dir.clear();
   program_name.clear();
   g_args.clear();
+  flush_regex_cache();
   clear_temp_path();
   let_go(g_stdin, zxplat::k_stdin_fd);
   let_go(g_stdout, zxplat::k_stdout_fd);
