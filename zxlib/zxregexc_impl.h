@@ -204,13 +204,12 @@ enum zxLook : std::uint8_t { k_look_end = 1, k_look_open = 2 };
 
 struct zxStep {
   zxStepKind kind;
-  union {
-    std::uint8_t number;      // see the kinds
-    std::uint8_t look_flags;  // of choices
-  };
-  std::uint8_t mask;       // of the set in its table
-  std::uint8_t look_mask;  // of the look set in its table
-  std::uint16_t next;      // step
+  std::uint8_t number;      // see the kinds
+  std::uint8_t mask;        // of the set in its table
+  std::uint8_t takes_all;   // 1: the set holds every byte
+  std::uint8_t look_flags;  // of choices
+  std::uint8_t look_mask;   // of the look set in its table
+  std::uint16_t next;       // step
   union {
     std::uint16_t other;  // step
     std::uint16_t min;    // of repetitions
@@ -219,7 +218,6 @@ struct zxStep {
   std::uint16_t max;  // k_no_limit: none
   std::uint16_t table;
   std::uint16_t look_table;
-  std::uint16_t unused;
 };
 static_assert(sizeof(zxStep) == 16);
 

@@ -542,6 +542,7 @@ class Planner {
     const int max = zxnode::maximum(node);
     step.min = static_cast<std::uint16_t>(zxnode::minimum(node));
     step.max = static_cast<std::uint16_t>(max);
+    step.takes_all = set == k_all_bytes ? 1 : 0;
     use_set(set, step.table, step.mask);
     const Outlook look = look_from(zxnode::next(node), step);
     if (look.is_known && !set.meets(look.bytes))
@@ -607,8 +608,7 @@ class Planner {
     if (step->kind < zxStepKind::repeat || step->max != k_no_limit ||
         step->min > 1)
       return 0;
-    if (sets.get(step->table * 8 + std::countr_zero(step->mask)) == k_all_bytes)
-      return k_plan_one_try;
+    if (step->takes_all != 0) return k_plan_one_try;
     return step->kind == zxStepKind::repeat ? k_plan_skips_run : 0;
   }
 

@@ -14,6 +14,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <utility>
 
 #include "zxregexe_impl.h"
 
@@ -25,32 +26,28 @@ namespace {
 
 // ------------------------------------------------------------ the record --
 
-// How much of the record the last run may have set.
-struct Touched {
-  int groups = 0;
-  int fields = 0;
-};
-Touched touched;
+// How many fields the last run may have set.
+int touched_fields = 0;
 
-void clear_slot(std::int32_t n) {
-  zx_match.start[n] = nullptr;
-  zx_match.end[n] = nullptr;
+// All slots one by one, which takes a dozen instructions; a loop would become
+// a call.
+template <std::size_t... n>
+void clear_slots(std::index_sequence<n...>) {
+  ((zx_match.start[n] = nullptr), ...);
+  ((zx_match.end[n] = nullptr), ...);
 }
-
-void clear_groups(int highest) {
-  for (int n = 0; n <= highest; ++n) clear_slot(n);
+void clear_slots() {
+  clear_slots(std::make_index_sequence<zxMatch::k_slots>());
 }
 
 void clear_fields(int count) {
-  std::fill_n(zx_match.field, count, zxMatch::Field{});
+  for (int n = 0; n < count; ++n) zx_match.field[n] = zxMatch::Field{};
 }
 
 void clear_record() {
-  clear_groups(touched.groups);
-  clear_slot(zxMatch::k_before);
-  clear_slot(zxMatch::k_after);
+  clear_slots();
   std::fill_n(zx_match.alternative, zxMatch::k_slots, 0);
-  clear_fields(touched.fields);
+  clear_fields(touched_fields);
 }
 
 void set_slot(std::int32_t n, const char* start, const char* end) {
@@ -111,10 +108,6 @@ struct Stack {
     }
     return resize(wanted) ? bottom + used : nullptr;
   }
-
-  void give_back() {
-    if (capacity() > k_kept) resize(k_kept);
-  }
 };
 Stack stack;
 
@@ -129,14 +122,63 @@ Stack stack;
 struct Effect {
   std::uint16_t touched;  // a bit for each slot
   std::uint8_t current;   // the current group that it began with
-  std::int32_t counts[zxMatch::k_slots];
+  std::uint32_t next;     // with the same hash; 0: none
+  std::int32_t counts[zxMatch::k_slots];  // 0 where not touched
 
   bool operator==(const Effect& other) const {
-    if (touched != other.touched || current != other.current) return false;
-    for (int n = 0; n < zxMatch::k_slots; ++n)
-      if ((touched >> n & 1) != 0 && counts[n] != other.counts[n]) return false;
+    return touched == other.touched && current == other.current &&
+           std::equal(counts, counts + zxMatch::k_slots, other.counts);
+  }
+  std::uint32_t hash() const {
+    std::uint32_t value = touched + 31U * current;
+    for (const std::int32_t count : counts)
+      value = (value ^ static_cast<std::uint32_t>(count)) * 16777619U;
+    return value ^ (value >> 15);
+  }
+};
+
+// The different effects, each once, numbered from 1.
+class EffectList {
+ public:
+  static constexpr std::size_t k_most_bytes = 64U << 20;
+
+  void clear() {
+    zx_realloc(effects, 0);
+    effects = nullptr;
+    length = capacity = 0;
+    std::memset(heads, 0, sizeof heads);
+  }
+
+  const Effect& get(std::uint32_t number) const { return effects[number - 1]; }
+
+  // The number of an effect; 0 if there is no room for it.
+  std::uint32_t number_of(Effect effect) {
+    std::uint32_t& head = heads[effect.hash() % k_heads];
+    for (std::uint32_t n = head; n != 0; n = get(n).next)
+      if (get(n) == effect) return n;
+    if (length == capacity && !grow()) return 0;
+    effect.next = head;
+    effects[length] = effect;
+    return head = ++length;
+  }
+
+ private:
+  static constexpr std::uint32_t k_heads = 4096;
+
+  bool grow() {
+    const std::uint32_t wanted = capacity == 0 ? 64 : 2 * capacity;
+    if (wanted > k_most_bytes / sizeof(Effect)) return false;
+    void* block = zx_realloc(effects, wanted * sizeof(Effect));
+    if (block == nullptr) return false;
+    effects = static_cast<Effect*>(block);
+    capacity = wanted;
     return true;
   }
+
+  Effect* effects = nullptr;
+  std::uint32_t length = 0;
+  std::uint32_t capacity = 0;
+  std::uint32_t heads[k_heads];
 };
 
 class Memory {
@@ -147,51 +189,46 @@ class Memory {
   bool open(std::size_t step_count, const char* subject, const char* end) {
     start = subject;
     places = static_cast<std::size_t>(end - subject) + 1;
-    const std::size_t most = k_most_bytes / sizeof(std::uint16_t);
-    if (step_count > most / places) return false;
-    const std::size_t bytes = step_count * places * sizeof(std::uint16_t);
-    cells = static_cast<std::uint16_t*>(zx_realloc(nullptr, bytes));
+    if (step_count > k_most_bytes / sizeof cells[0] / places) return false;
+    const std::size_t bytes = step_count * places * sizeof cells[0];
+    cells = static_cast<std::uint32_t*>(zx_realloc(nullptr, bytes));
     if (cells == nullptr) return false;
     std::memset(cells, 0, bytes);
-    effect_count = 0;
+    effects.clear();
     return true;
   }
 
   void close() {
-    if (cells != nullptr) zx_realloc(cells, 0);
+    zx_realloc(cells, 0);
     cells = nullptr;
+    effects.clear();
   }
 
   bool is_open() const { return cells != nullptr; }
 
   // The effect of the failure at that place; null if none is known.
-  const Effect* recall(std::size_t step, const char* at, int current) const {
-    const std::uint16_t number = cells[cell(step, at)];
+  const Effect* recall(std::size_t step, const char* at,
+                       std::uint32_t current) const {
+    const std::uint32_t number = cells[cell(step, at)];
     if (number == 0) return nullptr;
-    const Effect& effect = effects[number - 1];
+    const Effect& effect = effects.get(number);
     return effect.current == current ? &effect : nullptr;
   }
 
   void note(std::size_t step, const char* at, const Effect& effect) {
-    int i = 0;
-    while (i < effect_count && !(effects[i] == effect)) ++i;
-    if (i == k_most_effects) return;
-    if (i == effect_count) effects[effect_count++] = effect;
-    cells[cell(step, at)] = static_cast<std::uint16_t>(i + 1);
+    const std::uint32_t number = effects.number_of(effect);
+    if (number != 0) cells[cell(step, at)] = number;
   }
 
  private:
-  static constexpr int k_most_effects = 256;
-
   std::size_t cell(std::size_t step, const char* at) const {
     return step * places + static_cast<std::size_t>(at - start);
   }
 
-  std::uint16_t* cells = nullptr;
+  std::uint32_t* cells = nullptr;
   const char* start = nullptr;
   std::size_t places = 0;
-  int effect_count = 0;
-  Effect effects[k_most_effects];
+  EffectList effects;
 };
 Memory memory;
 
@@ -218,40 +255,49 @@ struct State {
 template <bool remembers>
 class Run {
  public:
-  Run(const zxRegex& its_regex, const Subject& subject)
-      : program(its_regex.program()),
-        plan(*its_regex.plan()),
+  Run(const zxRegex& regex, const char* its_start, const char* its_end,
+      int its_previous)
+      : program(regex.program()),
+        plan(*regex.plan()),
         steps(plan.steps()),
         tables(plan.tables()),
-        start(subject.start),
-        end(subject.end),
-        previous(subject.previous) {}
+        start(its_start),
+        end(its_end),
+        previous(its_previous) {}
+  explicit Run(const Run<false>& other) requires remembers
+      : program(other.program),
+        plan(other.plan),
+        steps(other.steps),
+        tables(other.tables),
+        start(other.start),
+        end(other.end),
+        previous(other.previous) {}
 
   // Tries a match at one place.
   Outcome from(const char* at) {
-    State state{steps + plan.first, at, stack.bottom, 0};
-    return go(state);
+    return go({steps + plan.first, at, stack.bottom, 0}, true);
   }
 
   // Goes on with a run that has gone back too often.
-  Outcome resume(Frame* top) {
-    State state{nullptr, nullptr, top, 0};
-    return go_back(state) ? go(state) : Outcome::failed;
-  }
+  Outcome resume(Frame* top) { return go({steps, start, top, 0}, false); }
 
   Frame* left_at = nullptr;   // the stack of a run that left
   std::int64_t patience = 0;  // how often it may still go back
   std::uint32_t touched_counts = 0;
 
  private:
-  Outcome go(State& state) {
-    for (;;) {
-      if (forward(state)) return Outcome::matched;
+  friend class Run<true>;
+
+  // A state of its own, and all that takes it inlined, so that it lives in
+  // registers.
+  Outcome go(State s, bool starts_forward) {
+    for (bool goes_forward = starts_forward;; goes_forward = true) {
+      if (goes_forward && forward(s)) return Outcome::matched;
       if (!remembers && --patience < 0) {
-        left_at = state.top;
+        left_at = s.top;
         return Outcome::too_often;
       }
-      if (!go_back(state)) return Outcome::failed;
+      if (!go_back(s)) return Outcome::failed;
     }
   }
 
@@ -262,7 +308,7 @@ class Run {
       s.step = steps + step.next;
       switch (step.kind) {
         case zxStepKind::succeed:
-          set_slot(0, nullptr, s.at);
+          zx_match.end[0] = s.at;
           return true;
         case zxStepKind::byte:
           if (!is_byte(s, step.number)) return false;
@@ -279,7 +325,7 @@ class Run {
           ++s.at;
           break;
         case zxStepKind::at_start:
-          if (s.at != start || previous != Subject::k_at_start) return false;
+          if (s.at != start || previous != k_at_start) return false;
           break;
         case zxStepKind::at_end:
           if (s.at != end) return false;
@@ -323,6 +369,8 @@ class Run {
         case zxStepKind::repeat_lazy:
           if (!repeat_lazy(s, step)) return false;
           break;
+        default:
+          __builtin_unreachable();
       }
     }
   }
@@ -400,10 +448,8 @@ class Run {
     return (tables[table * 256 + static_cast<unsigned char>(*at)] & mask) != 0;
   }
 
-  ByteScan scan_of(unsigned table, unsigned mask) const {
-    return {tables + table * 256, static_cast<std::uint8_t>(mask),
-            plan.sets() + table * 8 +
-                static_cast<unsigned>(std::countr_zero(mask))};
+  unsigned set_of(unsigned table, unsigned mask) const {
+    return table * 8 + static_cast<unsigned>(std::countr_zero(mask));
   }
 
   ZX_INLINE bool is_byte(State& s, std::uint8_t byte) const {
@@ -426,7 +472,7 @@ class Run {
 
   bool is_word_edge(const char* at) const {
     const bool ahead =
-        at == start ? previous != Subject::k_at_start &&
+        at == start ? previous != k_at_start &&
                           zx_is(static_cast<char>(previous), k_regex_edge_class)
                     : zx_is(at[-1], k_regex_edge_class);
     return ahead != (at != end && zx_is(*at, k_regex_edge_class));
@@ -455,7 +501,7 @@ class Run {
   }
 
   // Inside a loop a group can have begun again behind its old end.
-  bool is_group(State& s, unsigned n) const {
+  ZX_INLINE bool is_group(State& s, unsigned n) const {
     const char* text = zx_match.start[n];
     const char* text_end = zx_match.end[n];
     if (text == nullptr || text_end == nullptr || text_end < text) return false;
@@ -469,7 +515,7 @@ class Run {
     return zx_match.field[program[steps[step].place + k_node_head]];
   }
 
-  bool is_field(State& s, const zxStep& step) {
+  ZX_INLINE bool is_field(State& s, const zxStep& step) {
     const char* behind = field_end(program + step.place, s.at, end);
     if (behind == nullptr) return false;
     const std::uint16_t number = number_of(step);
@@ -532,7 +578,7 @@ class Run {
 
   // True if the pass of a loop took nothing: it ends where the loop's last
   // choice was made.  `exit` is the alternative that leaves the loop.
-  bool is_empty_pass(const State& s, std::uint16_t exit) const {
+  ZX_INLINE bool is_empty_pass(const State& s, std::uint16_t exit) const {
     for (const Frame* frame = s.top; frame != stack.bottom;) {
       --frame;
       if (frame->kind == FrameKind::alternative && frame->step == exit)
@@ -542,32 +588,48 @@ class Run {
   }
 
   // ---- repetitions
-  // How often the set goes on from there, up to the step's maximum.
-  ZX_INLINE std::size_t run_length(const zxStep& step, const char* at) const {
-    const auto left = static_cast<std::size_t>(end - at);
-    const char* limit = step.max == k_no_limit
-                            ? end
-                            : at + std::min<std::size_t>(left, step.max);
-    const char* p = at;
-    const char* near_limit = limit - p > 16 ? p + 16 : limit;
-    while (p < near_limit && has(p, step.table, step.mask)) ++p;
-    if (p == near_limit && p < limit)
-      p = find_not_in(scan_of(step.table, step.mask), p, limit);
-    return static_cast<std::size_t>(p - at);
+  // How far a repetition that begins at `at` may go by its maximum.
+  ZX_INLINE const char* limit_of(const zxStep& step, const char* at) const {
+    return step.max == k_no_limit || end - at <= step.max ? end : at + step.max;
+  }
+
+  // How far the step's set goes on, up to `limit`.
+  ZX_INLINE const char* run_end(const zxStep& step, const char* at,
+                                const char* limit) const {
+    if (step.takes_all != 0) return limit;
+    const std::uint8_t* table = tables + step.table * 256U;
+    const unsigned mask = step.mask;
+    const auto fits = [=](const char* place) {
+      return (table[static_cast<unsigned char>(*place)] & mask) != 0;
+    };
+    constexpr std::ptrdiff_t k_near = 16;
+    const char* const near_limit = limit - at > k_near ? at + k_near : limit;
+    for (; near_limit - at >= 4; at += 4) {
+      if (!fits(at)) return at;
+      if (!fits(at + 1)) return at + 1;
+      if (!fits(at + 2)) return at + 2;
+      if (!fits(at + 3)) return at + 3;
+    }
+    for (; at != near_limit; ++at)
+      if (!fits(at)) return at;
+    return at == limit ? at
+                       : find_not_in(plan, set_of(step.table, mask), at, limit);
   }
 
   ZX_INLINE bool repeat_for_good(State& s, const zxStep& step) const {
-    const std::size_t count = run_length(step, s.at);
-    if (count < step.min) return false;
-    s.at += count;
+    const char* const behind = run_end(step, s.at, limit_of(step, s.at));
+    if (behind - s.at < step.min) return false;
+    s.at = behind;
     return true;
   }
 
   ZX_INLINE bool repeat_greedy(State& s, const zxStep& step) {
-    const std::size_t count = run_length(step, s.at);
-    if (count < step.min) return false;
-    if (remembers && count > step.min && has_failed(s, step)) return false;
-    return try_counts_down(s, step, s.at, count);
+    const char* const behind = run_end(step, s.at, limit_of(step, s.at));
+    if (behind - s.at < step.min) return false;
+    if (remembers && behind - s.at > step.min && has_failed(s, step))
+      return false;
+    return try_counts_down(s, step, s.at,
+                           static_cast<std::size_t>(behind - s.at));
   }
 
   // Goes on behind the highest count up to `count` that the byte there
@@ -577,8 +639,9 @@ class Run {
     const std::size_t min = step.min;
     if (!can_go_on(step, base + count)) {
       if (count == min) return false;
-      const char* place = find_last_in(scan_of(step.look_table, step.look_mask),
-                                       base + min, base + count);
+      const char* place =
+          find_last_in(plan, set_of(step.look_table, step.look_mask),
+                       base + min, base + count);
       if (place == nullptr) return false;
       count = static_cast<std::size_t>(place - base);
     }
@@ -597,9 +660,9 @@ class Run {
 
   ZX_INLINE bool repeat_lazy(State& s, const zxStep& step) {
     if (step.min > 0) {
-      zxStep least = step;
-      least.max = step.min;
-      if (run_length(least, s.at) < step.min) return false;
+      if (end - s.at < step.min) return false;
+      const char* const least = s.at + step.min;
+      if (run_end(step, s.at, least) != least) return false;
     }
     if (remembers && has_failed(s, step)) return false;
     return try_counts_up(s, step, s.at, step.min);
@@ -608,16 +671,9 @@ class Run {
   // The same from the lowest count upward; `count` bytes are known to fit.
   ZX_INLINE bool try_counts_up(State& s, const zxStep& step, const char* base,
                                std::size_t count) {
-    const char* place = base + count;
-    const char* limit =
-        step.max == k_no_limit
-            ? end
-            : base + std::min<std::size_t>(static_cast<std::size_t>(end - base),
-                                           step.max);
-    while (!can_go_on(step, place)) {
-      if (place == limit || !has(place, step.table, step.mask)) return false;
-      ++place;
-    }
+    const char* const limit = limit_of(step, base);
+    const char* place = next_way_on(step, base + count, limit);
+    if (place == nullptr) return false;
     if (place != limit && has(place, step.table, step.mask) &&
         !push(s, frame_of(s, FrameKind::lazy, step,
                           static_cast<std::size_t>(place - base) + 1, base)))
@@ -625,6 +681,21 @@ class Run {
     s.at = place;
     s.step = steps + step.next;
     return true;
+  }
+
+  // The first place from `at` to `limit` where the run can go on, the bytes
+  // ahead of it being in the set; null if there is none.
+  ZX_INLINE const char* next_way_on(const zxStep& step, const char* at,
+                                    const char* limit) const {
+    if (step.takes_all != 0 && (step.look_flags & k_look_open) == 0) {
+      at = find_in(plan, set_of(step.look_table, step.look_mask), at, limit);
+      return at != limit || can_go_on(step, at) ? at : nullptr;
+    }
+    while (!can_go_on(step, at)) {
+      if (at == limit || !has(at, step.table, step.mask)) return nullptr;
+      ++at;
+    }
+    return at;
   }
 
   ZX_INLINE bool repeat_more(State& s, const Frame& frame) {
@@ -635,10 +706,9 @@ class Run {
   // ---- remembered failures
   // If the choice has failed at this place before, its effect is brought
   // about; otherwise a frame sees to it that its failure is noted.
-  bool has_failed(State& s, const zxStep& step) {
+  ZX_INLINE bool has_failed(State& s, const zxStep& step) {
     const std::size_t number = number_of(step);
-    if (const Effect* effect =
-            memory.recall(number, s.at, static_cast<int>(s.current))) {
+    if (const Effect* effect = memory.recall(number, s.at, s.current)) {
       repeat_effect(*effect);
       return true;
     }
@@ -655,10 +725,12 @@ class Run {
 
   void note_failure(const Frame& frame) {
     if (!remembers) return;
-    Effect effect;
+    Effect effect{};
     effect.touched = static_cast<std::uint16_t>(touched_counts);
     effect.current = frame.current;
-    std::copy_n(zx_match.alternative, zxMatch::k_slots, effect.counts);
+    for (int n = 0; n < zxMatch::k_slots; ++n)
+      if ((touched_counts >> n & 1) != 0)
+        effect.counts[n] = zx_match.alternative[n];
     memory.note(frame.step, frame.place, effect);
     touched_counts |= frame.count;
   }
@@ -677,43 +749,41 @@ class Run {
 // ------------------------------------------------------------ the search --
 
 // How often a run may go back before failures are remembered.
-std::int64_t patience_for(const Subject& subject) {
+std::int64_t patience_for(std::ptrdiff_t length) {
   constexpr std::int64_t k_base = 256;
-  constexpr std::int64_t k_for_each_byte = 4;
-  return k_base + k_for_each_byte * (subject.end - subject.start);
+  constexpr std::int64_t k_for_each_byte = 16;
+  return k_base + k_for_each_byte * length;
 }
 
 class Search {
  public:
-  Search(const zxRegex& its_regex, const Subject& its_subject)
-      : regex(its_regex),
-        plan(*its_regex.plan()),
-        subject(its_subject),
-        starts{plan.tables() + plan.start_set / 8 * 256,
-               static_cast<std::uint8_t>(1U << (plan.start_set % 8)),
-               plan.sets() + plan.start_set},
-        run(its_regex, its_subject) {
+  Search(const zxRegex& regex, const char* its_start, const char* its_end,
+         int previous)
+      : plan(*regex.plan()),
+        start(its_start),
+        end(its_end),
+        run(regex, its_start, its_end, previous) {
     run.patience = (plan.choice_bits & k_plan_remembers) != 0
-                       ? patience_for(subject)
+                       ? patience_for(end - start)
                        : INT64_MAX;
   }
 
   ~Search() {
-    memory.close();
-    stack.give_back();
+    if (memory.is_open()) memory.close();
+    if (stack.capacity() > Stack::k_kept) stack.resize(Stack::k_kept);
   }
   Search(const Search&) = delete;
   Search& operator=(const Search&) = delete;
 
-  bool find() {
-    if (regex.reganch != 0) return try_at(subject.start);
-    for (const char* at = subject.start;; ++at) {
+  bool find(bool is_anchored) {
+    if (is_anchored) return try_at(start);
+    for (const char* at = start;; ++at) {
       at = next_start(at);
       if (at == nullptr) return false;
       if (try_at(at)) return true;
       if ((plan.choice_bits & k_plan_one_try) != 0) return false;
       if ((plan.choice_bits & k_plan_skips_run) != 0) at = behind_run(at) - 1;
-      if (at >= subject.end) return false;
+      if (at >= end) return false;
     }
   }
 
@@ -721,9 +791,8 @@ class Search {
   // The first place from `at` on where a match can begin; null if none.
   const char* next_start(const char* at) const {
     if ((plan.start_flags & k_look_open) != 0) return at;
-    const char* place = find_in(starts, at, subject.end);
-    const bool ok =
-        place != subject.end || (plan.start_flags & k_look_end) != 0;
+    const char* place = find_in(plan, plan.start_set, at, end);
+    const bool ok = place != end || (plan.start_flags & k_look_end) != 0;
     return ok ? place : nullptr;
   }
 
@@ -732,48 +801,40 @@ class Search {
   const char* behind_run(const char* at) const {
     const zxStep* step = plan.steps() + plan.first;
     while (step->kind != zxStepKind::repeat) step = plan.steps() + step->next;
-    const ByteScan set{plan.tables() + step->table * 256, step->mask,
-                       plan.sets() + step->table * 8 +
-                           static_cast<unsigned>(std::countr_zero(
-                               static_cast<unsigned>(step->mask)))};
-    return std::max(find_not_in(set, at, subject.end), at + 1);
+    const unsigned set =
+        step->table * 8U + static_cast<unsigned>(std::countr_zero(step->mask));
+    return std::max(find_not_in(plan, set, at, end), at + 1);
   }
 
   bool try_at(const char* at) {
     if (outcome_at(at) == Outcome::matched) {
-      set_slot(0, at, zx_match.end[0]);
-      set_slot(zxMatch::k_before, subject.start, at);
-      set_slot(zxMatch::k_after, zx_match.end[0], subject.end);
+      zx_match.start[0] = at;
+      set_slot(zxMatch::k_before, start, at);
+      set_slot(zxMatch::k_after, zx_match.end[0], end);
       return true;
     }
-    clear_groups(plan.groups);
+    if (plan.groups != 0) clear_slots();
     if (plan.fields != 0) clear_fields(plan.fields);
     return false;
   }
 
   Outcome outcome_at(const char* at) {
-    if (!memory.is_open()) {
-      const Outcome outcome = run.from(at);
-      return outcome == Outcome::too_often ? give_more_room() : outcome;
-    }
-    Run<true> patient(regex, subject);
-    return patient.from(at);
+    if (memory.is_open()) return Run<true>(run).from(at);
+    const Outcome outcome = run.from(at);
+    return outcome == Outcome::too_often ? go_on_remembering() : outcome;
   }
 
   // The run goes on and remembers its failures, if there is room for them.
-  Outcome give_more_room() {
-    if (memory.open(plan.step_count, subject.start, subject.end)) {
-      Run<true> patient(regex, subject);
-      return patient.resume(run.left_at);
-    }
+  [[gnu::noinline]] Outcome go_on_remembering() {
+    if (memory.open(plan.step_count, start, end))
+      return Run<true>(run).resume(run.left_at);
     run.patience = INT64_MAX;
     return run.resume(run.left_at);
   }
 
-  const zxRegex& regex;
   const zxRegexPlan& plan;
-  const Subject& subject;
-  const ByteScan starts;
+  const char* const start;
+  const char* const end;
   Run<false> run;
 };
 
@@ -803,40 +864,38 @@ bool can_run(const zxRegex* regex, const char* subject, const char* end) {
   return ZX_ASSERT(end >= subject && end - subject < 0x7FFFFFFF);
 }
 
-bool is_rejected(const zxRegex& regex, const Subject& subject) {
+bool is_rejected(const zxRegex& regex, const char* start, const char* end) {
   if (regex.reganch == 2 &&
-      (subject.start == subject.end ||
-       static_cast<std::uint8_t>(*subject.start) != regex.regstart))
+      (start == end || static_cast<std::uint8_t>(*start) != regex.regstart))
     return true;
   return regex.regmust != nullptr &&
-         find_literal(subject.start, subject.end, regex.regmust,
-                      regex.regmlen) == nullptr;
+         find_literal(start, end, regex.regmust, regex.regmlen) == nullptr;
 }
 
-bool search(const zxRegex& regex, const Subject& subject) {
+bool search(const zxRegex& regex, const char* start, const char* end,
+            int previous) {
   clear_record();
-  touched = {regex.plan()->groups, regex.plan()->fields};
-  return Search(regex, subject).find();
+  touched_fields = regex.plan()->fields;
+  return Search(regex, start, end, previous).find(regex.reganch != 0);
 }
 
 }  // namespace zxregexe
 
 bool regexec(const zxRegex* regex, const char* subject, const char* end) {
-  using namespace zxregexe;
-  if (!can_run(regex, subject, end)) return false;
-  const Subject whole{subject, end, Subject::k_at_start};
-  return !is_rejected(*regex, whole) && search(*regex, whole);
+  return zxregexe::can_run(regex, subject, end) &&
+         !zxregexe::is_rejected(*regex, subject, end) &&
+         zxregexe::search(*regex, subject, end, zxregexe::k_at_start);
 }
 
 bool regexec_from(const zxRegex* regex, const char* subject, const char* end,
                   char prev_char) {
-  using namespace zxregexe;
-  if (!can_run(regex, subject, end)) return false;
-  const Subject rest{subject, end, static_cast<unsigned char>(prev_char)};
-  return !is_rejected(*regex, rest) && search(*regex, rest);
+  return zxregexe::can_run(regex, subject, end) &&
+         !zxregexe::is_rejected(*regex, subject, end) &&
+         zxregexe::search(*regex, subject, end,
+                          static_cast<unsigned char>(prev_char));
 }
 
 void clear_match() {
   zx_match = zxMatch{};
-  zxregexe::touched = {};
+  zxregexe::touched_fields = 0;
 }

@@ -11,23 +11,19 @@ namespace zxregexe {
 
 // ------------------------------------------------------------- searching --
 
-// What a search is given.  `previous` is the byte ahead of the subject, or
-// k_at_start.
-struct Subject {
-  static constexpr int k_at_start = -1;
-  const char* start;
-  const char* end;
-  int previous;
-};
+// In place of the byte ahead of a subject: there is none.
+inline constexpr int k_at_start = -1;
 
 // False, as a failure, if a run can't be made; true if it can.
 bool can_run(const zxRegex* regex, const char* subject, const char* end);
 
 // True if the subject lacks what the header says that any match must have.
-bool is_rejected(const zxRegex& regex, const Subject& subject);
+bool is_rejected(const zxRegex& regex, const char* start, const char* end);
 
-// Clears the record and searches.
-bool search(const zxRegex& regex, const Subject& subject);
+// Clears the record and searches.  `previous` is the byte ahead of the
+// subject, or k_at_start.
+bool search(const zxRegex& regex, const char* start, const char* end,
+            int previous);
 
 // ---------------------------------------------------------------- fields --
 
@@ -37,22 +33,14 @@ const char* field_end(zxnode::Node node, const char* at, const char* end);
 
 // -------------------------------------------------------------- scanning --
 
-// A set of bytes in a form that scans fast.
-struct ByteScan {
-  const std::uint8_t* table;
-  std::uint8_t mask;
-  const zxByteRanges* ranges;
-
-  bool has(char byte) const {
-    return (table[static_cast<unsigned char>(byte)] & mask) != 0;
-  }
-};
-
-// The first byte from `at` on that is (not) in the set; `end` if there is
-// none.  The last byte ahead of `end` that is in the set, or null.
-const char* find_in(const ByteScan& set, const char* at, const char* end);
-const char* find_not_in(const ByteScan& set, const char* at, const char* end);
-const char* find_last_in(const ByteScan& set, const char* at, const char* end);
+// The first byte from `at` on that is (not) in set `set` of the plan; `end` if
+// there is none.  The last byte ahead of `end` that is in the set, or null.
+const char* find_in(const zxRegexPlan& plan, unsigned set, const char* at,
+                    const char* end);
+const char* find_not_in(const zxRegexPlan& plan, unsigned set, const char* at,
+                        const char* end);
+const char* find_last_in(const zxRegexPlan& plan, unsigned set, const char* at,
+                         const char* end);
 
 }  // namespace zxregexe
 

@@ -50,9 +50,27 @@ class RangeTest {
   unsigned flip;
 };
 
-bool has_ranges(const ByteScan& set) {
-  return set.ranges->count != k_many_ranges && set.ranges->count != 0;
-}
+// One set of a plan.
+class ByteScan {
+ public:
+  ByteScan(const zxRegexPlan& plan, unsigned set)
+      : table(plan.tables() + set / 8 * 256),
+        mask(1U << (set % 8)),
+        its_ranges(plan.sets()[set]) {}
+
+  bool has(char byte) const {
+    return (table[static_cast<unsigned char>(byte)] & mask) != 0;
+  }
+  const zxByteRanges& ranges() const { return its_ranges; }
+  bool has_ranges() const {
+    return its_ranges.count != k_many_ranges && its_ranges.count != 0;
+  }
+
+ private:
+  const std::uint8_t* table;
+  unsigned mask;
+  const zxByteRanges& its_ranges;
+};
 
 // The first byte whose membership is `wanted`.
 template <bool wanted>
@@ -60,8 +78,8 @@ const char* find(const ByteScan& set, const char* at, const char* end) {
   const char* const first_end = end - at > k_block ? at + k_block : end;
   for (; at < first_end; ++at)
     if (set.has(*at) == wanted) return at;
-  if (has_ranges(set) && end - at >= k_block) {
-    const RangeTest test(*set.ranges);
+  if (set.has_ranges() && end - at >= k_block) {
+    const RangeTest test(set.ranges());
     for (; end - at >= k_block; at += k_block) {
       const unsigned hits = wanted ? test(at) : test(at) ^ 0xFFFF;
       if (hits != 0) return at + std::countr_zero(hits);
@@ -74,20 +92,24 @@ const char* find(const ByteScan& set, const char* at, const char* end) {
 
 }  // namespace
 
-const char* find_in(const ByteScan& set, const char* at, const char* end) {
-  return find<true>(set, at, end);
+const char* find_in(const zxRegexPlan& plan, unsigned set, const char* at,
+                    const char* end) {
+  return find<true>(ByteScan(plan, set), at, end);
 }
 
-const char* find_not_in(const ByteScan& set, const char* at, const char* end) {
-  return find<false>(set, at, end);
+const char* find_not_in(const zxRegexPlan& plan, unsigned set, const char* at,
+                        const char* end) {
+  return find<false>(ByteScan(plan, set), at, end);
 }
 
-const char* find_last_in(const ByteScan& set, const char* at, const char* end) {
+const char* find_last_in(const zxRegexPlan& plan, unsigned number,
+                         const char* at, const char* end) {
+  const ByteScan set(plan, number);
   const char* const first_begin = end - at > k_block ? end - k_block : at;
   while (end > first_begin)
     if (set.has(*--end)) return end;
-  if (has_ranges(set) && end - at >= k_block) {
-    const RangeTest test(*set.ranges);
+  if (set.has_ranges() && end - at >= k_block) {
+    const RangeTest test(set.ranges());
     for (; end - at >= k_block; end -= k_block) {
       const unsigned hits = test(end - k_block);
       if (hits != 0) return end - k_block + std::bit_width(hits) - 1;

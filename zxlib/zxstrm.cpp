@@ -101,8 +101,13 @@ zxRegex* known_regex(const char* text, std::int32_t length) {
 
 // -------------------------------------------------------------- searching --
 
-zxregexe::Subject subject_of(const zxStr& text) {
-  return {text.begin(), text.end(), zxregexe::Subject::k_at_start};
+bool is_rejected(const zxRegex& regex, const zxStr& subject) {
+  return zxregexe::is_rejected(regex, subject.begin(), subject.end());
+}
+
+bool search(const zxRegex& regex, const zxStr& subject) {
+  return zxregexe::search(regex, subject.begin(), subject.end(),
+                          zxregexe::k_at_start);
 }
 
 bool match_with(const zxRegex* regex, const zxStr& subject) {
@@ -129,9 +134,9 @@ bool imatch_with(const zxRegex* regex, const zxStr& subject) {
   if (regex == nullptr) return false;
   zxIStr folded(subject);
   folded.to_lower();
-  if (zxregexe::is_rejected(*regex, subject_of(folded))) return false;
+  if (is_rejected(*regex, folded)) return false;
   cache.subject = subject;
-  if (!zxregexe::search(*regex, subject_of(folded))) return false;
+  if (!search(*regex, folded)) return false;
   rebase_match(folded.begin(), cache.subject.begin());
   return true;
 }
@@ -152,9 +157,9 @@ const zxRegex* zxstrm::regex_of(const zxStr& pattern) {
 // The results that a rejected match leaves lie in the old subject, so the
 // holder changes only when they are cleared.
 bool zxstrm::search_held(const zxRegex& regex, const zxStr& subject) {
-  if (zxregexe::is_rejected(regex, subject_of(subject))) return false;
+  if (is_rejected(regex, subject)) return false;
   cache.subject = subject;
-  return zxregexe::search(regex, subject_of(cache.subject));
+  return search(regex, cache.subject);
 }
 
 const zxStr& zxstrm::held_subject() { return cache.subject; }
