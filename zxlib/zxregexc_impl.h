@@ -168,15 +168,17 @@ int maximum(Node node);
 //
 // All places in it are relative, so that a block may be moved as it is.
 //
-//   | zxRegexPlan | steps | sets | tables of 256 bytes |
+//   | zxRegexPlan | steps | sets | tests | marks | tables of 256 bytes |
 //
 // Set s holds byte c if table s / 8 has bit s % 8 in byte c.
 
 enum class zxStepKind : std::uint8_t {
   succeed,
-  byte,     // number: the byte
-  literal,  // number: its length, place: of its bytes
-  set,      // table, mask
+  sequence,  // number: how many bytes, place: of the first of their tests;
+             // table: how many marks, look_table: the first of them
+  byte,      // number: the byte
+  literal,   // number: its length, place: of its bytes
+  set,       // table, mask
   any,
   at_start,
   at_end,
@@ -200,7 +202,12 @@ inline constexpr std::uint16_t k_no_limit = 0xFFFF;
 
 // Where a choice goes on, the byte there must be in `look`, or be the end if
 // this is k_look_end; k_look_open: it may be anything.
-enum zxLook : std::uint8_t { k_look_end = 1, k_look_open = 2 };
+// With k_look_only, no later alternative can go on where this one can.
+enum zxLook : std::uint8_t {
+  k_look_end = 1,
+  k_look_open = 2,
+  k_look_only = 4,
+};
 
 struct zxStep {
   zxStepKind kind;
@@ -220,6 +227,22 @@ struct zxStep {
   std::uint16_t look_table;
 };
 static_assert(sizeof(zxStep) == 16);
+
+// The test of one byte in a sequence: whether it is in a set, or, with a mask
+// of 0, whether it is `table`.
+struct zxByteTest {
+  std::uint16_t table;
+  std::uint8_t mask;
+  std::uint8_t unused;
+};
+
+// Where in a sequence a group opens or closes.
+struct zxGroupMark {
+  std::uint8_t group;
+  std::uint8_t offset;  // from the sequence's begin
+  std::uint8_t closes;  // 1: it closes
+  std::uint8_t unused;
+};
 
 // A set as up to three ranges of bytes, or the lack of such.
 struct zxByteRanges {
@@ -242,6 +265,9 @@ struct zxRegexPlan {
   std::uint8_t fields;
   std::uint8_t choice_bits;    // see below
   std::uint32_t tables_place;  // from the plan's begin
+  std::uint16_t test_count;
+  std::uint16_t mark_count;
+  std::uint32_t unused;
 
   const zxStep* steps() const {
     return reinterpret_cast<const zxStep*>(this + 1);
@@ -249,11 +275,17 @@ struct zxRegexPlan {
   const zxByteRanges* sets() const {
     return reinterpret_cast<const zxByteRanges*>(steps() + step_count);
   }
+  const zxByteTest* tests() const {
+    return reinterpret_cast<const zxByteTest*>(sets() + set_count);
+  }
+  const zxGroupMark* marks() const {
+    return reinterpret_cast<const zxGroupMark*>(tests() + test_count);
+  }
   const std::uint8_t* tables() const {
     return reinterpret_cast<const std::uint8_t*>(this) + tables_place;
   }
 };
-static_assert(sizeof(zxRegexPlan) == 16);
+static_assert(sizeof(zxRegexPlan) == 24);
 
 // Bits of choice_bits.
 // What failed at a place fails there whatever happened before, so failures
@@ -264,6 +296,9 @@ inline constexpr std::uint8_t k_plan_one_try = 2;
 // Begins with a repetition without minimum above 1 that is never gone back
 // into: a try that fails fails at all starts within that run of bytes.
 inline constexpr std::uint8_t k_plan_skips_run = 4;
+
+// A try that has failed leaves no count that a later one could read.
+inline constexpr std::uint8_t k_plan_fresh_tries = 8;
 
 // Makes the plan of a program and puts it behind it; returns the block, which
 // may have moved.  An opcode that does not exist fails an assertion.

@@ -138,19 +138,28 @@ static_assert(std::endian::native == std::endian::little);
 class Outlook {
  public:
   enum class Purpose {
-    choice,  // of a choice inside the pattern
-    start,   // of a match as a whole
+    choice,    // of a choice inside the pattern
+    last_try,  // ... if its failure is that of the whole try
+    start,     // of a match as a whole
   };
   Outlook(Node node, Purpose purpose, bool program_has_loops)
-      : may_open(purpose == Purpose::start || !program_has_loops),
+      : is_free(purpose == Purpose::last_try),
+        may_open(purpose != Purpose::choice || !program_has_loops),
         is_ahead_of_choices(purpose == Purpose::start) {
     is_known = walk(node, false);
     if (!is_known) bytes = k_all_bytes;
   }
 
   bool is_known;
-  bool at_end = false;  // the end of the subject can be met
+  bool at_end = false;   // the end of the subject can be met
+  bool is_free = false;  // each try writes the count of slot 0 first
   ByteSet bytes;
+
+  // True if nothing that this one can meet can be met by the other.
+  bool excludes(const Outlook& other) const {
+    return is_known && other.is_known && !(at_end && other.at_end) &&
+           !bytes.meets(other.bytes);
+  }
 
   std::uint8_t flags() const {
     if (!is_known) return k_look_open;
@@ -230,9 +239,8 @@ class Outlook {
     }
   }
 
-  const bool may_open;
+  bool may_open;
   bool is_ahead_of_choices;
-  bool is_free = false;
   int budget = 64;
 };
 
@@ -284,11 +292,15 @@ class Planner {
     number_steps();
     for (Node node = begin(); node < end(); node = following(node))
       if (step_of(node) != k_skipped && !make_step(node)) return false;
+    for (Node node = begin(); node < end(); node = following(node))
+      if (step_of(node) != k_skipped) node = make_sequence(node);
     finish();
     return true;
   }
 
   const zxQVA<ByteSet>& all_sets() const { return sets; }
+  const zxQVA<zxByteTest>& all_tests() const { return tests; }
+  const zxQVA<zxGroupMark>& all_marks() const { return marks; }
 
  private:
   // ---- nodes
@@ -532,7 +544,20 @@ class Planner {
     if (step.kind == zxStepKind::check_branch) has_empty_passes = true;
     step.next = step_of(arrived(zxnode::operand(node)));
     step.other = other == nullptr ? k_no_step : step_of(other);
-    look_from(zxnode::operand(node), step);
+    const Outlook look = look_from(zxnode::operand(node), step);
+    if (is_only_way(look, other)) step.look_flags |= k_look_only;
+  }
+
+  // True if none of the alternatives from `other` on can go on where the one
+  // with this outlook can.
+  bool is_only_way(const Outlook& look, Node other) const {
+    for (; other != nullptr; other = zxnode::next_alternative(other))
+      if (!look.excludes(last_outlook(zxnode::operand(other)))) return false;
+    return true;
+  }
+
+  Outlook last_outlook(Node node) const {
+    return Outlook(node, Outlook::Purpose::last_try, has_loops);
   }
 
   // Behind a byte of the set no shorter repetition can go on, if none of its
@@ -558,11 +583,118 @@ class Planner {
            zxnode::is(node, zxNodeKind::curlymin);
   }
 
+  // Fills in what a choice can go on with.  Where that tells nothing because
+  // of counts, the set is that of a last try.
   Outlook look_from(Node node, zxStep& step) {
-    const Outlook look(node, Outlook::Purpose::choice, has_loops);
+    Outlook look(node, Outlook::Purpose::choice, has_loops);
     step.look_flags = look.flags();
+    if (!look.is_known) look = last_outlook(node);
+    step.look_flags |= look.flags();
     if (look.is_known) use_set(look.bytes, step.look_table, step.look_mask);
     return look;
+  }
+
+  // ---- sequences
+  //
+  // Nodes that take one byte each, or a few, and groups that open and close
+  // between them become one step, which tests all the bytes and then marks the
+  // groups.  Where a run comes to the middle of it, the steps of the nodes
+  // still stand.  A group that is opened again and again shows by its count
+  // that it was opened in vain, so with loops none opens in a sequence.
+  struct Sequence {
+    int bytes = 0;
+    std::int32_t first_test = 0;
+    std::int32_t first_mark = 0;
+    int nodes = 0;
+    Node last = nullptr;
+  };
+
+  // Makes the longest sequence that begins with the node the node's step; the
+  // last node of it.
+  Node make_sequence(Node node) {
+    Sequence sequence;
+    sequence.first_test = tests.length();
+    sequence.first_mark = marks.length();
+    sequence.last = node;
+    for (Node next = node; add_to(sequence, next);
+         next = arrived(zxnode::next(next)))
+      sequence.last = next;
+    if (sequence.nodes < 2) {
+      while (tests.length() > sequence.first_test) tests.drop_last();
+      while (marks.length() > sequence.first_mark) marks.drop_last();
+      return node;
+    }
+    zxStep& step = steps[step_of(node)];
+    step = zxStep{};
+    step.kind = zxStepKind::sequence;
+    step.number = static_cast<std::uint8_t>(sequence.bytes);
+    step.place = static_cast<std::uint16_t>(sequence.first_test);
+    step.table =
+        static_cast<std::uint16_t>(marks.length() - sequence.first_mark);
+    step.look_table = static_cast<std::uint16_t>(sequence.first_mark);
+    step.next = step_behind(sequence.last);
+    return sequence.last;
+  }
+
+  bool add_to(Sequence& sequence, Node node) {
+    constexpr int k_most_bytes = 255;
+    constexpr int k_longest_literal = 8;
+    const zxStep& step = steps[step_of(node)];
+    switch (step.kind) {
+      case zxStepKind::byte:
+        if (sequence.bytes == k_most_bytes) return false;
+        add_test(sequence, {step.number, 0, 0});
+        break;
+      case zxStepKind::literal:
+        if (step.number > k_longest_literal ||
+            sequence.bytes + step.number > k_most_bytes)
+          return false;
+        for (int i = 0; i < step.number; ++i)
+          add_test(sequence, {regex.program()[step.place + i], 0, 0});
+        break;
+      case zxStepKind::set:
+        if (sequence.bytes == k_most_bytes) return false;
+        add_test(sequence, {step.table, step.mask, 0});
+        break;
+      case zxStepKind::any:
+        if (sequence.bytes == k_most_bytes) return false;
+        add_test(sequence, test_of(k_all_bytes));
+        break;
+      case zxStepKind::repeat:
+      case zxStepKind::repeat_greedy:
+      case zxStepKind::repeat_lazy:
+        if (step.min != step.max || step.min > k_longest_literal ||
+            sequence.bytes + step.min > k_most_bytes)
+          return false;
+        for (int i = 0; i < step.min; ++i)
+          add_test(sequence, {step.table, step.mask, 0});
+        break;
+      case zxStepKind::open:
+        if (has_loops) return false;
+        [[fallthrough]];
+      case zxStepKind::close:
+        if (marks.length() - sequence.first_mark == k_most_bytes) return false;
+        marks.append(
+            {step.number, static_cast<std::uint8_t>(sequence.bytes),
+             static_cast<std::uint8_t>(step.kind == zxStepKind::close ? 1 : 0),
+             0});
+        break;
+      default:
+        return false;
+    }
+    ++sequence.nodes;
+    return true;
+  }
+
+  zxByteTest test_of(const ByteSet& set) {
+    zxByteTest test{};
+    use_set(set, test.table, test.mask);
+    return test;
+  }
+
+  void add_test(Sequence& sequence, const zxByteTest& test) {
+    tests.append(test);
+    ++sequence.bytes;
   }
 
   // ---- sets
@@ -586,6 +718,10 @@ class Planner {
     plan.start_flags = start.flags();
     plan.start_set = set_number(start.bytes);
     plan.set_count = static_cast<std::uint16_t>(sets.length());
+    plan.test_count = static_cast<std::uint16_t>(tests.length());
+    plan.mark_count = static_cast<std::uint16_t>(marks.length());
+    if (regex.reganch != 0 || start.is_free)
+      plan.choice_bits |= k_plan_fresh_tries;
     has_empty_passes |= has_empty_stars();
     if (!has_references && !has_empty_passes)
       plan.choice_bits |= k_plan_remembers;
@@ -598,13 +734,19 @@ class Planner {
     });
   }
 
+  const zxStep* first_after_opening() const {
+    const zxStep* step = steps + plan.first;
+    while (step->kind == zxStepKind::open ||
+           step->kind == zxStepKind::open_plain ||
+           (step->kind == zxStepKind::sequence && step->number == 0))
+      step = steps + step->next;
+    return step;
+  }
+
   // What the first step says about tries from later starts, if it is a
   // repetition without an upper limit.
   std::uint8_t bits_of_first_repeat() const {
-    const zxStep* step = steps + plan.first;
-    while (step->kind == zxStepKind::open ||
-           step->kind == zxStepKind::open_plain)
-      step = steps + step->next;
+    const zxStep* step = first_after_opening();
     if (step->kind < zxStepKind::repeat || step->max != k_no_limit ||
         step->min > 1)
       return 0;
@@ -616,6 +758,8 @@ class Planner {
   zxRegexPlan& plan;
   zxStep* const steps;
   zxQVA<ByteSet> sets;
+  zxQVA<zxByteTest> tests;
+  zxQVA<zxGroupMark> marks;
   bool has_loops = false;
   bool has_references = false;
   bool looks_for_empty_passes = false;
@@ -646,6 +790,13 @@ zxRegex* resize(zxRegex* regex, std::size_t size) {
   return moved;
 }
 
+template <class T>
+void copy_all(const zxQVA<T>& from, const T* to) {
+  if (from.length() > 0)
+    std::memcpy(const_cast<T*>(to), from.begin(),
+                zx_size(from.length()) * sizeof(T));
+}
+
 void write_sets(zxRegexPlan& plan, const zxQVA<ByteSet>& sets) {
   auto* ranges = const_cast<zxByteRanges*>(plan.sets());
   auto* tables = const_cast<std::uint8_t*>(plan.tables());
@@ -674,12 +825,17 @@ zxRegex* regex_plan(zxRegex* regex, int node_count) {
   if (!planner.make()) return regex;
   const std::size_t sets_end = sizeof(zxRegexPlan) +
                                plan->step_count * sizeof(zxStep) +
-                               plan->set_count * sizeof(zxByteRanges);
+                               plan->set_count * sizeof(zxByteRanges) +
+                               plan->test_count * sizeof(zxByteTest) +
+                               plan->mark_count * sizeof(zxGroupMark);
   plan->tables_place = static_cast<std::uint32_t>(sets_end);
   const std::size_t size =
       plan_place + sets_end + (plan->set_count + 7U) / 8 * 256;
   regex = resize(regex, size);
-  if (regex != nullptr)
-    write_sets(*const_cast<zxRegexPlan*>(regex->plan()), planner.all_sets());
+  if (regex == nullptr) return nullptr;
+  plan = const_cast<zxRegexPlan*>(regex->plan());
+  copy_all(planner.all_tests(), plan->tests());
+  copy_all(planner.all_marks(), plan->marks());
+  write_sets(*plan, planner.all_sets());
   return regex;
 }

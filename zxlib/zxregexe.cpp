@@ -32,7 +32,7 @@ int touched_fields = 0;
 // All slots one by one, which takes a dozen instructions; a loop would become
 // a call.
 template <std::size_t... n>
-void clear_slots(std::index_sequence<n...>) {
+[[gnu::always_inline]] inline void clear_slots(std::index_sequence<n...>) {
   ((zx_match.start[n] = nullptr), ...);
   ((zx_match.end[n] = nullptr), ...);
 }
@@ -261,17 +261,23 @@ class Run {
         plan(*regex.plan()),
         steps(plan.steps()),
         tables(plan.tables()),
+        tests(plan.tests()),
+        marks(plan.marks()),
         start(its_start),
         end(its_end),
-        previous(its_previous) {}
+        previous(its_previous),
+        has_fresh_tries((plan.choice_bits & k_plan_fresh_tries) != 0) {}
   explicit Run(const Run<false>& other) requires remembers
       : program(other.program),
         plan(other.plan),
         steps(other.steps),
         tables(other.tables),
+        tests(other.tests),
+        marks(other.marks),
         start(other.start),
         end(other.end),
-        previous(other.previous) {}
+        previous(other.previous),
+        has_fresh_tries(other.has_fresh_tries) {}
 
   // Tries a match at one place.
   Outcome from(const char* at) {
@@ -310,6 +316,9 @@ class Run {
         case zxStepKind::succeed:
           zx_match.end[0] = s.at;
           return true;
+        case zxStepKind::sequence:
+          if (!is_sequence(s, step)) return false;
+          break;
         case zxStepKind::byte:
           if (!is_byte(s, step.number)) return false;
           break;
@@ -340,10 +349,10 @@ class Run {
           s.current = 0;
           break;
         case zxStepKind::open:
-          if (!open_group(s, step.number)) return false;
+          if (!open_group(s, step.number, s.at)) return false;
           break;
         case zxStepKind::close:
-          if (!close_group(s, step.number)) return false;
+          if (!close_group(s, step.number, s.at)) return false;
           break;
         case zxStepKind::check_branch:
           if (is_empty_pass(s, step.other)) return false;
@@ -470,6 +479,31 @@ class Run {
     return true;
   }
 
+  // All the bytes are tested ahead of the first change.
+  ZX_INLINE bool is_sequence(State& s, const zxStep& step) {
+    const std::size_t length = step.number;
+    if (static_cast<std::size_t>(end - s.at) < length) return false;
+    const zxByteTest* test = tests + step.place;
+    for (const char *at = s.at, *last = at + length; at != last; ++at, ++test)
+      if (!fits(*test, static_cast<unsigned char>(*at))) return false;
+    const zxGroupMark* mark = marks + step.look_table;
+    for (const zxGroupMark* last = mark + step.table; mark != last; ++mark)
+      if (!mark_group(s, *mark)) return false;
+    s.at += length;
+    return true;
+  }
+
+  ZX_INLINE bool fits(const zxByteTest& test, unsigned byte) const {
+    return test.mask == 0 ? test.table == byte
+                          : (tables[test.table * 256U + byte] & test.mask) != 0;
+  }
+
+  ZX_INLINE bool mark_group(State& s, const zxGroupMark& mark) {
+    const char* const at = s.at + mark.offset;
+    return mark.closes != 0 ? close_group(s, mark.group, at)
+                            : open_group(s, mark.group, at);
+  }
+
   bool is_word_edge(const char* at) const {
     const bool ahead =
         at == start ? previous != k_at_start &&
@@ -480,23 +514,25 @@ class Run {
 
   // True if the run can go on at that place, as far as its byte tells.
   ZX_INLINE bool can_go_on(const zxStep& step, const char* at) const {
-    if ((step.look_flags & k_look_open) != 0) return true;
+    return (step.look_flags & k_look_open) != 0 || meets(step, at);
+  }
+  ZX_INLINE bool meets(const zxStep& step, const char* at) const {
     return at == end ? (step.look_flags & k_look_end) != 0
                      : has(at, step.look_table, step.look_mask);
   }
 
   // ---- groups and fields
-  ZX_INLINE bool open_group(State& s, unsigned n) {
+  ZX_INLINE bool open_group(State& s, unsigned n, const char* at) {
     if (!keep(s, FrameKind::group_start, 0, n, zx_match.start[n])) return false;
-    zx_match.start[n] = s.at;
+    zx_match.start[n] = at;
     s.current = n;
     set_count(n, 0);
     return true;
   }
 
-  ZX_INLINE bool close_group(State& s, unsigned n) {
+  ZX_INLINE bool close_group(State& s, unsigned n, const char* at) {
     if (!keep(s, FrameKind::group_end, 0, n, zx_match.end[n])) return false;
-    zx_match.end[n] = s.at;
+    zx_match.end[n] = at;
     return true;
   }
 
@@ -555,6 +591,7 @@ class Run {
     const zxStep* branch = &first;
     while (branch->other != k_no_step) {
       if (can_go_on(*branch, s.at)) {
+        if (is_last_try(s, *branch) && meets(*branch, s.at)) break;
         if (!push(s,
                   {FrameKind::alternative, static_cast<std::uint8_t>(s.current),
                    branch->other, 0, s.at}))
@@ -566,6 +603,14 @@ class Run {
     }
     s.step = steps + branch->next;
     return true;
+  }
+
+  // True if, once what is behind a choice has failed, the try has failed: the
+  // other ways can't go on here, nothing is left to go back to, and nobody
+  // will see the counts that they would have left.
+  ZX_INLINE bool is_last_try(const State& s, const zxStep& step) const {
+    return (step.look_flags & k_look_only) != 0 && s.top == stack.bottom &&
+           has_fresh_tries;
   }
 
   // The count goes up from what the failed try has left.
@@ -645,7 +690,7 @@ class Run {
       if (place == nullptr) return false;
       count = static_cast<std::size_t>(place - base);
     }
-    if (count > min &&
+    if (count > min && !is_last_try(s, step) &&
         !push(s, frame_of(s, FrameKind::greedy, step, count - 1, base)))
       return false;
     s.at = base + count;
@@ -739,9 +784,12 @@ class Run {
   const zxRegexPlan& plan;
   const zxStep* const steps;
   const std::uint8_t* const tables;
+  const zxByteTest* const tests;
+  const zxGroupMark* const marks;
   const char* const start;
   const char* const end;
   const int previous;
+  const bool has_fresh_tries;
 };
 
 #undef ZX_INLINE
@@ -760,6 +808,7 @@ class Search {
   Search(const zxRegex& regex, const char* its_start, const char* its_end,
          int previous)
       : plan(*regex.plan()),
+        start_byte(regex.regstart),
         start(its_start),
         end(its_end),
         run(regex, its_start, its_end, previous) {
@@ -791,9 +840,17 @@ class Search {
   // The first place from `at` on where a match can begin; null if none.
   const char* next_start(const char* at) const {
     if ((plan.start_flags & k_look_open) != 0) return at;
-    const char* place = find_in(plan, plan.start_set, at, end);
+    const char* place = find_start(at);
     const bool ok = place != end || (plan.start_flags & k_look_end) != 0;
     return ok ? place : nullptr;
+  }
+
+  const char* find_start(const char* at) const {
+    if (start_byte == k_regex_no_start)
+      return find_in(plan, plan.start_set, at, end);
+    const void* place =
+        std::memchr(at, start_byte, static_cast<std::size_t>(end - at));
+    return place == nullptr ? end : static_cast<const char*>(place);
   }
 
   // A match that begins with a repetition has failed: it fails wherever the
@@ -819,9 +876,13 @@ class Search {
   }
 
   Outcome outcome_at(const char* at) {
-    if (memory.is_open()) return Run<true>(run).from(at);
+    if (memory.is_open()) return try_remembering(at);
     const Outcome outcome = run.from(at);
     return outcome == Outcome::too_often ? go_on_remembering() : outcome;
+  }
+
+  [[gnu::noinline]] Outcome try_remembering(const char* at) const {
+    return Run<true>(run).from(at);
   }
 
   // The run goes on and remembers its failures, if there is room for them.
@@ -833,22 +894,11 @@ class Search {
   }
 
   const zxRegexPlan& plan;
+  const std::uint8_t start_byte;
   const char* const start;
   const char* const end;
   Run<false> run;
 };
-
-const char* find_literal(const char* at, const char* end, const char* literal,
-                         std::size_t length) {
-  while (static_cast<std::size_t>(end - at) >= length) {
-    const std::size_t last = static_cast<std::size_t>(end - at) - length;
-    at = static_cast<const char*>(std::memchr(at, *literal, last + 1));
-    if (at == nullptr) return nullptr;
-    if (std::memcmp(at, literal, length) == 0) return at;
-    ++at;
-  }
-  return nullptr;
-}
 
 }  // namespace
 
@@ -864,12 +914,16 @@ bool can_run(const zxRegex* regex, const char* subject, const char* end) {
   return ZX_ASSERT(end >= subject && end - subject < 0x7FFFFFFF);
 }
 
-bool is_rejected(const zxRegex& regex, const char* start, const char* end) {
-  if (regex.reganch == 2 &&
-      (start == end || static_cast<std::uint8_t>(*start) != regex.regstart))
-    return true;
-  return regex.regmust != nullptr &&
-         find_literal(start, end, regex.regmust, regex.regmlen) == nullptr;
+bool is_missing(const char* literal, std::size_t length, const char* start,
+                const char* end) {
+  while (static_cast<std::size_t>(end - start) >= length) {
+    const std::size_t last = static_cast<std::size_t>(end - start) - length;
+    start = static_cast<const char*>(std::memchr(start, *literal, last + 1));
+    if (start == nullptr) return true;
+    if (std::memcmp(start, literal, length) == 0) return false;
+    ++start;
+  }
+  return true;
 }
 
 bool search(const zxRegex& regex, const char* start, const char* end,

@@ -17,8 +17,19 @@ inline constexpr int k_at_start = -1;
 // False, as a failure, if a run can't be made; true if it can.
 bool can_run(const zxRegex* regex, const char* subject, const char* end);
 
+// True if the literal stands nowhere in the subject.
+bool is_missing(const char* literal, std::size_t length, const char* start,
+                const char* end);
+
 // True if the subject lacks what the header says that any match must have.
-bool is_rejected(const zxRegex& regex, const char* start, const char* end);
+inline bool is_rejected(const zxRegex& regex, const char* start,
+                        const char* end) {
+  if (regex.reganch == 2 &&
+      (start == end || static_cast<std::uint8_t>(*start) != regex.regstart))
+    return true;
+  return regex.regmust != nullptr &&
+         is_missing(regex.regmust, regex.regmlen, start, end);
+}
 
 // Clears the record and searches.  `previous` is the byte ahead of the
 // subject, or k_at_start.

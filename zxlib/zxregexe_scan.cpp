@@ -14,16 +14,15 @@ namespace {
 
 constexpr std::ptrdiff_t k_block = 16;
 
-// The ranges of a set, spread over registers.  A range that is not there
-// repeats the first one.
+// The ranges of a set, spread over registers.
+template <int count>
 class RangeTest {
  public:
   explicit RangeTest(const zxByteRanges& ranges)
       : flip(ranges.complement != 0 ? k_all : 0U) {
-    for (int i = 0; i < zxByteRanges::k_most; ++i) {
-      const int from = i < ranges.count ? i : 0;
-      low[i] = _mm_set1_epi8(static_cast<char>(ranges.low[from]));
-      span[i] = _mm_set1_epi8(static_cast<char>(ranges.span[from]));
+    for (int i = 0; i < count; ++i) {
+      low[i] = _mm_set1_epi8(static_cast<char>(ranges.low[i]));
+      span[i] = _mm_set1_epi8(static_cast<char>(ranges.span[i]));
     }
   }
 
@@ -31,8 +30,7 @@ class RangeTest {
   unsigned operator()(const char* at) const {
     const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(at));
     __m128i hits = within(bytes, 0);
-    hits = _mm_or_si128(hits, within(bytes, 1));
-    hits = _mm_or_si128(hits, within(bytes, 2));
+    for (int i = 1; i < count; ++i) hits = _mm_or_si128(hits, within(bytes, i));
     return static_cast<unsigned>(_mm_movemask_epi8(hits)) ^ flip;
   }
 
@@ -45,8 +43,8 @@ class RangeTest {
     return _mm_cmpeq_epi8(_mm_min_epu8(distance, span[i]), distance);
   }
 
-  __m128i low[zxByteRanges::k_most];
-  __m128i span[zxByteRanges::k_most];
+  __m128i low[count];
+  __m128i span[count];
   unsigned flip;
 };
 
@@ -62,9 +60,6 @@ class ByteScan {
     return (table[static_cast<unsigned char>(byte)] & mask) != 0;
   }
   const zxByteRanges& ranges() const { return its_ranges; }
-  bool has_ranges() const {
-    return its_ranges.count != k_many_ranges && its_ranges.count != 0;
-  }
 
  private:
   const std::uint8_t* table;
@@ -72,21 +67,51 @@ class ByteScan {
   const zxByteRanges& its_ranges;
 };
 
+// The first of the blocks of 16 from `at` to `end` in which a byte has the
+// membership that is `wanted`: that byte; else where the last block ends.
+template <bool wanted, int count>
+const char* find_in_blocks(const zxByteRanges& ranges, const char* at,
+                           const char* end) {
+  const RangeTest<count> test(ranges);
+  for (; end - at >= k_block; at += k_block) {
+    const unsigned hits = wanted ? test(at) : test(at) ^ 0xFFFF;
+    if (hits != 0) return at + std::countr_zero(hits);
+  }
+  return at;
+}
+
+template <bool wanted>
+const char* find_in_blocks(const zxByteRanges& ranges, const char* at,
+                           const char* end) {
+  switch (ranges.count) {
+    case 1:
+      return find_in_blocks<wanted, 1>(ranges, at, end);
+    case 2:
+      return find_in_blocks<wanted, 2>(ranges, at, end);
+    case 3:
+      return find_in_blocks<wanted, 3>(ranges, at, end);
+    default:
+      return at;
+  }
+}
+
 // The first byte whose membership is `wanted`.
 template <bool wanted>
 const char* find(const ByteScan& set, const char* at, const char* end) {
-  const char* const first_end = end - at > k_block ? at + k_block : end;
-  for (; at < first_end; ++at)
-    if (set.has(*at) == wanted) return at;
-  if (set.has_ranges() && end - at >= k_block) {
-    const RangeTest test(set.ranges());
-    for (; end - at >= k_block; at += k_block) {
-      const unsigned hits = wanted ? test(at) : test(at) ^ 0xFFFF;
-      if (hits != 0) return at + std::countr_zero(hits);
-    }
+  at = find_in_blocks<wanted>(set.ranges(), at, end);
+  while (at < end && set.has(*at) != wanted) ++at;
+  return at;
+}
+
+// The same from the end: the byte, or where the first block begins.
+template <int count>
+const char* find_last_in_blocks(const zxByteRanges& ranges, const char* at,
+                                const char* end) {
+  const RangeTest<count> test(ranges);
+  for (; end - at >= k_block; end -= k_block) {
+    const unsigned hits = test(end - k_block);
+    if (hits != 0) return end - k_block + std::bit_width(hits);
   }
-  for (; at < end; ++at)
-    if (set.has(*at) == wanted) return at;
   return end;
 }
 
@@ -105,16 +130,13 @@ const char* find_not_in(const zxRegexPlan& plan, unsigned set, const char* at,
 const char* find_last_in(const zxRegexPlan& plan, unsigned number,
                          const char* at, const char* end) {
   const ByteScan set(plan, number);
-  const char* const first_begin = end - at > k_block ? end - k_block : at;
-  while (end > first_begin)
-    if (set.has(*--end)) return end;
-  if (set.has_ranges() && end - at >= k_block) {
-    const RangeTest test(set.ranges());
-    for (; end - at >= k_block; end -= k_block) {
-      const unsigned hits = test(end - k_block);
-      if (hits != 0) return end - k_block + std::bit_width(hits) - 1;
-    }
-  }
+  const zxByteRanges& ranges = set.ranges();
+  if (ranges.count == 1)
+    end = find_last_in_blocks<1>(ranges, at, end);
+  else if (ranges.count == 2)
+    end = find_last_in_blocks<2>(ranges, at, end);
+  else if (ranges.count == 3)
+    end = find_last_in_blocks<3>(ranges, at, end);
   while (end > at)
     if (set.has(*--end)) return end;
   return nullptr;

@@ -9,31 +9,49 @@
 
 namespace {
 
-// Text that is built from many pieces: room at least doubles.
+// Text that is built from many pieces in a block whose size at least doubles.
+// It is of no use once a piece has found no room: a string has a limit, which
+// is an assertion.
 class Builder {
  public:
+  Builder() = default;
+  ~Builder() { zx_realloc(block, 0); }
+  Builder(const Builder&) = delete;
+  Builder& operator=(const Builder&) = delete;
+
   void append(const char* bytes, std::size_t size) {
-    const std::int32_t length = zx_count(size);
-    make_room(length);
-    text.append(bytes, length);
+    if (size > room - used && !make_room(size)) {
+      is_whole = false;
+      return;
+    }
+    if (size != 0) std::memcpy(block + used, bytes, size);
+    used += size;
   }
-  void append(std::string_view bytes) { append(bytes.data(), bytes.size()); }
   void append(char byte) { append(&byte, 1); }
 
-  std::int32_t length() const { return text.length(); }
-  void cut(std::int32_t length) { text.set_length(length); }
-  const zxStr& result() const { return text; }
+  const char* begin() const { return block; }
+  std::size_t length() const { return used; }
+  void cut(std::size_t length) { used = length; }
+  bool is_usable() const { return is_whole; }
 
  private:
-  void make_room(std::int32_t more) {
-    constexpr std::int64_t k_most = 0x7FFFFFFF;
-    const std::int64_t wanted = std::int64_t{text.length()} + more;
-    if (wanted <= text.capacity() || wanted > k_most) return;
-    text.reserve(static_cast<std::int32_t>(
-        std::min(k_most, std::max(wanted, 2 * zx_wide(text.capacity())))));
+  bool make_room(std::size_t more) {
+    constexpr std::size_t k_most = 0x7FFFFFFF;
+    constexpr std::size_t k_least = 256;
+    if (!ZX_ASSERT(more <= k_most - used)) return false;
+    const std::size_t wanted =
+        std::max({k_least, used + more, std::min(k_most, 2 * room)});
+    void* bigger = zx_realloc(block, wanted);
+    if (bigger == nullptr) return false;
+    block = static_cast<char*>(bigger);
+    room = wanted;
+    return true;
   }
 
-  zxStr text;
+  char* block = nullptr;
+  std::size_t used = 0;
+  std::size_t room = 0;
+  bool is_whole = true;
 };
 
 // ------------------------------------------------------------ replacement --
@@ -51,14 +69,14 @@ class Replacement {
   // Adds what stands for the present match.
   void expand(Builder& out) const {
     if (is_plain)
-      out.append({text, static_cast<std::size_t>(end - text)});
+      out.append(text, static_cast<std::size_t>(end - text));
     else
       expand_in_general(out);
   }
 
  private:
   void expand_in_general(Builder& out) const {
-    const std::int32_t start = out.length();
+    const std::size_t start = out.length();
     std::int32_t choice = zx_match.alternative[0];
     const bool has_choice = choice > 0;
     for (const char* at = text; at < end;) {
@@ -92,8 +110,7 @@ class Replacement {
   }
 
   static void append_group(Builder& out, int n) {
-    const char* start = zx_match.start[n];
-    if (group_length(n) > 0) out.append({start, zx_size(group_length(n))});
+    out.append(zx_match.start[n], zx_size(group_length(n)));
   }
 
   static char control_byte(char letter) {
@@ -142,15 +159,21 @@ class Replacing {
       at = zx_match.end[0];
     } while (finds_next());
     copy_to(end);
-    subject.build(start, zx_count(static_cast<std::size_t>(first - start)),
-                  out.result().c_str(), out.result().length());
-    return done;
+    return put(subject, static_cast<std::size_t>(first - start)) ? done : 0;
   }
 
  private:
+  // The subject up to its first match, and the result behind that.
+  bool put(zxStr& subject, std::size_t kept) {
+    if (!out.is_usable() || !ZX_ASSERT(out.length() <= 0x7FFFFFFF - kept))
+      return false;
+    subject.build(start, zx_count(kept), out.begin(), zx_count(out.length()));
+    return true;
+  }
+
   // Copies what stands between the present place and the given one.
   void copy_to(const char* place) {
-    out.append({at, static_cast<std::size_t>(place - at)});
+    out.append(at, static_cast<std::size_t>(place - at));
     at = place;
   }
 
