@@ -90,33 +90,43 @@ struct Free {
 };
 using Program = std::unique_ptr<zxRegex, Free>;
 
-// The names of the nodes, from lines such as "4 STAR -> 9".
+// The nodes of a program, as "STAR -> 9" of the line "4 STAR -> 9".
 std::vector<std::string_view> nodes_in(std::string_view dump) {
-  std::vector<std::string_view> names;
+  std::vector<std::string_view> nodes;
   while (!dump.empty()) {
     const std::string_view line = dump.substr(0, dump.find('\n'));
     dump.remove_prefix(std::min(dump.size(), line.size() + 1));
     const std::size_t place = line.find_first_not_of("0123456789");
-    if (place == 0 || place == line.npos) continue;
-    const std::string_view rest = line.substr(place + 1);
-    names.push_back(rest.substr(0, rest.find(' ')));
+    if (place != 0 && place != line.npos)
+      nodes.push_back(line.substr(place + 1));
   }
-  return names;
+  return nodes;
 }
 
-// A pattern that refers back to groups tries all ways there are.  The longest
-// subject for which these are not too many.
+bool any_begins_with(const std::vector<std::string_view>& nodes,
+                     std::string_view text) {
+  return std::any_of(nodes.begin(), nodes.end(), [=](std::string_view node) {
+    return node.starts_with(text);
+  });
+}
+
+// Patterns that refer back to groups, or repeat groups that may be empty, try
+// all ways there are.  The longest subject for which these are not too many.
 std::size_t longest_subject(std::string_view dump) {
-  constexpr std::array<std::string_view, 7> k_choices = {
-      "BRANCH", "STAR", "PLUS", "CURLY", "STARMIN", "PLUSMIN", "CURLYMIN"};
-  bool refers_back = false;
-  int choices = 0;
-  for (const std::string_view name : nodes_in(dump)) {
-    refers_back |= name == "BACKREF";
-    choices +=
-        std::find(k_choices.begin(), k_choices.end(), name) != k_choices.end();
-  }
-  if (!refers_back) return k_longest_subject;
+  constexpr std::array<std::string_view, 4> k_choices = {"BRANCH", "STAR",
+                                                         "PLUS", "CURLY"};
+  const std::vector<std::string_view> nodes = nodes_in(dump);
+  const bool has_empty_passes =
+      any_begins_with(nodes, "BACK ") && (any_begins_with(nodes, "CURLY 0") ||
+                                          any_begins_with(nodes, "CURLYMIN 0"));
+  if (!has_empty_passes && !any_begins_with(nodes, "BACKREF"))
+    return k_longest_subject;
+  const auto choices =
+      std::count_if(nodes.begin(), nodes.end(), [&](std::string_view node) {
+        return std::any_of(
+            k_choices.begin(), k_choices.end(),
+            [=](std::string_view name) { return node.starts_with(name); });
+      });
   return choices <= 2 ? 40 : choices <= 4 ? 16 : choices <= 12 ? 6 : 3;
 }
 

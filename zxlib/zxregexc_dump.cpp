@@ -1,4 +1,4 @@
-// Looking at programs: the sizes of nodes, the dumper, the checker.
+// Looking at programs: the dumper, the checker.
 
 #include <algorithm>
 
@@ -6,42 +6,6 @@
 #include "zxregexc_impl.h"
 
 using zxnode::Node;
-
-// ----------------------------------------------------------------- nodes --
-
-int zxnode::size_of(Node node) {
-  switch (info(node).operand) {
-    case zxOperand::bitmap:
-      return k_node_head + k_bitmap_bytes;
-    case zxOperand::literal:
-      return k_node_head + 1 + *operand(node) + 1;
-    case zxOperand::group:
-      return k_node_head + 2;
-    case zxOperand::counts:
-      return k_node_head + k_counts_bytes;
-    case zxOperand::field:
-      return k_node_head + k_field_bytes;
-    case zxOperand::none:
-    case zxOperand::branch:
-    case zxOperand::simple:
-      break;
-  }
-  return k_node_head;
-}
-
-Node zxnode::repeated(Node node) { return node + size_of(node); }
-
-int zxnode::minimum(Node node) {
-  if (info(node).operand == zxOperand::counts)
-    return static_cast<int>(big16(operand(node)));
-  return is(node, zxNodeKind::plus) || is(node, zxNodeKind::plusmin) ? 1 : 0;
-}
-
-int zxnode::maximum(Node node) {
-  if (info(node).operand == zxOperand::counts)
-    return static_cast<int>(big16(operand(node) + 2));
-  return k_no_limit;
-}
 
 namespace {
 

@@ -108,6 +108,36 @@ inline constexpr int k_field_bytes = 5;
 inline constexpr int k_max_literal = 127;
 inline constexpr int k_max_field_width = 127;
 
+namespace zxregexc_detail {
+constexpr int operand_size(zxOperand operand) {
+  switch (operand) {
+    case zxOperand::bitmap:
+      return k_bitmap_bytes;
+    case zxOperand::literal:
+      return 2;  // and the bytes
+    case zxOperand::group:
+      return 2;
+    case zxOperand::counts:
+      return k_counts_bytes;
+    case zxOperand::field:
+      return k_field_bytes;
+    default:
+      return 0;
+  }
+}
+consteval std::array<std::uint8_t, 256> make_node_sizes() {
+  std::array<std::uint8_t, 256> sizes{};
+  for (std::size_t i = 0; i < sizes.size(); ++i)
+    sizes[i] = static_cast<std::uint8_t>(k_node_head +
+                                         operand_size(k_node_infos[i].operand));
+  return sizes;
+}
+}  // namespace zxregexc_detail
+
+// The sizes of nodes by opcode, those of EXACTLY without its bytes.
+inline constexpr std::array<std::uint8_t, 256> k_node_sizes =
+    zxregexc_detail::make_node_sizes();
+
 // The flags of fields, as they stand in the node.
 inline constexpr unsigned k_field_zero = 1;     // no blanks ahead
 inline constexpr unsigned k_field_star = 2;     // no meaning
@@ -152,12 +182,25 @@ inline Node next_alternative(Node branch) {
 }
 
 // The bytes of a node's own, without the nodes that are its operand.
-int size_of(Node node);
+inline int size_of(Node node) {
+  const int size = k_node_sizes[*node];
+  return is(node, zxNodeKind::exactly) ? size + *operand(node) : size;
+}
 
-// The simple node that a repetition repeats, and its limits.
-Node repeated(Node node);
-int minimum(Node node);
-int maximum(Node node);
+// The simple node that a repetition repeats, and its limits;
+// k_no_maximum stands for none.
+inline constexpr int k_no_maximum = 0xFFFF;
+inline Node repeated(Node node) { return node + size_of(node); }
+inline int minimum(Node node) {
+  if (info(node).operand == zxOperand::counts)
+    return static_cast<int>(big16(operand(node)));
+  return is(node, zxNodeKind::plus) || is(node, zxNodeKind::plusmin) ? 1 : 0;
+}
+inline int maximum(Node node) {
+  return info(node).operand == zxOperand::counts
+             ? static_cast<int>(big16(operand(node) + 2))
+             : k_no_maximum;
+}
 }  // namespace zxnode
 
 // ------------------------------------------------------------------ plan --
@@ -198,7 +241,7 @@ enum class zxStepKind : std::uint8_t {
 };
 
 inline constexpr std::uint16_t k_no_step = 0xFFFF;
-inline constexpr std::uint16_t k_no_limit = 0xFFFF;
+inline constexpr std::uint16_t k_no_limit = zxnode::k_no_maximum;
 
 // Where a choice goes on, the byte there must be in `look`, or be the end if
 // this is k_look_end; k_look_open: it may be anything.

@@ -34,7 +34,12 @@ struct ByteSet {
       if ((bits[i] & other.bits[i]) != 0) return true;
     return false;
   }
-  bool operator==(const ByteSet&) const = default;
+  bool operator==(const ByteSet& other) const {
+    std::uint64_t different = 0;
+    for (std::size_t i = 0; i < bits.size(); ++i)
+      different |= bits[i] ^ other.bits[i];
+    return different == 0;
+  }
 };
 
 constexpr ByteSet complement(const ByteSet& set) {
@@ -68,14 +73,14 @@ constexpr auto k_class_sets = [] {
 
 constexpr ByteSet k_all_bytes = complement(ByteSet{});
 
+// The bitmap of the node holds the bytes that don't match.
 ByteSet anyof_set(Node node) {
   ByteSet set;
-  const Node bitmap = zxnode::operand(node);
-  for (unsigned i = 0; i < k_bitmap_bytes; ++i)
-    set.bits[i / 8] |= std::uint64_t{static_cast<std::uint8_t>(~bitmap[i])}
-                       << (i % 8 * 8);
-  return set;
+  static_assert(sizeof set.bits == k_bitmap_bytes);
+  std::memcpy(set.bits.data(), zxnode::operand(node), k_bitmap_bytes);
+  return complement(set);
 }
+static_assert(std::endian::native == std::endian::little);
 
 // The bytes that a node which takes at least one can begin with.
 ByteSet first_set(Node node) {
@@ -88,17 +93,28 @@ ByteSet first_set(Node node) {
   return set;
 }
 
+// The first byte from `from` on that is (not) in the set; 256 if there is
+// none.
+template <bool wanted>
+unsigned find(const ByteSet& set, unsigned from) {
+  for (unsigned word = from / 64; word < set.bits.size(); ++word) {
+    std::uint64_t bits = wanted ? set.bits[word] : ~set.bits[word];
+    if (word == from / 64) bits &= ~0ULL << (from % 64);
+    if (bits != 0)
+      return word * 64 + static_cast<unsigned>(std::countr_zero(bits));
+  }
+  return 256;
+}
+
 // The set as ranges, if there are few of them.
 bool find_ranges(const ByteSet& set, zxByteRanges& ranges) {
   ranges.count = 0;
-  for (unsigned c = 0; c < 256; ++c) {
-    if (!set.has(c)) continue;
-    unsigned last = c;
-    while (last < 255 && set.has(last + 1)) ++last;
+  for (unsigned first = find<true>(set, 0); first < 256;) {
+    const unsigned behind = find<false>(set, first);
     if (ranges.count == zxByteRanges::k_most) return false;
-    ranges.low[ranges.count] = static_cast<std::uint8_t>(c);
-    ranges.span[ranges.count++] = static_cast<std::uint8_t>(last - c);
-    c = last;
+    ranges.low[ranges.count] = static_cast<std::uint8_t>(first);
+    ranges.span[ranges.count++] = static_cast<std::uint8_t>(behind - first - 1);
+    first = behind < 256 ? find<true>(set, behind) : 256;
   }
   return true;
 }
@@ -128,7 +144,12 @@ void fill_table(std::uint8_t* table, const ByteSet& set, std::uint8_t mask) {
     std::memcpy(table + 8 * i, &cell, sizeof cell);
   }
 }
-static_assert(std::endian::native == std::endian::little);
+
+void fill_table(std::uint8_t* table, const zxByteRanges& ranges,
+                std::uint8_t mask) {
+  for (int i = 0; i < ranges.count; ++i)
+    for (int n = 0; n <= ranges.span[i]; ++n) table[ranges.low[i] + n] |= mask;
+}
 
 // ------------------------------------------------- what a choice goes on with
 
@@ -154,12 +175,6 @@ class Outlook {
   bool at_end = false;   // the end of the subject can be met
   bool is_free = false;  // each try writes the count of slot 0 first
   ByteSet bytes;
-
-  // True if nothing that this one can meet can be met by the other.
-  bool excludes(const Outlook& other) const {
-    return is_known && other.is_known && !(at_end && other.at_end) &&
-           !bytes.meets(other.bytes);
-  }
 
   std::uint8_t flags() const {
     if (!is_known) return k_look_open;
@@ -290,6 +305,7 @@ class Planner {
 
   bool make() {
     number_steps();
+    std::fill_n(steps, plan.step_count, zxStep{});
     for (Node node = begin(); node < end(); node = following(node))
       if (step_of(node) != k_skipped && !make_step(node)) return false;
     for (Node node = begin(); node < end(); node = following(node))
@@ -451,9 +467,8 @@ class Planner {
   // ---- filling steps
   bool make_step(Node node) {
     zxStep& step = steps[step_of(node)];
-    step = zxStep{};
     if (zxnode::is(node, zxNodeKind::branch)) {
-      make_branch(step, node);
+      if (!is_branch(step)) make_choice(node);
       return true;
     }
     step.next =
@@ -537,6 +552,33 @@ class Planner {
     plan.groups = std::max(plan.groups, group);
   }
 
+  static bool is_branch(const zxStep& step) {
+    return step.kind == zxStepKind::branch ||
+           step.kind == zxStepKind::check_branch;
+  }
+
+  // The steps of all alternatives that begin with this one.
+  void make_choice(Node first) {
+    zxQVA<Node> branches;
+    for (Node node = first; node != nullptr;
+         node = zxnode::next_alternative(node))
+      branches.append(node);
+    ByteSet later;
+    bool later_at_end = false;
+    bool later_known = true;
+    for (std::int32_t i = branches.length(); i-- > 0;) {
+      zxStep& step = steps[step_of(branches.get(i))];
+      make_branch(step, branches.get(i));
+      const Outlook look = look_from(zxnode::operand(branches.get(i)), step);
+      if (look.is_known && later_known && !(look.at_end && later_at_end) &&
+          !look.bytes.meets(later))
+        step.look_flags |= k_look_only;
+      later.add(look.bytes);
+      later_at_end |= look.at_end;
+      later_known &= look.is_known;
+    }
+  }
+
   void make_branch(zxStep& step, Node node) {
     const Node other = zxnode::next_alternative(node);
     step.kind =
@@ -544,16 +586,6 @@ class Planner {
     if (step.kind == zxStepKind::check_branch) has_empty_passes = true;
     step.next = step_of(arrived(zxnode::operand(node)));
     step.other = other == nullptr ? k_no_step : step_of(other);
-    const Outlook look = look_from(zxnode::operand(node), step);
-    if (is_only_way(look, other)) step.look_flags |= k_look_only;
-  }
-
-  // True if none of the alternatives from `other` on can go on where the one
-  // with this outlook can.
-  bool is_only_way(const Outlook& look, Node other) const {
-    for (; other != nullptr; other = zxnode::next_alternative(other))
-      if (!look.excludes(last_outlook(zxnode::operand(other)))) return false;
-    return true;
   }
 
   Outlook last_outlook(Node node) const {
@@ -802,9 +834,13 @@ void write_sets(zxRegexPlan& plan, const zxQVA<ByteSet>& sets) {
   auto* tables = const_cast<std::uint8_t*>(plan.tables());
   std::memset(tables, 0, zx_size(sets.length() + 7) / 8 * 256);
   for (std::int32_t i = 0; i < sets.length(); ++i) {
+    std::uint8_t* table = tables + i / 8 * 256;
+    const auto mask = static_cast<std::uint8_t>(1U << (i % 8));
     ranges[i] = ranges_of(sets.get(i));
-    fill_table(tables + i / 8 * 256, sets.get(i),
-               static_cast<std::uint8_t>(1U << (i % 8)));
+    if (ranges[i].complement == 0 && ranges[i].count != k_many_ranges)
+      fill_table(table, ranges[i], mask);
+    else
+      fill_table(table, sets.get(i), mask);
   }
 }
 

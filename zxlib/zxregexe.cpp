@@ -36,7 +36,7 @@ template <std::size_t... n>
   ((zx_match.start[n] = nullptr), ...);
   ((zx_match.end[n] = nullptr), ...);
 }
-void clear_slots() {
+[[gnu::always_inline]] inline void clear_slots() {
   clear_slots(std::make_index_sequence<zxMatch::k_slots>());
 }
 
