@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <initializer_list>
 #include <memory>
 #include <optional>
 #include <string>
@@ -282,6 +283,42 @@ TEST(zxregexe_model, the_model_gives_what_is_worked_out_by_hand) {
     EXPECT_EQ(shown(*outcome), row.expected)
         << row.pattern << " on " << row.subject;
   }
+}
+
+// ---- chosen pairs
+
+struct Pair {
+  std::string_view pattern;
+  std::string_view subject;
+};
+
+void compare_pairs(std::initializer_list<Pair> pairs) {
+  for (const Pair& pair : pairs) {
+    const std::string pattern(pair.pattern);
+    const Subject subject{std::string(pair.subject)};
+    EXPECT_TRUE(is_valid(pattern)) << pattern;
+    EXPECT_EQ(difference(pattern, subject), "")
+        << pattern << " on " << subject.text;
+  }
+}
+
+TEST(zxregexe_model, loops_with_empty_passes_end) {
+  compare_pairs({{"{{a{0,2}}}+b", "/AAAbab"},
+                 {"{{{{$a{0,2}}}+a|b}}", ""},
+                 {"{{{{$a{0,2}}}+a|b}}", "x"},
+                 {"D?{{{{$a{0}}}+a}}", ""}});
+}
+
+// A repetition that is left with fewer passes tries what follows each time:
+// groups that open there begin to count anew, choices there count.
+TEST(zxregexe_model, tries_that_fail_at_once_still_count) {
+  compare_pairs({{"a{0,}{{b}}*bb|", "ab"},
+                 {"{{ba{0,}}}*bb", "bbab"},
+                 {"(a{0,}(b))*b", "bbab"},
+                 {"(a{0,}(b))+b", "bbab"},
+                 {"(ab*(c?))*d", "abcabd"},
+                 {"{{(`dx*)(1{?2)}}*", "5x12 5x"},
+                 {"{{{{{{ab{0,}}}}}+^}}?a", "aba"}});
 }
 
 // ---- random pairs
@@ -564,8 +601,9 @@ TEST(zxregexe_model_slow, all_patterns_of_boundaries) {
 }
 
 TEST(zxregexe_model_slow, all_patterns_of_loops_with_empty_passes) {
-  compare_all({"a{0,2}", "b", "(", "{{", ")", ")+", ")*", "}}+", "}}*", "|"}, 7,
-              "ab/", 4);
+  compare_all(
+      {"a{0,2}", "b", "$", "(", "{{", ")", ")+", ")*", "}}+", "}}*", "|"}, 7,
+      "ab/", 4);
 }
 
 }  // namespace
