@@ -90,9 +90,9 @@ bool regcheck(const char* pattern, const char* end);
 // operands and, behind "->", the place that its link leads to:
 //
 //   regstart 97 reganch 0 regmust ""
-//   1 BRANCH -> 13
-//   4 EXACTLY "a" -> 9
-//   9 ...
+//   1 BRANCH -> 10
+//   4 EXACTLY "a" -> 10
+//   10 END
 //
 // Bytes of literals and classes that are not printable ASCII, and those that
 // the notation needs itself, are shown as ` and three octal digits.

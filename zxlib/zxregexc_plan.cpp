@@ -602,7 +602,9 @@ class Planner {
     step.takes_all = set == k_all_bytes ? 1 : 0;
     use_set(set, step.table, step.mask);
     const Outlook look = look_from(zxnode::next(node), step);
-    if (look.is_known && !set.meets(look.bytes))
+    const bool is_only_way = look.is_known && !set.meets(look.bytes);
+    if (is_only_way) step.look_flags |= k_look_only;
+    if (is_only_way && (step.look_flags & k_look_open) == 0)
       step.kind = zxStepKind::repeat;
     else
       step.kind =

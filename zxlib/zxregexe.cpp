@@ -115,22 +115,21 @@ Stack stack;
 
 // What failed at a place fails whenever a run comes there again, and leaves
 // the same counts, because each count that it adds to it has set before.  So a
-// run that goes back very often notes down, for each choice and place, that it
-// has failed, and with which effect.
+// run that goes back very often notes down, for each choice, place and current
+// group, that it has failed, and with which effect.
 
 // The counts that a failed try wrote.
 struct Effect {
-  std::uint16_t touched;  // a bit for each slot
-  std::uint8_t current;   // the current group that it began with
-  std::uint32_t next;     // with the same hash; 0: none
+  std::uint32_t touched;                  // a bit for each slot
+  std::uint32_t next;                     // with the same hash; 0: none
   std::int32_t counts[zxMatch::k_slots];  // 0 where not touched
 
   bool operator==(const Effect& other) const {
-    return touched == other.touched && current == other.current &&
+    return touched == other.touched &&
            std::equal(counts, counts + zxMatch::k_slots, other.counts);
   }
   std::uint32_t hash() const {
-    std::uint32_t value = touched + 31U * current;
+    std::uint32_t value = touched;
     for (const std::int32_t count : counts)
       value = (value ^ static_cast<std::uint32_t>(count)) * 16777619U;
     return value ^ (value >> 15);
@@ -185,12 +184,15 @@ class Memory {
  public:
   static constexpr std::size_t k_most_bytes = 64U << 20;
 
-  // Makes room for all steps at all places; false if that is too much.
-  bool open(std::size_t step_count, const char* subject, const char* end) {
+  // Makes room for all steps and groups at all places of the subject; false
+  // if that is too much.
+  bool open(const zxRegexPlan& plan, const char* subject, const char* end) {
     start = subject;
     places = static_cast<std::size_t>(end - subject) + 1;
-    if (step_count > k_most_bytes / sizeof cells[0] / places) return false;
-    const std::size_t bytes = step_count * places * sizeof cells[0];
+    groups = plan.groups + 1U;
+    const std::size_t rows = plan.step_count * groups;
+    if (rows > k_most_bytes / sizeof cells[0] / places) return false;
+    const std::size_t bytes = rows * places * sizeof cells[0];
     cells = static_cast<std::uint32_t*>(zx_realloc(nullptr, bytes));
     if (cells == nullptr) return false;
     std::memset(cells, 0, bytes);
@@ -206,28 +208,29 @@ class Memory {
 
   bool is_open() const { return cells != nullptr; }
 
-  // The effect of the failure at that place; null if none is known.
-  const Effect* recall(std::size_t step, const char* at,
-                       std::uint32_t current) const {
-    const std::uint32_t number = cells[cell(step, at)];
-    if (number == 0) return nullptr;
-    const Effect& effect = effects.get(number);
-    return effect.current == current ? &effect : nullptr;
+  // The effect of the failure there; null if none is known.
+  const Effect* recall(std::size_t step, std::size_t current,
+                       const char* at) const {
+    const std::uint32_t number = cells[cell(step, current, at)];
+    return number == 0 ? nullptr : &effects.get(number);
   }
 
-  void note(std::size_t step, const char* at, const Effect& effect) {
-    const std::uint32_t number = effects.number_of(effect);
-    if (number != 0) cells[cell(step, at)] = number;
+  void note(std::size_t step, std::size_t current, const char* at,
+            const Effect& effect) {
+    cells[cell(step, current, at)] = effects.number_of(effect);
   }
 
  private:
-  std::size_t cell(std::size_t step, const char* at) const {
-    return step * places + static_cast<std::size_t>(at - start);
+  std::size_t cell(std::size_t step, std::size_t current,
+                   const char* at) const {
+    return (step * groups + current) * places +
+           static_cast<std::size_t>(at - start);
   }
 
   std::uint32_t* cells = nullptr;
   const char* start = nullptr;
   std::size_t places = 0;
+  std::size_t groups = 0;
   EffectList effects;
 };
 Memory memory;
@@ -753,7 +756,7 @@ class Run {
   // about; otherwise a frame sees to it that its failure is noted.
   ZX_INLINE bool has_failed(State& s, const zxStep& step) {
     const std::size_t number = number_of(step);
-    if (const Effect* effect = memory.recall(number, s.at, s.current)) {
+    if (const Effect* effect = memory.recall(number, s.current, s.at)) {
       repeat_effect(*effect);
       return true;
     }
@@ -771,12 +774,11 @@ class Run {
   void note_failure(const Frame& frame) {
     if (!remembers) return;
     Effect effect{};
-    effect.touched = static_cast<std::uint16_t>(touched_counts);
-    effect.current = frame.current;
+    effect.touched = touched_counts;
     for (int n = 0; n < zxMatch::k_slots; ++n)
       if ((touched_counts >> n & 1) != 0)
         effect.counts[n] = zx_match.alternative[n];
-    memory.note(frame.step, frame.place, effect);
+    memory.note(frame.step, frame.current, frame.place, effect);
     touched_counts |= frame.count;
   }
 
@@ -887,7 +889,7 @@ class Search {
 
   // The run goes on and remembers its failures, if there is room for them.
   [[gnu::noinline]] Outcome go_on_remembering() {
-    if (memory.open(plan.step_count, start, end))
+    if (memory.open(plan, start, end))
       return Run<true>(run).resume(run.left_at);
     run.patience = INT64_MAX;
     return run.resume(run.left_at);

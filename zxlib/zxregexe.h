@@ -18,8 +18,9 @@
 //
 // Patterns whose time would grow out of all proportion are cut short: when a
 // run has gone back very often, the places that have failed are remembered,
-// in a table of 64 MB at most.  This never changes a result, and is not
-// possible for patterns that refer back to groups.
+// in tables of 64 MB at most.  This never changes a result.  It can't be done
+// for patterns that refer back to groups, nor for those with a loop whose
+// passes may be empty, as in "(a{0,2})*": these take their time.
 #ifndef ZXREGEXE_H
 #define ZXREGEXE_H
 
