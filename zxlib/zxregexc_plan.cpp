@@ -754,9 +754,10 @@ class Planner {
     plan.set_count = static_cast<std::uint16_t>(sets.length());
     plan.test_count = static_cast<std::uint16_t>(tests.length());
     plan.mark_count = static_cast<std::uint16_t>(marks.length());
-    if (regex.reganch != 0 || start.is_free)
-      plan.choice_bits |= k_plan_fresh_tries;
     has_empty_passes |= has_empty_stars();
+    // Whether a pass is empty is seen by the choice that is left behind.
+    if ((regex.reganch != 0 || start.is_free) && !has_empty_passes)
+      plan.choice_bits |= k_plan_fresh_tries;
     if (!has_references && !has_empty_passes)
       plan.choice_bits |= k_plan_remembers;
     if (!has_references) plan.choice_bits |= bits_of_first_repeat();
