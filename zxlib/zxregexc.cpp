@@ -35,9 +35,9 @@ constexpr auto k_is_meta = [] {
 }();
 
 // What a piece, an alternative or a group says about itself.
-constexpr unsigned k_has_width = 1;     // it can't match empty
-constexpr unsigned k_simple = 2;        // it takes exactly one byte
-constexpr unsigned k_starts_loose = 4;  // it can begin with *, + or ?
+constexpr unsigned k_haswidth = 1;  // HASWIDTH: it can't match empty
+constexpr unsigned k_simple = 2;    // SIMPLE: it takes exactly one byte
+constexpr unsigned k_spstart = 4;   // SPSTART: it can begin with *, + or ?
 
 // An atom, or what became of it behind its quantifier.
 struct Piece {
@@ -73,7 +73,7 @@ struct Parser {
   const char* end;
   std::uint8_t* program;  // null while counting
   std::int64_t size;      // of what has been emitted
-  int node_count;
+  std::int64_t node_count;
   int group_count;  // the number of the next group
   int field_count;
   int loose_braces;  // "{" taken as text, each of which excuses a "}"
@@ -164,7 +164,7 @@ Piece emit_literal(const char* bytes, std::size_t length) {
   emit(static_cast<unsigned>(length));
   emit_block(bytes, length);
   emit('\0');
-  return {place, length == 1 ? k_has_width | k_simple : k_has_width};
+  return {place, length == 1 ? k_haswidth | k_simple : k_haswidth};
 }
 Piece emit_literal(char byte) { return emit_literal(&byte, 1); }
 
@@ -285,7 +285,7 @@ bool parse_escape(Piece& piece) {
   const char letter = *parser.at;
   if (const zxNodeKind kind = class_node(letter); kind != zxNodeKind::end) {
     ++parser.at;
-    piece = {emit_node(kind), k_has_width | k_simple};
+    piece = {emit_node(kind), k_haswidth | k_simple};
   } else if (letter == 'b' || letter == 'B') {
     ++parser.at;
     piece = {emit_node(letter == 'b' ? zxNodeKind::wordb : zxNodeKind::nwordb),
@@ -373,7 +373,7 @@ bool parse_class(Piece& piece) {
   // The node holds the bytes that don't match.
   if (!negated)
     for (std::uint8_t& byte : members) byte = static_cast<std::uint8_t>(~byte);
-  piece = {emit_node(zxNodeKind::anyof), k_has_width | k_simple};
+  piece = {emit_node(zxNodeKind::anyof), k_haswidth | k_simple};
   emit_block(members.data(), members.size());
   return true;
 }
@@ -440,7 +440,7 @@ bool parse_field(Piece& piece) {
   parser.at = letter + 1;
   const bool has_width =
       spec.width != k_field_not_given || (spec.flags & k_field_blank) == 0;
-  piece = {emit_node(zxNodeKind::field), has_width ? k_has_width : 0};
+  piece = {emit_node(zxNodeKind::field), has_width ? k_haswidth : 0};
   emit(static_cast<unsigned>(parser.field_count++));
   emit(static_cast<unsigned>(spec.width) & 0xFF);
   emit(static_cast<unsigned>(spec.precision) & 0xFF);
@@ -465,7 +465,7 @@ bool parse_atom(Piece& piece) {
       return true;
     case '.':
       ++parser.at;
-      piece = {emit_node(zxNodeKind::any), k_has_width | k_simple};
+      piece = {emit_node(zxNodeKind::any), k_haswidth | k_simple};
       return true;
     case '[':
       ++parser.at;
@@ -555,7 +555,7 @@ bool parse_quantifier(Piece& piece) {
   const Count count = read_count(parser.at, parser.end);
   const char sign = *parser.at;
   const bool simple = (piece.flags & k_simple) != 0;
-  if (sign != '?' && (piece.flags & k_has_width) == 0) return false;
+  if (sign != '?' && (piece.flags & k_haswidth) == 0) return false;
   if (count.is_valid) {
     if (!simple || count.min > count.max || count.max > k_regex_max_count)
       return false;
@@ -572,7 +572,7 @@ bool parse_quantifier(Piece& piece) {
     else
       loop_plus(piece.place);
   }
-  piece.flags = sign == '*' || sign == '?' ? k_starts_loose : k_has_width;
+  piece.flags = sign == '*' || sign == '?' ? k_spstart : k_haswidth;
   return !is_quantifier(parser.at, parser.end);
 }
 
@@ -596,10 +596,9 @@ void start_branch(Group& group) {
 
 // Adds a finished piece to the alternative.
 void add_piece(Group& group, const Piece& piece) {
-  group.branch_flags |= static_cast<std::uint8_t>(piece.flags & k_has_width);
+  group.branch_flags |= static_cast<std::uint8_t>(piece.flags & k_haswidth);
   if (group.chain < 0)
-    group.branch_flags |=
-        static_cast<std::uint8_t>(piece.flags & k_starts_loose);
+    group.branch_flags |= static_cast<std::uint8_t>(piece.flags & k_spstart);
   else
     link_tail(group.chain, piece.place);
   group.chain = piece.place;
@@ -608,9 +607,9 @@ void add_piece(Group& group, const Piece& piece) {
 // An alternative without a piece matches empty.
 void end_branch(Group& group) {
   if (group.chain < 0) emit_node(zxNodeKind::nothing);
-  group.flags |= group.branch_flags & k_starts_loose;
-  if ((group.branch_flags & k_has_width) == 0)
-    group.flags &= static_cast<std::uint8_t>(~k_has_width);
+  group.flags |= group.branch_flags & k_spstart;
+  if ((group.branch_flags & k_haswidth) == 0)
+    group.flags &= static_cast<std::uint8_t>(~k_haswidth);
 }
 
 void add_branch(Group& group) {
@@ -637,7 +636,7 @@ int emit_close(const Group& group) {
 }
 
 Group make_group(GroupKind kind, int number) {
-  Group group{kind, static_cast<std::uint8_t>(number), k_has_width, 0, 0, 0, 0};
+  Group group{kind, static_cast<std::uint8_t>(number), k_haswidth, 0, 0, 0, 0};
   if (kind == GroupKind::top) {
     group.open = group.branch = emit_node(zxNodeKind::branch);
   } else {
@@ -766,7 +765,7 @@ void fill_header(zxRegex& regex) {
       regex.regstart = first_byte(second);
     }
   }
-  if ((parser.flags & k_starts_loose) != 0) find_must(regex, first);
+  if ((parser.flags & k_spstart) != 0) find_must(regex, first);
 }
 
 // --------------------------------------------------------------- passes --
@@ -815,7 +814,7 @@ zxRegex* regcomp(const char* pattern, const char* end) {
   start_pass(pattern, end, const_cast<std::uint8_t*>(regex->program()));
   parse_regex();  // works, as it did in the first pass
   fill_header(*regex);
-  return regex_plan(regex, parser.node_count);
+  return regex_plan(regex, static_cast<int>(parser.node_count));
 }
 
 bool regcheck(const char* pattern, const char* end) {

@@ -205,4 +205,5 @@ bool regexec_from(const zxRegex* regex, const char* subject, const char* end,
 void clear_match() {
   zx_match = zxMatch{};
   zxregexe::touched_fields = 0;
+  zxregexe::stack.resize(0);
 }

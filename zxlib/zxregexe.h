@@ -72,7 +72,8 @@ bool regexec(const zxRegex* regex, const char* subject, const char* end);
 bool regexec_from(const zxRegex* regex, const char* subject, const char* end,
                   char prev_char);
 
-// Empties the record: all groups and fields unset, all counters 0.
+// Empties the record: all groups and fields unset, all counters 0; and gives
+// back the memory that runs keep for the next one.
 void clear_match();
 
 #endif  // ZXREGEXE_H
