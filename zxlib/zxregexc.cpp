@@ -238,21 +238,6 @@ zxNodeKind class_node(char letter) {
   return i == std::string_view::npos ? zxNodeKind::end : k_class_nodes[i];
 }
 
-char control_byte(char letter) {
-  switch (letter) {
-    case 'f':
-      return '\f';
-    case 'n':
-      return '\n';
-    case 'r':
-      return '\r';
-    case 't':
-      return '\t';
-    default:
-      return letter;
-  }
-}
-
 bool sees_three_digits() {
   const char* at = parser.at;
   return parser.end - at >= 3 && zx_is_digit(at[0]) && zx_is_digit(at[1]) &&
@@ -275,7 +260,7 @@ bool read_octal(char& byte) {
 bool read_escaped_byte(char& byte) {
   if (sees_three_digits()) return read_octal(byte);
   const char letter = *parser.at++;
-  byte = letter == '0' ? '\0' : control_byte(letter);
+  byte = letter == '0' ? '\0' : zx_control_byte(letter);
   return true;
 }
 

@@ -147,6 +147,22 @@ inline constexpr unsigned k_field_minus = 32;   // no meaning
 inline constexpr unsigned k_field_equals = 64;  // a sign is forbidden
 inline constexpr int k_field_not_given = -1;
 
+// The control byte that a letter stands for behind an escape, or the letter.
+constexpr char zx_control_byte(char letter) {
+  switch (letter) {
+    case 'f':
+      return '\f';
+    case 'n':
+      return '\n';
+    case 'r':
+      return '\r';
+    case 't':
+      return '\t';
+    default:
+      return letter;
+  }
+}
+
 // Reading nodes of a program that regcomp() made.  A node is known by its
 // address.
 namespace zxnode {
@@ -297,6 +313,11 @@ struct zxByteRanges {
 };
 static_assert(sizeof(zxByteRanges) == 8);
 inline constexpr std::uint8_t k_many_ranges = 0xFF;
+
+// The number of the set that a step names by its table and its bit.
+inline unsigned zx_set_number(unsigned table, unsigned mask) {
+  return table * 8 + static_cast<unsigned>(std::countr_zero(mask));
+}
 
 struct zxRegexPlan {
   std::uint16_t first;  // step that a run begins with

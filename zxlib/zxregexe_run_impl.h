@@ -245,10 +245,6 @@ class Run {
     return (tables[table * 256 + static_cast<unsigned char>(*at)] & mask) != 0;
   }
 
-  unsigned set_of(unsigned table, unsigned mask) const {
-    return table * 8 + static_cast<unsigned>(std::countr_zero(mask));
-  }
-
   ZX_INLINE bool is_byte(State& s, std::uint8_t byte) const {
     if (s.at == end || static_cast<std::uint8_t>(*s.at) != byte) return false;
     ++s.at;
@@ -445,8 +441,9 @@ class Run {
     }
     for (; at != near_limit; ++at)
       if (!fits(at)) return at;
-    return at == limit ? at
-                       : find_not_in(plan, set_of(step.table, mask), at, limit);
+    return at == limit
+               ? at
+               : find_not_in(plan, zx_set_number(step.table, mask), at, limit);
   }
 
   ZX_INLINE bool repeat_for_good(State& s, const zxStep& step) const {
@@ -473,7 +470,7 @@ class Run {
     if (!can_go_on(step, base + count)) {
       if (count == min) return false;
       const char* place =
-          find_last_in(plan, set_of(step.look_table, step.look_mask),
+          find_last_in(plan, zx_set_number(step.look_table, step.look_mask),
                        base + min, base + count);
       if (place == nullptr) return false;
       count = static_cast<std::size_t>(place - base);
@@ -521,7 +518,8 @@ class Run {
   ZX_INLINE const char* next_way_on(const zxStep& step, const char* at,
                                     const char* limit) const {
     if (step.takes_all != 0 && (step.look_flags & k_look_open) == 0) {
-      at = find_in(plan, set_of(step.look_table, step.look_mask), at, limit);
+      at = find_in(plan, zx_set_number(step.look_table, step.look_mask), at,
+                   limit);
       return at != limit || can_go_on(step, at) ? at : nullptr;
     }
     while (!can_go_on(step, at)) {

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cstring>
 
+#include "zxregexc_impl.h"
 #include "zxstrm_impl.h"
 
 namespace {
@@ -113,23 +114,10 @@ class Replacement {
     out.append(zx_match.start[n], zx_size(group_length(n)));
   }
 
+  // Unlike in patterns, a and b are control bytes as well.
   static char control_byte(char letter) {
-    switch (letter) {
-      case 'a':
-        return '\a';
-      case 'b':
-        return '\b';
-      case 'f':
-        return '\f';
-      case 'n':
-        return '\n';
-      case 'r':
-        return '\r';
-      case 't':
-        return '\t';
-      default:
-        return letter;
-    }
+    if (letter == 'a') return '\a';
+    return letter == 'b' ? '\b' : zx_control_byte(letter);
   }
 
   const char* text;
