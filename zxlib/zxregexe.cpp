@@ -3,7 +3,6 @@
 #include "zxregexe.h"
 
 #include <algorithm>
-#include <bit>
 #include <cstring>
 #include <utility>
 
@@ -111,8 +110,7 @@ class Search {
   const char* behind_run(const char* at) const {
     const zxStep* step = plan.steps() + plan.first;
     while (step->kind != zxStepKind::repeat) step = plan.steps() + step->next;
-    const unsigned set =
-        step->table * 8U + static_cast<unsigned>(std::countr_zero(step->mask));
+    const unsigned set = zx_set_number(step->table, step->mask);
     return std::max(find_not_in(plan, set, at, end), at + 1);
   }
 
