@@ -246,7 +246,9 @@ enum class zxStepKind : std::uint8_t {
   open_plain,      // the current group becomes 0
   open,            // number: the group
   close,           // number: the group
-  branch,          // next: the alternative; other: the next one; look: of it
+  branch,          // next: the alternative; other: the next one; look: of it;
+                   // number: the length of the word that it begins with, max:
+                   // the place of that
   check_pass,      // ends a pass that may be empty; other: its loop's exit
   check_branch,    // the same, then as branch
   back_reference,  // number: the group

@@ -23,13 +23,20 @@ class Outlook {
     last_try,  // ... if its failure is that of the whole try
     start,     // of a match as a whole
   };
+  Outlook() = default;  // anything can be met
   Outlook(zxnode::Node node, Purpose purpose, bool program_has_loops);
 
-  bool is_known;        // false: anything can be met
-  bool at_end = false;  // the end of the subject can be met
+  bool is_known = false;  // otherwise anything can be met
+  bool at_end = false;    // the end of the subject can be met
   // Counts don't matter; for a start: each try writes that of slot 0 first.
-  bool is_free;
+  bool is_free = false;
   ByteSet bytes;  // that can be met
+
+  // True if nothing that this one can meet can be met by the other.
+  bool excludes(const Outlook& other) const {
+    return is_known && other.is_known && !(at_end && other.at_end) &&
+           !bytes.meets(other.bytes);
+  }
 
   std::uint8_t flags() const {
     if (!is_known) return k_look_open;
@@ -42,8 +49,8 @@ class Outlook {
   bool takes_byte(zxnode::Node node);
   bool takes_field(zxnode::Node node);
 
-  bool may_open;
-  bool is_ahead_of_choices;
+  bool may_open = false;
+  bool is_ahead_of_choices = false;
   int budget = 64;  // nodes to visit
 };
 

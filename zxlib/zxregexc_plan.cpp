@@ -277,26 +277,49 @@ class Planner {
            step.kind == zxStepKind::check_branch;
   }
 
+  // What is known of an alternative.
+  struct Way {
+    Node node;
+    Outlook look;
+  };
+
   // The steps of all alternatives that begin with this one.
   void make_choice(Node first) {
-    zxQVA<Node> branches;
+    constexpr std::int32_t k_most_compared = 64;
+    zxQVA<Way> ways;
     for (Node node = first; node != nullptr;
-         node = zxnode::next_alternative(node))
-      branches.append(node);
-    ByteSet later;
-    bool later_at_end = false;
-    bool later_known = true;
-    for (std::int32_t i = branches.length(); i-- > 0;) {
-      zxStep& step = steps[step_of(branches.get(i))];
-      make_branch(step, branches.get(i));
-      const Outlook look = look_from(zxnode::operand(branches.get(i)), step);
-      if (look.is_known && later_known && !(look.at_end && later_at_end) &&
-          !look.bytes.meets(later))
-        step.look_flags |= k_look_only;
-      later.add(look.bytes);
-      later_at_end |= look.at_end;
-      later_known &= look.is_known;
+         node = zxnode::next_alternative(node)) {
+      zxStep& step = steps[step_of(node)];
+      make_branch(step, node);
+      ways.append({node, look_from(zxnode::operand(node), step)});
     }
+    if (ways.length() > k_most_compared) return;
+    for (std::int32_t i = 0; i < ways.length(); ++i)
+      if (is_only_way(ways, i))
+        steps[step_of(ways.get(i).node)].look_flags |= k_look_only;
+  }
+
+  // True if none of the later alternatives can go on where this one can.
+  static bool is_only_way(const zxQVA<Way>& ways, std::int32_t i) {
+    const auto excludes = [&way = ways.get(i)](const Way& other) {
+      return way.look.excludes(other.look) ||
+             are_different(zxnode::operand(way.node),
+                           zxnode::operand(other.node));
+    };
+    return std::all_of(ways.begin() + i + 1, ways.end(), excludes);
+  }
+
+  // True for literals of which neither begins with the other.
+  static bool are_different(Node a, Node b) {
+    if (!is_word(a) || !is_word(b)) return false;
+    const Node text_a = zxnode::operand(a);
+    const Node text_b = zxnode::operand(b);
+    return std::memcmp(text_a + 1, text_b + 1, std::min(*text_a, *text_b)) != 0;
+  }
+
+  // A literal of several bytes.
+  static bool is_word(Node node) {
+    return zxnode::is(node, zxNodeKind::exactly) && *zxnode::operand(node) > 1;
   }
 
   void make_branch(zxStep& step, Node node) {
@@ -306,6 +329,11 @@ class Planner {
     if (step.kind == zxStepKind::check_branch) has_empty_passes = true;
     step.next = step_of(arrived(zxnode::operand(node)));
     step.other = other == nullptr ? k_no_step : step_of(other);
+    const Node operand = zxnode::operand(node);
+    if (is_word(operand)) {
+      step.number = *zxnode::operand(operand);
+      step.max = place(zxnode::operand(operand) + 1);
+    }
   }
 
   Outlook last_outlook(Node node) const {

@@ -252,14 +252,16 @@ class Run {
   }
 
   ZX_INLINE bool is_literal(State& s, const zxStep& step) const {
-    const std::size_t length = step.number;
-    const std::uint8_t* bytes = program + step.place;
-    if (static_cast<std::size_t>(end - s.at) < length ||
-        static_cast<std::uint8_t>(*s.at) != *bytes)
-      return false;
-    for (std::size_t i = 1; i < length; ++i)
-      if (static_cast<std::uint8_t>(s.at[i]) != bytes[i]) return false;
-    s.at += length;
+    if (!is_text(s.at, program + step.place, step.number)) return false;
+    s.at += step.number;
+    return true;
+  }
+
+  ZX_INLINE bool is_text(const char* at, const std::uint8_t* text,
+                         std::size_t length) const {
+    if (static_cast<std::size_t>(end - at) < length) return false;
+    for (std::size_t i = 0; i < length; ++i)
+      if (static_cast<std::uint8_t>(at[i]) != text[i]) return false;
     return true;
   }
 
@@ -374,7 +376,7 @@ class Run {
   ZX_INLINE bool try_alternative(State& s, const zxStep& first) {
     const zxStep* branch = &first;
     while (branch->other != k_no_step) {
-      if (can_go_on(*branch, s.at)) {
+      if (can_go_on(*branch, s.at) && has_word(*branch, s.at)) {
         if (is_last_try(s, *branch) && meets(*branch, s.at)) break;
         if (!push(s,
                   {FrameKind::alternative, static_cast<std::uint8_t>(s.current),
@@ -387,6 +389,12 @@ class Run {
     }
     s.step = steps + branch->next;
     return true;
+  }
+
+  // The word that an alternative begins with is looked at ahead of the choice.
+  ZX_INLINE bool has_word(const zxStep& branch, const char* at) const {
+    return branch.number == 0 ||
+           is_text(at, program + branch.max, branch.number);
   }
 
   // True if, once what is behind a choice has failed, the try has failed: the
