@@ -76,8 +76,8 @@ struct Parser {
   std::int64_t node_count;
   int group_count;  // the number of the next group
   int field_count;
-  int loose_braces;  // "{" taken as text, each of which excuses a "}"
-  unsigned flags;    // of the whole pattern, at the end
+  std::int64_t loose_braces;  // "{" taken as text, each of which excuses a "}"
+  unsigned flags;             // of the whole pattern, at the end
 
   bool is_counting() const { return program == nullptr; }
   bool has_more() const { return at < end; }
@@ -168,7 +168,7 @@ Piece emit_literal(const char* bytes, std::size_t length) {
 }
 Piece emit_literal(char byte) { return emit_literal(&byte, 1); }
 
-// counted: { digits [ , [ digits ] ] }
+// Digits, as a number; those above the limit all come out as one more.
 int read_number(const char*& at, const char* end, int limit) {
   int number = 0;
   for (; at < end && zx_is_digit(*at); ++at)
@@ -176,6 +176,7 @@ int read_number(const char*& at, const char* end, int limit) {
   return number;
 }
 
+// counted: { digits [ , [ digits ] ] }
 Count read_count(const char* at, const char* end) {
   constexpr Count k_none = {false, 0, 0, nullptr};
   if (at == end || *at != '{') return k_none;
@@ -797,7 +798,10 @@ zxRegex* regcomp(const char* pattern, const char* end) {
   zxRegex* regex = make_block(static_cast<std::size_t>(parser.size));
   if (regex == nullptr) return nullptr;
   start_pass(pattern, end, const_cast<std::uint8_t*>(regex->program()));
-  parse_regex();  // works, as it did in the first pass
+  if (!ZX_ASSERT(parse_regex() && parser.size == regex->size)) {
+    zx_realloc(regex, 0);
+    return nullptr;
+  }
   fill_header(*regex);
   return regex_plan(regex, static_cast<int>(parser.node_count));
 }

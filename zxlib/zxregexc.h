@@ -81,8 +81,8 @@ inline constexpr std::size_t zxRegex::k_program_place =
 // when one of these was dropped.
 zxRegex* regcomp(const char* pattern, const char* end);
 
-// True if the pattern is valid.  It never fails, whatever the pattern's size,
-// but for null pointers as above (false, if that was dropped).
+// True if the pattern is valid, whatever its size.  A bad one is no failure;
+// null pointers are, as above (false, if that was dropped).
 bool regcheck(const char* pattern, const char* end);
 
 // The program as text, for tests and for people: a line for the header,

@@ -562,13 +562,16 @@ constexpr std::size_t rounded_up(std::size_t size) {
          zxRegex::k_plan_unit;
 }
 
-// Resizes the block; what points into the program moves along.
+// Resizes the block; what points into the program moves along.  Null, and the
+// block is gone, if the failure was dropped.
 zxRegex* resize(zxRegex* regex, std::size_t size) {
   const bool has_must = regex->regmust != nullptr;
   const std::ptrdiff_t must =
       has_must ? regex->regmust - reinterpret_cast<const char*>(regex) : 0;
   auto* moved = static_cast<zxRegex*>(zx_realloc(regex, size));
-  if (moved != nullptr && has_must)
+  if (moved == nullptr)
+    zx_realloc(regex, 0);
+  else if (has_must)
     moved->regmust = reinterpret_cast<const char*>(moved) + must;
   return moved;
 }

@@ -20,7 +20,8 @@
 // run has gone back very often, the places that have failed are remembered,
 // in tables of 64 MB at most.  This never changes a result.  It can't be done
 // for patterns that refer back to groups, nor for those with a loop whose
-// passes may be empty, as in "(a{0,2})*": these take their time.
+// passes may be empty, as in "(a{0,2})*": these take their time, which doubles
+// with each such loop inside another.
 #ifndef ZXREGEXE_H
 #define ZXREGEXE_H
 
@@ -30,7 +31,8 @@
 
 // What a run left.  A match that is rejected by the literal it must contain,
 // or by its first byte behind "^", leaves the former results standing; every
-// other run clears them first.
+// other run clears them first.  A run that finds nothing leaves no group and
+// no field, but what its tries have counted.
 struct zxMatch {
   static constexpr std::int32_t k_slots = 12;
   static constexpr std::int32_t k_before = 10;

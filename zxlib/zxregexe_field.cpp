@@ -179,8 +179,6 @@ bool takes_separator(Reader& in, char separator) {
   return true;
 }
 
-// A date has no use for the width.
-
 // Years of two digits are taken for 1970 to 2057.
 bool is_year(int year) {
   return (year >= 0 && year <= 57) || (year >= 70 && year <= 100) ||
@@ -222,7 +220,7 @@ const char* field_end(zxnode::Node node, const char* at, const char* end) {
     case 's':
       return token_end(in);
     case 't':
-      in.end = end;
+      in.end = end;  // a date has no use for the width
       return date_end(in);
     default:
       return quoted_end(in);

@@ -95,8 +95,11 @@ zxRegex* known_regex(const char* text, std::int32_t length) {
   if (regex == nullptr) return nullptr;
   let_go(slot.regex);
   slot.text.build(text, length);
-  slot.regex = regex;
-  return regex;
+  if (slot.text.view() == wanted)
+    slot.regex = regex;
+  else
+    let_go(regex);  // a failure was dropped
+  return slot.regex;
 }
 
 // -------------------------------------------------------------- searching --
@@ -108,6 +111,12 @@ bool is_rejected(const zxRegex& regex, const zxStr& subject) {
 bool search(const zxRegex& regex, const zxStr& subject) {
   return zxregexe::search(regex, subject.begin(), subject.end(),
                           zxregexe::k_at_start);
+}
+
+// False if the failure of a copy was dropped.
+bool hold(const zxStr& subject) {
+  cache.subject = subject;
+  return cache.subject.length() == subject.length();
 }
 
 bool match_with(const zxRegex* regex, const zxStr& subject) {
@@ -135,8 +144,7 @@ bool imatch_with(const zxRegex* regex, const zxStr& subject) {
   zxIStr folded(subject);
   folded.to_lower();
   if (is_rejected(*regex, folded)) return false;
-  cache.subject = subject;
-  if (!search(*regex, folded)) return false;
+  if (!hold(subject) || !search(*regex, folded)) return false;
   rebase_match(folded.begin(), cache.subject.begin());
   return true;
 }
@@ -158,8 +166,7 @@ const zxRegex* zxstrm::regex_of(const zxStr& pattern) {
 // holder changes only when they are cleared.
 bool zxstrm::search_held(const zxRegex& regex, const zxStr& subject) {
   if (is_rejected(regex, subject)) return false;
-  cache.subject = subject;
-  return search(regex, cache.subject);
+  return hold(subject) && search(regex, cache.subject);
 }
 
 const zxStr& zxstrm::held_subject() { return cache.subject; }

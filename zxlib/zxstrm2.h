@@ -15,7 +15,8 @@
 //                          choice (alternative(0) is -1), it is a plain byte
 //
 // Matches behind the first never match "^", and see the byte ahead of them
-// for word boundaries.  Patterns are given, cached and fail as in zxstrm.h.
+// for word boundaries.  Patterns are given, cached and fail as in zxstrm.h;
+// where a replacement comes with its length, both lengths are 0 or more.
 #ifndef ZXSTRM2_H
 #define ZXSTRM2_H
 
