@@ -50,8 +50,8 @@ void set_slot(std::int32_t n, const char* start, const char* end) {
 
 // How often a run may go back before failures are remembered.
 std::int64_t patience_for(std::ptrdiff_t length) {
-  constexpr std::int64_t k_base = 256;
-  constexpr std::int64_t k_for_each_byte = 16;
+  constexpr std::int64_t k_base = 128;
+  constexpr std::int64_t k_for_each_byte = 4;
   return k_base + k_for_each_byte * length;
 }
 

@@ -41,6 +41,7 @@ class EffectList {
   static constexpr std::size_t k_most_bytes = 64U << 20;
 
   void clear() {
+    if (effects == nullptr) return;
     zx_realloc(effects, 0);
     effects = nullptr;
     length = capacity = 0;
@@ -61,7 +62,7 @@ class EffectList {
   }
 
  private:
-  static constexpr std::uint32_t k_heads = 4096;
+  static constexpr std::uint32_t k_heads = 1024;
 
   bool grow() {
     const std::uint32_t wanted = capacity == 0 ? 64 : 2 * capacity;
