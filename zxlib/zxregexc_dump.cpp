@@ -206,10 +206,8 @@ class Checker {
 
   bool is_simple(std::int64_t place) const {
     const Node node = program + place;
-    return zxnode::is(node, zxNodeKind::any) ||
-           zxnode::is(node, zxNodeKind::anyof) ||
-           zxnode::info(node).class_bits != 0 ||
-           (zxnode::is(node, zxNodeKind::exactly) &&
+    return zxnode::takes_bytes(node) &&
+           (!zxnode::is(node, zxNodeKind::exactly) ||
             *zxnode::operand(node) == 1);
   }
 

@@ -203,10 +203,22 @@ inline int size_of(Node node) {
   return is(node, zxNodeKind::exactly) ? size + *operand(node) : size;
 }
 
+// True for the nodes that take exactly one byte of a set, or a literal.
+inline bool takes_bytes(Node node) {
+  return is(node, zxNodeKind::any) || is(node, zxNodeKind::anyof) ||
+         is(node, zxNodeKind::exactly) || info(node).class_bits != 0;
+}
+
 // The simple node that a repetition repeats, and its limits;
 // k_no_maximum stands for none.
 inline constexpr int k_no_maximum = 0xFFFF;
 inline Node repeated(Node node) { return node + size_of(node); }
+// The node behind this one in the program, which what is repeated is not.
+inline Node following(Node node) {
+  if (is_repeat(node)) node = repeated(node);
+  return node + size_of(node);
+}
+
 inline int minimum(Node node) {
   if (info(node).operand == zxOperand::counts)
     return static_cast<int>(big16(operand(node)));

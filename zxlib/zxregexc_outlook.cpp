@@ -85,11 +85,7 @@ bool Outlook::takes_byte(Node node) {
   }
   if (zxnode::is(node, zxNodeKind::eol)) return at_end = true;
   if (zxnode::is(node, zxNodeKind::field)) return takes_field(node);
-  if (zxnode::info(node).class_bits == 0 &&
-      !zxnode::is(node, zxNodeKind::exactly) &&
-      !zxnode::is(node, zxNodeKind::any) &&
-      !zxnode::is(node, zxNodeKind::anyof))
-    return false;
+  if (!zxnode::takes_bytes(node)) return false;
   bytes.add(first_set(node));
   return true;
 }

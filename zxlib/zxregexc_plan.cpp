@@ -6,6 +6,7 @@
 
 #include "zxqva.h"
 #include "zxregexc_outlook_impl.h"
+#include "zxregexc_pass_impl.h"
 
 using zxnode::Node;
 using namespace zxregexc;
@@ -21,14 +22,17 @@ constexpr std::uint16_t k_alternative = 0xFFFE;  // is a later alternative
 class Planner {
  public:
   Planner(const zxRegex& its_regex, zxRegexPlan& its_plan, zxStep* its_steps)
-      : regex(its_regex), plan(its_plan), steps(its_steps) {}
+      : regex(its_regex),
+        plan(its_plan),
+        steps(its_steps),
+        empty_passes(begin(), end()) {}
 
   bool make() {
     number_steps();
     std::fill_n(steps, plan.step_count, zxStep{});
-    for (Node node = begin(); node < end(); node = following(node))
+    for (Node node = begin(); node < end(); node = zxnode::following(node))
       if (step_of(node) != k_skipped && !make_step(node)) return false;
-    for (Node node = begin(); node < end(); node = following(node))
+    for (Node node = begin(); node < end(); node = zxnode::following(node))
       if (step_of(node) != k_skipped) node = make_sequence(node);
     finish();
     return true;
@@ -44,10 +48,6 @@ class Planner {
   Node end() const { return regex.program() + regex.size; }
   std::uint16_t place(Node node) const {
     return static_cast<std::uint16_t>(node - regex.program());
-  }
-  static Node following(Node node) {
-    if (zxnode::is_repeat(node)) node = zxnode::repeated(node);
-    return node + zxnode::size_of(node);
   }
   std::uint16_t& step_of(Node node) { return step_at[place(node)]; }
 
@@ -66,9 +66,9 @@ class Planner {
   // ---- which nodes become steps
   void number_steps() {
     std::memset(step_at, 0, regex.size * sizeof step_at[0]);
-    find_loops();
+    look_for_loops();
     int count = 0;
-    for (Node node = begin(); node < end(); node = following(node)) {
+    for (Node node = begin(); node < end(); node = zxnode::following(node)) {
       const bool has_step = is_step(node);
       step_of(node) = has_step ? static_cast<std::uint16_t>(count) : k_skipped;
       if (has_step) ++count;
@@ -82,7 +82,7 @@ class Planner {
       case zxNodeKind::close0:
         return false;
       case zxNodeKind::back:
-        return is_empty_star(node);
+        return empty_passes.ends_star(node);
       case zxNodeKind::branch:
         return is_alternative(node);
       default:
@@ -98,89 +98,10 @@ class Planner {
     return other != nullptr || step_of(branch) == k_alternative;
   }
 
-  // ---- loops whose passes can be empty
-  //
-  // Only a counted repetition with a minimum of 0 makes them: it passes for
-  // something that takes a byte.
-  void find_loops() {
-    bool has_empty_counts = false;
-    for (Node node = begin(); node < end(); node = following(node)) {
+  void look_for_loops() {
+    for (Node node = begin(); node < end(); node = zxnode::following(node)) {
       if (zxnode::is(node, zxNodeKind::back)) has_loops = true;
       if (zxnode::is(node, zxNodeKind::backref)) has_references = true;
-      if (zxnode::info(node).operand == zxOperand::counts &&
-          zxnode::minimum(node) == 0)
-        has_empty_counts = true;
-    }
-    looks_for_empty_passes = has_loops && has_empty_counts;
-  }
-
-  // x*: the BACK behind a body that can match empty.
-  bool is_empty_star(Node back) {
-    if (!looks_for_empty_passes) return false;
-    const Node branch = zxnode::next(back);
-    return zxnode::is(branch, zxNodeKind::branch) &&
-           zxnode::operand(branch) != back &&
-           can_pass(zxnode::operand(branch), back);
-  }
-
-  // x+: the BRANCH behind such a body, whose operand is the BACK.
-  bool is_empty_plus(Node branch) {
-    if (!looks_for_empty_passes) return false;
-    const Node back = zxnode::operand(branch);
-    return zxnode::is(back, zxNodeKind::back) &&
-           can_pass(zxnode::next(back), branch);
-  }
-
-  // True if a run can get from `from` to the later node `to` without taking
-  // a byte.  Links lead forward but for those of inner loops, which lead to
-  // where the loop can be left as well; so one walk from the end does it.
-  bool can_pass(Node from, Node to) {
-    zxQVA<Node> nodes;
-    for (Node node = from; node < to; node = following(node))
-      nodes.append(node);
-    passes_to(to) = true;
-    for (std::int32_t i = nodes.length(); i-- > 0;)
-      passes_to(nodes.get(i)) = passes_from(nodes.get(i), from, to);
-    return passes_to(from);
-  }
-
-  bool passes_from(Node node, Node from, Node to) {
-    const auto passes = [&](Node next) {
-      return next != nullptr && next >= from && next <= to && passes_to(next);
-    };
-    if (zxnode::is(node, zxNodeKind::back)) {
-      // The way out of the loop, from behind this place.
-      const Node head = zxnode::next(node);
-      const Node exit = zxnode::is(head, zxNodeKind::branch) && head < node
-                            ? zxnode::next(head)
-                            : nullptr;
-      return exit > node && passes(exit);
-    }
-    if (zxnode::is(node, zxNodeKind::branch)) {
-      for (Node other = node; other != nullptr;
-           other = zxnode::next_alternative(other))
-        if (passes(zxnode::operand(other))) return true;
-      return false;
-    }
-    return !takes_bytes(node) && passes(zxnode::next(node));
-  }
-
-  bool& passes_to(Node node) { return passing[place(node)]; }
-
-  static bool takes_bytes(Node node) {
-    if (zxnode::is_repeat(node)) return zxnode::minimum(node) > 0;
-    switch (static_cast<zxNodeKind>(*node)) {
-      case zxNodeKind::any:
-      case zxNodeKind::anyof:
-      case zxNodeKind::exactly:
-        return true;
-      case zxNodeKind::field: {
-        const std::uint8_t* operand = zxnode::operand(node);
-        return static_cast<std::int8_t>(operand[1]) != k_field_not_given ||
-               (operand[3] & k_field_blank) == 0;
-      }
-      default:
-        return zxnode::info(node).class_bits != 0;
     }
   }
 
@@ -324,8 +245,8 @@ class Planner {
 
   void make_branch(zxStep& step, Node node) {
     const Node other = zxnode::next_alternative(node);
-    step.kind =
-        is_empty_plus(node) ? zxStepKind::check_branch : zxStepKind::branch;
+    step.kind = empty_passes.ends_plus(node) ? zxStepKind::check_branch
+                                             : zxStepKind::branch;
     if (step.kind == zxStepKind::check_branch) has_empty_passes = true;
     step.next = step_of(arrived(zxnode::operand(node)));
     step.other = other == nullptr ? k_no_step : step_of(other);
@@ -540,20 +461,18 @@ class Planner {
   const zxRegex& regex;
   zxRegexPlan& plan;
   zxStep* const steps;
+  EmptyPasses empty_passes;
   zxQVA<ByteSet> sets;
   zxQVA<zxByteTest> tests;
   zxQVA<zxGroupMark> marks;
   bool has_loops = false;
   bool has_references = false;
-  bool looks_for_empty_passes = false;
   bool has_empty_passes = false;
 
   static std::uint16_t step_at[32768];
-  static bool passing[32768];
 };
 
 std::uint16_t Planner::step_at[32768];
-bool Planner::passing[32768];
 
 // ----------------------------------------------------------------- block --
 
