@@ -4,6 +4,7 @@
 #define ZXREGEXC_SET_IMPL_H
 
 #include <array>
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 
@@ -20,6 +21,11 @@ struct ByteSet {
     for (std::size_t i = 0; i < bits.size(); ++i) bits[i] |= other.bits[i];
   }
   bool has(unsigned byte) const { return bits[byte / 64] >> (byte % 64) & 1; }
+  int size() const {
+    int count = 0;
+    for (const std::uint64_t word : bits) count += std::popcount(word);
+    return count;
+  }
   bool meets(const ByteSet& other) const {
     for (std::size_t i = 0; i < bits.size(); ++i)
       if ((bits[i] & other.bits[i]) != 0) return true;

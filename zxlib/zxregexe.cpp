@@ -82,6 +82,7 @@ class Search {
       at = next_start(at);
       if (at == nullptr) return false;
       if (try_at(at)) return true;
+      if (is_hopeless) return false;
       if ((plan.choice_bits & k_plan_one_try) != 0) return false;
       if ((plan.choice_bits & k_plan_skips_run) != 0) at = behind_run(at) - 1;
       if (at >= end) return false;
@@ -136,8 +137,12 @@ class Search {
     return Run<true>(run).from(at);
   }
 
-  // The run goes on and remembers its failures, if there is room for them.
+  // The run goes on and remembers its failures, if there is room for them and
+  // there is a byte that it must come upon.
   [[gnu::noinline]] Outcome go_on_remembering() {
+    is_hopeless = plan.must_set != k_no_set &&
+                  find_in(plan, plan.must_set, start, end) == end;
+    if (is_hopeless) return Outcome::failed;
     if (memory.open(plan, start, end))
       return Run<true>(run).resume(run.left_at);
     run.patience = INT64_MAX;
@@ -148,6 +153,7 @@ class Search {
   const std::uint8_t start_byte;
   const char* const start;
   const char* const end;
+  bool is_hopeless = false;  // nothing can match anywhere
   Run<false> run;
 };
 
