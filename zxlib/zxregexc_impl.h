@@ -271,7 +271,6 @@ enum class zxStepKind : std::uint8_t {
 };
 
 inline constexpr std::uint16_t k_no_step = 0xFFFF;
-inline constexpr std::uint16_t k_no_set = 0xFFFF;
 inline constexpr std::uint16_t k_no_limit = zxnode::k_no_maximum;
 
 // Where a choice goes on, the byte there must be in `look`, or be the end if
@@ -346,8 +345,7 @@ struct zxRegexPlan {
   std::uint32_t tables_place;  // from the plan's begin
   std::uint16_t test_count;
   std::uint16_t mark_count;
-  std::uint16_t must_set;  // any match takes a byte of it; or k_no_set
-  std::uint16_t unused;
+  std::uint32_t unused;
 
   const zxStep* steps() const {
     return reinterpret_cast<const zxStep*>(this + 1);

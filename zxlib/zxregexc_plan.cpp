@@ -420,7 +420,6 @@ class Planner {
     const Outlook start(begin(), Outlook::Purpose::start, has_loops);
     plan.start_flags = start.flags();
     plan.start_set = set_number(start.bytes);
-    plan.must_set = find_must_set();
     plan.set_count = static_cast<std::uint16_t>(sets.length());
     plan.test_count = static_cast<std::uint16_t>(tests.length());
     plan.mark_count = static_cast<std::uint16_t>(marks.length());
@@ -431,23 +430,6 @@ class Planner {
     if (!has_references && !has_empty_passes)
       plan.choice_bits |= k_plan_remembers;
     if (!has_references) plan.choice_bits |= bits_of_first_repeat();
-  }
-
-  // The smallest set of which any match takes a byte, if it holds less than
-  // half of all bytes.  What stands in the chain of the only alternative is in
-  // every match.
-  std::uint16_t find_must_set() {
-    ByteSet smallest = k_all_bytes;
-    if (zxnode::next_alternative(begin()) != nullptr) return k_no_set;
-    for (Node node = zxnode::operand(begin()); node != nullptr;
-         node = zxnode::next(node)) {
-      const bool repeats = zxnode::is_repeat(node) && zxnode::minimum(node) > 0;
-      const Node taker = repeats ? zxnode::repeated(node) : node;
-      if (zxnode::takes_bytes(taker) &&
-          first_set(taker).size() < smallest.size())
-        smallest = first_set(taker);
-    }
-    return smallest.size() < 128 ? set_number(smallest) : k_no_set;
   }
 
   bool has_empty_stars() const {

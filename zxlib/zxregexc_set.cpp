@@ -104,6 +104,22 @@ ByteSet first_set(Node node) {
   return set;
 }
 
+// What stands in the chain of the only alternative is in every match.
+ByteSet needed_set(const zxRegex& regex) {
+  ByteSet smallest = k_all_bytes;
+  const Node top = regex.program() + 1;
+  if (zxnode::next_alternative(top) != nullptr) return smallest;
+  for (Node node = zxnode::operand(top); node != nullptr;
+       node = zxnode::next(node)) {
+    const bool repeats = zxnode::is_repeat(node) && zxnode::minimum(node) > 0;
+    const Node taker = repeats ? zxnode::repeated(node) : node;
+    if (!zxnode::takes_bytes(taker)) continue;
+    const ByteSet set = first_set(taker);
+    if (set.size() < smallest.size()) smallest = set;
+  }
+  return smallest;
+}
+
 zxByteRanges ranges_of(const ByteSet& set) {
   zxByteRanges ranges{};
   if (find_ranges(set, ranges)) return ranges;

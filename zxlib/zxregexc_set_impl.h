@@ -51,6 +51,10 @@ inline constexpr ByteSet k_all_bytes = complement(ByteSet{});
 // The bytes that a node which takes at least one can begin with.
 ByteSet first_set(zxnode::Node node);
 
+// The smallest set that is known of which any match takes a byte; all bytes,
+// if none is known.
+ByteSet needed_set(const zxRegex& regex);
+
 // The set as ranges, if there are few of them, or if those of the other bytes
 // are few.
 zxByteRanges ranges_of(const ByteSet& set);

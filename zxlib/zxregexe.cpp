@@ -6,6 +6,7 @@
 #include <cstring>
 #include <utility>
 
+#include "zxregexc_set_impl.h"
 #include "zxregexe_impl.h"
 #include "zxregexe_run_impl.h"
 
@@ -57,9 +58,10 @@ std::int64_t patience_for(std::ptrdiff_t length) {
 
 class Search {
  public:
-  Search(const zxRegex& regex, const char* its_start, const char* its_end,
+  Search(const zxRegex& its_regex, const char* its_start, const char* its_end,
          int previous)
-      : plan(*regex.plan()),
+      : regex(its_regex),
+        plan(*regex.plan()),
         start_byte(regex.regstart),
         start(its_start),
         end(its_end),
@@ -137,11 +139,17 @@ class Search {
     return Run<true>(run).from(at);
   }
 
+  bool lacks_needed_byte() const {
+    const zxregexc::ByteSet needed = zxregexc::needed_set(regex);
+    return std::none_of(start, end, [&needed](char byte) {
+      return needed.has(static_cast<unsigned char>(byte));
+    });
+  }
+
   // The run goes on and remembers its failures, if there is room for them and
   // there is a byte that it must come upon.
   [[gnu::noinline]] Outcome go_on_remembering() {
-    is_hopeless = plan.must_set != k_no_set &&
-                  find_in(plan, plan.must_set, start, end) == end;
+    is_hopeless = lacks_needed_byte();
     if (is_hopeless) return Outcome::failed;
     if (memory.open(plan, start, end))
       return Run<true>(run).resume(run.left_at);
@@ -149,6 +157,7 @@ class Search {
     return run.resume(run.left_at);
   }
 
+  const zxRegex& regex;
   const zxRegexPlan& plan;
   const std::uint8_t start_byte;
   const char* const start;
