@@ -73,18 +73,6 @@ bool Body::passing[32768];
 
 }  // namespace
 
-EmptyPasses::EmptyPasses(Node begin, Node end) : program(begin) {
-  bool has_loops = false;
-  bool has_empty_counts = false;
-  for (Node node = begin; node < end; node = zxnode::following(node)) {
-    if (zxnode::is(node, zxNodeKind::back)) has_loops = true;
-    if (zxnode::info(node).operand == zxOperand::counts &&
-        zxnode::minimum(node) == 0)
-      has_empty_counts = true;
-  }
-  can_be = has_loops && has_empty_counts;
-}
-
 bool EmptyPasses::ends_star(Node back) const {
   if (!can_be) return false;
   const Node branch = zxnode::next(back);

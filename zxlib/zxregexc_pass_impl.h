@@ -14,8 +14,10 @@ namespace zxregexc {
 // The loops of one program.
 class EmptyPasses {
  public:
-  // The nodes from `begin` to `end`, which are read as they are asked about.
-  EmptyPasses(zxnode::Node begin, zxnode::Node end);
+  // The program that begins at that node.  `may_exist`: it has loops, and
+  // counted repetitions with a minimum of 0.
+  EmptyPasses(zxnode::Node begin, bool may_exist)
+      : program(begin), can_be(may_exist) {}
 
   // True if `back` ends the passes of an x* whose x can match empty.
   bool ends_star(zxnode::Node back) const;
@@ -27,7 +29,7 @@ class EmptyPasses {
   bool can_pass(zxnode::Node from, zxnode::Node to) const;
 
   zxnode::Node program;
-  bool can_be = false;  // there are loops and such repetitions
+  bool can_be;
 };
 
 }  // namespace zxregexc

@@ -25,7 +25,7 @@ class Planner {
       : regex(its_regex),
         plan(its_plan),
         steps(its_steps),
-        empty_passes(begin(), end()) {}
+        empty_passes(begin(), false) {}
 
   bool make() {
     number_steps();
@@ -99,10 +99,15 @@ class Planner {
   }
 
   void look_for_loops() {
+    bool has_empty_counts = false;
     for (Node node = begin(); node < end(); node = zxnode::following(node)) {
       if (zxnode::is(node, zxNodeKind::back)) has_loops = true;
       if (zxnode::is(node, zxNodeKind::backref)) has_references = true;
+      if (zxnode::info(node).operand == zxOperand::counts &&
+          zxnode::minimum(node) == 0)
+        has_empty_counts = true;
     }
+    empty_passes = EmptyPasses(begin(), has_loops && has_empty_counts);
   }
 
   // ---- filling steps
@@ -206,28 +211,28 @@ class Planner {
 
   // The steps of all alternatives that begin with this one.
   void make_choice(Node first) {
-    constexpr std::int32_t k_most_compared = 64;
-    zxQVA<Way> ways;
+    int count = 0;
     for (Node node = first; node != nullptr;
          node = zxnode::next_alternative(node)) {
       zxStep& step = steps[step_of(node)];
       make_branch(step, node);
-      ways.append({node, look_from(zxnode::operand(node), step)});
+      const Outlook look = look_from(zxnode::operand(node), step);
+      if (count < k_most_compared) ways[count] = {node, look};
+      ++count;
     }
-    if (ways.length() > k_most_compared) return;
-    for (std::int32_t i = 0; i < ways.length(); ++i)
-      if (is_only_way(ways, i))
-        steps[step_of(ways.get(i).node)].look_flags |= k_look_only;
+    if (count > k_most_compared) return;
+    for (const Way* way = ways; way != ways + count; ++way)
+      if (is_only_way(way, ways + count))
+        steps[step_of(way->node)].look_flags |= k_look_only;
   }
 
   // True if none of the later alternatives can go on where this one can.
-  static bool is_only_way(const zxQVA<Way>& ways, std::int32_t i) {
-    const auto excludes = [&way = ways.get(i)](const Way& other) {
-      return way.look.excludes(other.look) ||
-             are_different(zxnode::operand(way.node),
+  static bool is_only_way(const Way* way, const Way* ways_end) {
+    return std::all_of(way + 1, ways_end, [way](const Way& other) {
+      return way->look.excludes(other.look) ||
+             are_different(zxnode::operand(way->node),
                            zxnode::operand(other.node));
-    };
-    return std::all_of(ways.begin() + i + 1, ways.end(), excludes);
+    });
   }
 
   // True for literals of which neither begins with the other.
@@ -470,9 +475,14 @@ class Planner {
   bool has_empty_passes = false;
 
   static std::uint16_t step_at[32768];
+
+  // Alternatives of more than so many are not compared with one another.
+  static constexpr int k_most_compared = 64;
+  static Way ways[k_most_compared];
 };
 
 std::uint16_t Planner::step_at[32768];
+constinit Planner::Way Planner::ways[k_most_compared];
 
 // ----------------------------------------------------------------- block --
 
