@@ -139,11 +139,13 @@ class Search {
     return Run<true>(run).from(at);
   }
 
+  // All bytes means that none is known to be needed.
   bool lacks_needed_byte() const {
     const zxregexc::ByteSet needed = zxregexc::needed_set(regex);
-    return std::none_of(start, end, [&needed](char byte) {
-      return needed.has(static_cast<unsigned char>(byte));
-    });
+    return !(needed == zxregexc::k_all_bytes) &&
+           std::none_of(start, end, [&needed](char byte) {
+             return needed.has(static_cast<unsigned char>(byte));
+           });
   }
 
   // The run goes on and remembers its failures, if there is room for them and

@@ -1611,6 +1611,16 @@ ZX_CASE(runs_pathological_patterns) {
 }
 
 // In a process of its own, since without care the end would never come.
+// However often a run has gone back, an empty subject may still match.
+TEST(zxregexe, an_empty_subject_is_matched_behind_hundreds_of_tries) {
+  std::string ends = "$";
+  for (int i = 0; i < 300; ++i) ends += "|$";
+  EXPECT_EQ(search("{{" + ends + "}}a|", ""), "0-0");
+  EXPECT_EQ(search("^{{" + ends + "}}a|^", ""), "0-0");
+  EXPECT_EQ(search("{{{{" + ends + "}}a}}?", ""), "0-0");
+  EXPECT_EQ(search("{{" + ends + "}}a", ""), "no");
+}
+
 TEST(zxregexe, pathological_patterns_end_soon) {
   std::string expected;
   for (const char* pattern : k_pathological)
