@@ -565,15 +565,7 @@ bool parse_quantifier(Piece& piece) {
 // ---------------------------------------------------------------- groups --
 
 // The open groups, the whole pattern first.
-class GroupStack {
- public:
-  void push(const Group& group) { groups.append(group); }
-  void pop() { groups.drop_last(); }
-  Group& top() { return groups.last(); }
-
- private:
-  zxQVA<Group> groups;
-};
+using GroupStack = zxQVA<Group>;
 
 void start_branch(Group& group) {
   group.branch_flags = 0;
@@ -639,8 +631,8 @@ bool open_group(GroupStack& groups) {
   const bool plain = parser.sees('{');
   parser.at += plain ? 2 : 1;
   if (parser.group_count >= k_group_limit) return false;
-  groups.push(plain ? make_group(GroupKind::plain, 0)
-                    : make_group(GroupKind::capturing, parser.group_count++));
+  groups.append(plain ? make_group(GroupKind::plain, 0)
+                      : make_group(GroupKind::capturing, parser.group_count++));
   return true;
 }
 
@@ -673,20 +665,20 @@ bool finish_piece(Group& group, Piece piece) {
 bool parse_close(GroupStack& groups) {
   const bool plain = parser.sees('}');
   parser.at += plain ? 2 : 1;
-  const Group group = groups.top();
+  const Group group = groups.last();
   if (group.kind != (plain ? GroupKind::plain : GroupKind::capturing))
     return false;
   Piece piece;
   close_group(group, piece);
-  groups.pop();
-  return finish_piece(groups.top(), piece);
+  groups.drop_last();
+  return finish_piece(groups.last(), piece);
 }
 
 // One step of the parser inside an alternative.
 bool parse_piece(GroupStack& groups) {
   if (*parser.at == '(' || parser.sees_two('{')) return open_group(groups);
   Piece piece;
-  return parse_atom(piece) && finish_piece(groups.top(), piece);
+  return parse_atom(piece) && finish_piece(groups.last(), piece);
 }
 
 // regex: branch { | branch }
@@ -696,25 +688,25 @@ bool parse_piece(GroupStack& groups) {
 bool parse_regex() {
   GroupStack groups;
   emit(k_regex_magic);
-  groups.push(make_group(GroupKind::top, 0));
+  groups.append(make_group(GroupKind::top, 0));
   for (;;) {
     if (!is_at_branch_end()) {
       if (!parse_piece(groups)) return false;
       continue;
     }
-    end_branch(groups.top());
+    end_branch(groups.last());
     if (parser.sees('|')) {
       ++parser.at;
-      add_branch(groups.top());
+      add_branch(groups.last());
     } else if (parser.has_more()) {
       if (!parse_close(groups)) return false;
     } else {
       break;
     }
   }
-  if (groups.top().kind != GroupKind::top) return false;
+  if (groups.last().kind != GroupKind::top) return false;
   Piece whole;
-  close_group(groups.top(), whole);
+  close_group(groups.last(), whole);
   parser.flags = whole.flags;
   return true;
 }

@@ -379,7 +379,8 @@ inline constexpr std::uint8_t k_plan_skips_run = 4;
 inline constexpr std::uint8_t k_plan_fresh_tries = 8;
 
 // Makes the plan of a program and puts it behind it; returns the block, which
-// may have moved.  An opcode that does not exist fails an assertion.
+// may have moved.  An opcode that does not exist fails an assertion; null, and
+// the block is gone, if that was dropped.
 zxRegex* regex_plan(zxRegex* regex, int node_count);
 
 #endif  // ZXREGEXC_IMPL_H

@@ -157,6 +157,7 @@ class Planner {
         break;
       case zxNodeKind::back:
         step.kind = zxStepKind::check_pass;
+        has_empty_passes = true;
         step.other = step_of(zxnode::next(zxnode::next(node)));
         break;
       case zxNodeKind::backref:
@@ -344,53 +345,61 @@ class Planner {
     return sequence.last;
   }
 
+  // Adds the node, if it is one for sequences and there is room.
   bool add_to(Sequence& sequence, Node node) {
-    constexpr int k_most_bytes = 255;
-    constexpr int k_longest_literal = 8;
-    const zxStep& step = steps[step_of(node)];
+    if (!add_step(sequence, steps[step_of(node)])) return false;
+    ++sequence.nodes;
+    return true;
+  }
+
+  bool add_step(Sequence& sequence, const zxStep& step) {
     switch (step.kind) {
       case zxStepKind::byte:
-        if (sequence.bytes == k_most_bytes) return false;
-        add_test(sequence, {step.number, 0, 0});
-        break;
-      case zxStepKind::literal:
-        if (step.number > k_longest_literal ||
-            sequence.bytes + step.number > k_most_bytes)
-          return false;
-        for (int i = 0; i < step.number; ++i)
-          add_test(sequence, {regex.program()[step.place + i], 0, 0});
-        break;
+        return add_tests(sequence, {step.number, 0, 0}, 1);
       case zxStepKind::set:
-        if (sequence.bytes == k_most_bytes) return false;
-        add_test(sequence, {step.table, step.mask, 0});
-        break;
+        return add_tests(sequence, {step.table, step.mask, 0}, 1);
       case zxStepKind::any:
-        if (sequence.bytes == k_most_bytes) return false;
-        add_test(sequence, test_of(k_all_bytes));
-        break;
+        return add_tests(sequence, test_of(k_all_bytes), 1);
+      case zxStepKind::literal:
+        return add_word(sequence, step);
       case zxStepKind::repeat:
       case zxStepKind::repeat_greedy:
       case zxStepKind::repeat_lazy:
-        if (step.min != step.max || step.min > k_longest_literal ||
-            sequence.bytes + step.min > k_most_bytes)
-          return false;
-        for (int i = 0; i < step.min; ++i)
-          add_test(sequence, {step.table, step.mask, 0});
-        break;
+        return step.min == step.max &&
+               add_tests(sequence, {step.table, step.mask, 0}, step.min);
       case zxStepKind::open:
-        if (has_loops) return false;
-        [[fallthrough]];
+        return !has_loops && add_mark(sequence, step.number, false);
       case zxStepKind::close:
-        if (marks.length() - sequence.first_mark == k_most_bytes) return false;
-        marks.append(
-            {step.number, static_cast<std::uint8_t>(sequence.bytes),
-             static_cast<std::uint8_t>(step.kind == zxStepKind::close ? 1 : 0),
-             0});
-        break;
+        return add_mark(sequence, step.number, true);
       default:
         return false;
     }
-    ++sequence.nodes;
+  }
+
+  static bool has_room(const Sequence& sequence, int bytes) {
+    constexpr int k_most_bytes = 255;
+    constexpr int k_most_of_node = 8;
+    return bytes <= k_most_of_node && sequence.bytes + bytes <= k_most_bytes;
+  }
+
+  bool add_tests(Sequence& sequence, const zxByteTest& test, int count) {
+    if (!has_room(sequence, count)) return false;
+    for (int i = 0; i < count; ++i) tests.append(test);
+    sequence.bytes += count;
+    return true;
+  }
+
+  bool add_word(Sequence& sequence, const zxStep& step) {
+    if (!has_room(sequence, step.number)) return false;
+    for (int i = 0; i < step.number; ++i)
+      add_tests(sequence, {regex.program()[step.place + i], 0, 0}, 1);
+    return true;
+  }
+
+  // There are no more marks than groups open and close.
+  bool add_mark(const Sequence& sequence, std::uint8_t group, bool closes) {
+    marks.append({group, static_cast<std::uint8_t>(sequence.bytes),
+                  static_cast<std::uint8_t>(closes ? 1 : 0), 0});
     return true;
   }
 
@@ -398,11 +407,6 @@ class Planner {
     zxByteTest test{};
     use_set(set, test.table, test.mask);
     return test;
-  }
-
-  void add_test(Sequence& sequence, const zxByteTest& test) {
-    tests.append(test);
-    ++sequence.bytes;
   }
 
   // ---- sets
@@ -428,19 +432,12 @@ class Planner {
     plan.set_count = static_cast<std::uint16_t>(sets.length());
     plan.test_count = static_cast<std::uint16_t>(tests.length());
     plan.mark_count = static_cast<std::uint16_t>(marks.length());
-    has_empty_passes |= has_empty_stars();
     // Whether a pass is empty is seen by the choice that is left behind.
     if ((regex.reganch != 0 || start.is_free) && !has_empty_passes)
       plan.choice_bits |= k_plan_fresh_tries;
     if (!has_references && !has_empty_passes)
       plan.choice_bits |= k_plan_remembers;
     if (!has_references) plan.choice_bits |= bits_of_first_repeat();
-  }
-
-  bool has_empty_stars() const {
-    return std::any_of(steps, steps + plan.step_count, [](const zxStep& step) {
-      return step.kind == zxStepKind::check_pass;
-    });
   }
 
   const zxStep* first_after_opening() const {
@@ -538,7 +535,10 @@ zxRegex* regex_plan(zxRegex* regex, int node_count) {
   auto* plan = const_cast<zxRegexPlan*>(regex->plan());
   *plan = zxRegexPlan{};
   Planner planner(*regex, *plan, const_cast<zxStep*>(plan->steps()));
-  if (!planner.make()) return regex;
+  if (!planner.make()) {
+    zx_realloc(regex, 0);
+    return nullptr;
+  }
   const std::size_t sets_end = sizeof(zxRegexPlan) +
                                plan->step_count * sizeof(zxStep) +
                                plan->set_count * sizeof(zxByteRanges) +

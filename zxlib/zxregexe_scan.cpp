@@ -67,52 +67,37 @@ class ByteScan {
   const zxByteRanges& its_ranges;
 };
 
-// The first of the blocks of 16 from `at` to `end` in which a byte has the
-// membership that is `wanted`: that byte; else where the last block ends.
-template <bool wanted, int count>
-const char* find_in_blocks(const zxByteRanges& ranges, const char* at,
-                           const char* end) {
-  const RangeTest<count> test(ranges);
-  for (; end - at >= k_block; at += k_block) {
-    const unsigned hits = wanted ? test(at) : test(at) ^ 0xFFFF;
-    if (hits != 0) return at + std::countr_zero(hits);
-  }
-  return at;
-}
-
-template <bool wanted>
-const char* find_in_blocks(const zxByteRanges& ranges, const char* at,
-                           const char* end) {
+// Calls `find` with the test of the set; `otherwise`, if it has no ranges or
+// too many.
+template <class Find>
+const char* with_test(const zxByteRanges& ranges, const char* otherwise,
+                      Find find) {
   switch (ranges.count) {
     case 1:
-      return find_in_blocks<wanted, 1>(ranges, at, end);
+      return find(RangeTest<1>(ranges));
     case 2:
-      return find_in_blocks<wanted, 2>(ranges, at, end);
+      return find(RangeTest<2>(ranges));
     case 3:
-      return find_in_blocks<wanted, 3>(ranges, at, end);
+      return find(RangeTest<3>(ranges));
     default:
-      return at;
+      return otherwise;
   }
 }
 
-// The first byte whose membership is `wanted`.
+// The first byte whose membership is `wanted`: in blocks of 16 as far as they
+// go, then one by one.
 template <bool wanted>
 const char* find(const ByteScan& set, const char* at, const char* end) {
-  at = find_in_blocks<wanted>(set.ranges(), at, end);
+  at = with_test(set.ranges(), at, [at, end](const auto& test) {
+    const char* block = at;
+    for (; end - block >= k_block; block += k_block) {
+      const unsigned hits = wanted ? test(block) : test(block) ^ 0xFFFF;
+      if (hits != 0) return block + std::countr_zero(hits);
+    }
+    return block;
+  });
   while (at < end && set.has(*at) != wanted) ++at;
   return at;
-}
-
-// The same from the end: the byte, or where the first block begins.
-template <int count>
-const char* find_last_in_blocks(const zxByteRanges& ranges, const char* at,
-                                const char* end) {
-  const RangeTest<count> test(ranges);
-  for (; end - at >= k_block; end -= k_block) {
-    const unsigned hits = test(end - k_block);
-    if (hits != 0) return end - k_block + std::bit_width(hits);
-  }
-  return end;
 }
 
 }  // namespace
@@ -130,13 +115,14 @@ const char* find_not_in(const zxRegexPlan& plan, unsigned set, const char* at,
 const char* find_last_in(const zxRegexPlan& plan, unsigned number,
                          const char* at, const char* end) {
   const ByteScan set(plan, number);
-  const zxByteRanges& ranges = set.ranges();
-  if (ranges.count == 1)
-    end = find_last_in_blocks<1>(ranges, at, end);
-  else if (ranges.count == 2)
-    end = find_last_in_blocks<2>(ranges, at, end);
-  else if (ranges.count == 3)
-    end = find_last_in_blocks<3>(ranges, at, end);
+  end = with_test(set.ranges(), end, [at, end](const auto& test) {
+    const char* block = end;
+    for (; block - at >= k_block; block -= k_block) {
+      const unsigned hits = test(block - k_block);
+      if (hits != 0) return block - k_block + std::bit_width(hits);
+    }
+    return block;
+  });
   while (end > at)
     if (set.has(*--end)) return end;
   return nullptr;

@@ -46,10 +46,7 @@ struct TextSlot {
 constexpr std::size_t k_text_slots = 256;
 
 std::size_t text_number(const char* text, std::int32_t length) {
-  std::uint32_t hash = 2166136261U;
-  for (std::int32_t i = 0; i < length; ++i)
-    hash = (hash ^ static_cast<unsigned char>(text[i])) * 16777619U;
-  return (hash ^ (hash >> 16)) % k_text_slots;
+  return crc16(text, zx_size(length)) % k_text_slots;
 }
 
 struct Cache {
@@ -78,7 +75,6 @@ zxRegex* put(AddressSlot& slot, const char* address, zxRegex* regex) {
 }
 
 zxRegex* compile(const char* pattern, std::int32_t length) {
-  ++cache.counts.misses;
   flush_at_exit();
   return regcomp(pattern, pattern + length);
 }
@@ -87,10 +83,7 @@ zxRegex* compile(const char* pattern, std::int32_t length) {
 zxRegex* known_regex(const char* text, std::int32_t length) {
   TextSlot& slot = cache.by_text[text_number(text, length)];
   const std::string_view wanted(text, zx_size(length));
-  if (slot.regex != nullptr && slot.text.view() == wanted) {
-    ++cache.counts.misses;
-    return slot.regex;
-  }
+  if (slot.regex != nullptr && slot.text.view() == wanted) return slot.regex;
   zxRegex* regex = compile(text, length);
   if (regex == nullptr) return nullptr;
   let_go(slot.regex);
@@ -157,6 +150,7 @@ bool match_buf_with(const zxRegex* regex, const char* start, const char* end) {
 
 const zxRegex* zxstrm::regex_of(const zxStr& pattern) {
   forget(pattern.c_str());
+  ++cache.counts.misses;
   zxRegex* regex = known_regex(pattern.c_str(), pattern.length());
   if (regex == nullptr) return nullptr;
   return put(slot_of(pattern.c_str()), pattern.c_str(), shared(regex));
@@ -267,6 +261,7 @@ const zxRegex* get_regex(const char* pattern, std::int32_t length) {
     ++cache.counts.hits;
     return slot.regex;
   }
+  ++cache.counts.misses;
   if (length < 0) length = zx_count(std::strlen(pattern));
   zxRegex* regex = compile(pattern, length);
   return regex == nullptr ? nullptr : put(slot, pattern, regex);
@@ -279,13 +274,14 @@ void forget(const char* pattern) {
 
 void flush_regex_cache() {
   ++cache.counts.flushes;
+  clear_match();
+  cache.subject.clear();
+  if (!cache.is_flushed_at_exit) return;  // nothing has been compiled
   for (AddressSlot& slot : cache.by_address) put(slot, nullptr, nullptr);
   for (TextSlot& slot : cache.by_text) {
     let_go(slot.regex);
     slot.text.clear();
   }
-  clear_match();
-  cache.subject.clear();
 }
 
 const zxRegexCounts& regex_counts() { return cache.counts; }
