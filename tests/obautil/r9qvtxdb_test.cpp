@@ -16,6 +16,7 @@
 #include "kit/failure.h"
 #include "kit/faults.h"
 #include "kit/tempdir.h"
+#include "kit/text.h"
 #include "obautil/table_bytes.h"
 
 namespace {
@@ -32,7 +33,7 @@ constexpr char k_d4w_bin[] = "D4WVTX.BIN";
 constexpr char k_r9q_idx[] = "R9QVTX.IDX";
 constexpr char k_r9q_bin[] = "R9QVTX.BIN";
 
-zxStr str(const std::string& text) { return zxStr(std::string_view(text)); }
+using kit::str;
 std::string std_str(const zxStr& text) { return std::string(text.view()); }
 
 std::string bytes_of(const VtxRecord& record) {

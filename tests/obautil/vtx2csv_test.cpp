@@ -16,6 +16,7 @@
 
 #include "kit/failure.h"
 #include "kit/tempdir.h"
+#include "kit/text.h"
 #include "obautil/table_bytes.h"
 
 namespace {
@@ -23,7 +24,7 @@ namespace {
 using namespace std::string_literals;
 using table_bytes::Record;
 
-zxStr str(std::string_view text) { return zxStr(text); }
+using kit::str;
 
 VtxRecord record_of(const Record& record) {
   VtxRecord result;

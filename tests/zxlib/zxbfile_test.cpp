@@ -28,6 +28,7 @@
 #include "kit/faults.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
+#include "kit/text.h"
 #include "zxmainf.h"
 
 namespace {
@@ -61,7 +62,7 @@ void expect_failure_with_details(
 
 std::string quoted(const std::string& text) { return "'" + text + "'"; }
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
+using kit::text_of;
 
 // A folder with a file of ten bytes.
 class zxbfile : public testing::Test {

@@ -22,6 +22,7 @@
 #include "kit/process.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
+#include "kit/text.h"
 #include "zxnextf.h"
 #include "zxplat.h"
 
@@ -45,7 +46,7 @@ constexpr std::int32_t k_untouched = -77;
 
 // ---------------------------------------------------------------- helpers --
 
-zxStr str(const std::string& text) { return zxStr(std::string_view(text)); }
+using kit::str;
 
 bool holds(const std::string& name, const char* tests) {
   return isfile(str(name), tests);

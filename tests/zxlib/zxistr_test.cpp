@@ -15,6 +15,7 @@
 #include <vector>
 
 #include "kit/failure.h"
+#include "kit/text.h"
 #include "zxguid.h"
 
 namespace {
@@ -25,7 +26,7 @@ constexpr zxGuid k_other_guid = {
     0x4A00,
     {0xB5, 0xD6, 0xD3, 0xE2, 0x55, 0xBE, 0x55, 0xB6}};
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
+using kit::text_of;
 
 std::string text_of(IZxStr* object) {
   return std::string(object->data(), zx_size(object->length()));

@@ -22,6 +22,7 @@
 #include "kit/faults.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
+#include "kit/text.h"
 #include "kit/ticks.h"
 #include "zxmainf.h"
 #include "zxplat.h"
@@ -44,9 +45,8 @@ using Names = std::vector<std::string>;
 
 // ---------------------------------------------------------------- helpers --
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
-
-zxStr str(std::string_view text) { return zxStr(text); }
+using kit::str;
+using kit::text_of;
 
 std::string lower(std::string text) {
   for (char& c : text)

@@ -19,6 +19,7 @@
 
 #include "hebrew_model.h"
 #include "kit/failure.h"
+#include "kit/text.h"
 
 namespace {
 
@@ -46,7 +47,7 @@ std::string spelled(std::string_view text, int alef) {
 std::string dos(std::string_view text) { return spelled(text, 128); }
 std::string ansi(std::string_view text) { return spelled(text, 224); }
 
-zxStr str(const std::string& text) { return zxStr(std::string_view(text)); }
+using kit::str;
 std::string std_str(const zxStr& text) { return std::string(text.view()); }
 
 std::string shown_byte(unsigned char value, int alef) {

@@ -23,6 +23,7 @@
 #include "kit/cases.h"
 #include "kit/failure.h"
 #include "kit/tempdir.h"
+#include "kit/text.h"
 #include "zxmainf.h"
 
 namespace {
@@ -31,7 +32,7 @@ using kit::read_file;
 using kit::TempDir;
 using namespace std::string_literals;
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
+using kit::text_of;
 
 std::string number_text(double number) {
   zxStr text;

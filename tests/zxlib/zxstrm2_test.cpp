@@ -11,6 +11,7 @@
 #include <climits>
 #include <cstdint>
 #include <functional>
+#include <initializer_list>
 #include <ostream>
 #include <random>
 #include <string>
@@ -18,6 +19,7 @@
 #include <vector>
 
 #include "kit/failure.h"
+#include "kit/text.h"
 
 namespace {
 
@@ -25,11 +27,11 @@ using namespace std::string_literals;
 using namespace std::string_view_literals;
 using Texts = std::vector<std::string>;
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
+using kit::text_of;
 
 std::string group(std::int32_t n) { return text_of(group_text(n)); }
 
-zxStr str(std::string_view text) { return zxStr(text); }
+using kit::str;
 
 // All matches replaced; texts are taken by contents.
 std::string replaced(std::string_view subject, std::string_view pattern,
@@ -38,6 +40,19 @@ std::string replaced(std::string_view subject, std::string_view pattern,
   const bool any = replace_all(text, str(pattern), str(replacement));
   EXPECT_EQ(any, match(str(subject), str(pattern)));
   return text_of(text);
+}
+
+struct ReplacedRow {
+  std::string_view pattern;
+  std::string_view subject;
+  std::string_view replacement;
+  std::string_view result;
+};
+
+void expect_replaced(std::initializer_list<ReplacedRow> rows) {
+  for (const ReplacedRow& row : rows)
+    EXPECT_EQ(replaced(row.subject, row.pattern, row.replacement), row.result)
+        << row.pattern << " on " << row.subject << " by " << row.replacement;
 }
 
 // What replace_n made of a subject, and its result.
@@ -103,12 +118,7 @@ TEST(zxstrm2, a_replacement_is_text_with_escapes) {
 }
 
 TEST(zxstrm2, a_digit_stands_for_a_group) {
-  const struct {
-    std::string_view pattern;
-    std::string_view subject;
-    std::string_view replacement;
-    std::string_view result;
-  } rows[] = {
+  expect_replaced({
       {"b", "abc", "[`0]", "a[b]c"},
       {"b", "abc", "[\\0]", "a[b]c"},
       {"(a)(b)", "-ab-", "`2`1", "-ba-"},
@@ -130,10 +140,7 @@ TEST(zxstrm2, a_digit_stands_for_a_group) {
       {"()b", "ab", "<`1>", "a<>"},
       // What a group holds is not read again.
       {"(.)", "`0|", "`1`1", "``00||"},
-  };
-  for (const auto& row : rows)
-    EXPECT_EQ(replaced(row.subject, row.pattern, row.replacement), row.result)
-        << row.pattern << " by " << row.replacement;
+  });
 }
 
 TEST(zxstrm2, a_replacement_is_read_within_its_length) {
@@ -157,12 +164,7 @@ TEST(zxstrm2, a_replacement_is_read_within_its_length) {
 }
 
 TEST(zxstrm2, a_bar_separates_alternatives) {
-  const struct {
-    std::string_view pattern;
-    std::string_view subject;
-    std::string_view replacement;
-    std::string_view result;
-  } rows[] = {
+  expect_replaced({
       {"a|b", "a", "one|two", "one"},
       {"a|b", "b", "one|two", "two"},
       {"a|b", "-a-b-", "one|two", "-one-two-"},
@@ -194,21 +196,13 @@ TEST(zxstrm2, a_bar_separates_alternatives) {
       {"(colou?r)", "color", "x|y", "x|y"},
       {"a*b{1,2}", "ab", "x|y", "x|y"},
       {"", "a", "|", "|a"},
-  };
-  for (const auto& row : rows)
-    EXPECT_EQ(replaced(row.subject, row.pattern, row.replacement), row.result)
-        << row.pattern << " on " << row.subject << " by " << row.replacement;
+  });
 }
 
 // ------------------------------------------------------ how the search goes
 
 TEST(zxstrm2, all_matches_are_replaced_from_left_to_right) {
-  const struct {
-    std::string_view pattern;
-    std::string_view subject;
-    std::string_view replacement;
-    std::string_view result;
-  } rows[] = {
+  expect_replaced({
       {"b", "abcabc", "", "acac"},
       {"b", "abcabc", "XYZ", "aXYZcaXYZc"},
       {"aa", "aaaaa", "x", "xxa"},
@@ -251,10 +245,7 @@ TEST(zxstrm2, all_matches_are_replaced_from_left_to_right) {
       {"`b", "ab cd", "-", "-ab- -cd-"},
       {"`b`w", "ab cd", "x", "xb xd"},
       {"`B", "ab", "-", "a-b"},
-  };
-  for (const auto& row : rows)
-    EXPECT_EQ(replaced(row.subject, row.pattern, row.replacement), row.result)
-        << row.pattern << " on " << row.subject << " by " << row.replacement;
+  });
 }
 
 TEST(zxstrm2, the_count_limits_the_searches) {

@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "kit/pages.h"
+#include "kit/text.h"
 #include "zxstrm.h"
 #include "zxstrm2.h"
 
@@ -117,9 +118,8 @@ std::string text_of(const std::string& cell) {
   return texts.empty() ? "" : texts[0];
 }
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
-
-zxStr str(std::string_view text) { return zxStr(text); }
+using kit::str;
+using kit::text_of;
 
 std::int32_t number_in(const std::string& column) {
   return std::stoi(column.substr(column.find(' ')));

@@ -21,6 +21,7 @@
 #include "kit/failure.h"
 #include "kit/failure_road.h"
 #include "kit/tempdir.h"
+#include "kit/text.h"
 
 namespace {
 
@@ -28,13 +29,13 @@ using namespace std::string_literals;
 using namespace std::string_view_literals;
 using Texts = std::vector<std::string>;
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
+using kit::text_of;
 
 std::string group(std::int32_t n) { return text_of(group_text(n)); }
 
 std::string field(std::int32_t n) { return text_of(field_text(n)); }
 
-zxStr str(std::string_view text) { return zxStr(text); }
+using kit::str;
 
 // The text of the whole match, or "none"; the pattern is taken by contents.
 std::string found(std::string_view subject, std::string_view pattern) {

@@ -26,6 +26,7 @@
 #include "kit/process.h"
 #include "kit/target.h"
 #include "kit/tempdir.h"
+#include "kit/text.h"
 #include "kit/ticks.h"
 #include "zxmainf.h"
 #include "zxplat.h"
@@ -49,7 +50,7 @@ using kit::WorkingIn;
 using kit::write_file;
 using Names = std::vector<std::string>;
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
+using kit::text_of;
 
 std::string quoted(const std::string& text) { return "'" + text + "'"; }
 

@@ -22,6 +22,7 @@
 #include "kit/cases.h"
 #include "kit/failure.h"
 #include "kit/target.h"
+#include "kit/text.h"
 #include "zones.h"
 #include "zxplat.h"
 
@@ -43,7 +44,7 @@ constexpr std::int32_t k_seconds[] = {
 
 zxTime time_of(std::int32_t seconds) { return zxTime::from_stored(seconds); }
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
+using kit::text_of;
 
 struct Fields {
   std::int32_t year = -1;

@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "kit/cases.h"
+#include "kit/text.h"
 #include "zxmainf.h"
 #include "zxplat.h"
 #include "zxsfmt.h"
@@ -23,7 +24,7 @@ namespace {
 using Words = std::vector<std::string>;
 using Options = std::map<std::string, std::string>;
 
-std::string text_of(const zxStr& text) { return std::string(text.view()); }
+using kit::text_of;
 
 zxStr string_of(const std::string& text) {
   return zxStr(std::string_view(text));
