@@ -206,7 +206,7 @@ class Planner {
 
   // What is known of an alternative.
   struct Way {
-    Node node;
+    Node node = nullptr;
     Outlook look;
   };
 
