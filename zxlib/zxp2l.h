@@ -43,6 +43,13 @@ zxStr phys_from_logical_lines(const zxStr& text, bool rtl);
 void dos_to_ansi(zxStr& text);
 void ansi_to_dos(zxStr& text);
 
+// Text of code page 862 or 1255 as Unicode, in units of 16 bits of which the
+// low byte comes first.  A byte below 128 is the unit of that value, and any
+// other that which stands as far from alef as the byte from alef's; units
+// behind tav are dropped, the marks among them.
+zxStr dos_to_utf16(const zxStr& text);
+zxStr ansi_to_utf16(const zxStr& text);
+
 // Text of code page 1255 in UTF-8.  Bytes above the last Hebrew letter, the
 // marks among them, are dropped; those from 128 to 223 come out as the code
 // points as far below alef as they stand below its byte.

@@ -308,6 +308,15 @@ struct ProcessCalls {
 
   // Stops in the debugger if one is attached.
   void (*debug_break)();
+
+  // Hands a text to the debugger.  If the environment variable ZX_DEBUG_OUT
+  // names a file or is "-" (standard error), it is added there as well; a
+  // system without debugger output has no other place for it.
+  void (*debug_output)(const char* text);
+
+  // True on Windows 95 (platform 1, version 4.0), whose screens lay out
+  // percent signs in Hebrew text in a way of their own.
+  bool (*is_windows_95)();
 };
 
 extern const ProcessCalls system_process;
@@ -318,6 +327,10 @@ extern ProcessCalls process;
 // that the process was started without is bound to the null device, so that
 // no data file can come to stand under its number.
 void prepare_process();
+
+// The value of an environment variable, which lasts until the environment
+// changes; null if there is none of that name.
+const char* environment_variable(const char* name);
 
 // Switches a descriptor to bytes without translation; false if that fails.
 bool set_binary(Fd fd);

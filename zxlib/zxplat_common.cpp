@@ -26,10 +26,28 @@ bool is_null_device(std::string_view name) {
          (name[1] | 0x20) == 'u' && (name[2] | 0x20) == 'l';
 }
 
+const char* environment_variable(const char* name) { return std::getenv(name); }
+
 }  // namespace zxplat
 
 namespace zxplat::common {
 namespace {
+
+// Adds a text to the file that an environment variable names; "-" is
+// standard error.  False if it names no place that can be written to.
+bool divert_by(const char* variable, std::string_view text) {
+  const char* place = std::getenv(variable);
+  if (place == nullptr || *place == '\0') return false;
+  if (std::string_view(place) == "-") {
+    write_to_standard_error(text);
+    return true;
+  }
+  const Fd fd = files.open(place, OpenMode::append);
+  if (fd == k_no_fd) return false;
+  write_all(fd, text);
+  files.close(fd);
+  return true;
+}
 
 // "0x" and at least four digits, as styles are usually written.
 std::string_view in_hexadecimal(std::uint32_t number, char (&room)[10]) {
@@ -64,18 +82,10 @@ void write_to_standard_error(std::string_view text) {
   write_all(k_stderr_fd, text);
 }
 
-bool divert_box(std::string_view text) {
-  const char* place = std::getenv("ZX_BOX_OUT");
-  if (place == nullptr || *place == '\0') return false;
-  if (std::string_view(place) == "-") {
-    write_to_standard_error(text);
-    return true;
-  }
-  const Fd fd = files.open(place, OpenMode::append);
-  if (fd == k_no_fd) return false;
-  write_all(fd, text);
-  files.close(fd);
-  return true;
+bool divert_box(std::string_view text) { return divert_by("ZX_BOX_OUT", text); }
+
+bool divert_debug_output(std::string_view text) {
+  return divert_by("ZX_DEBUG_OUT", text);
 }
 
 }  // namespace zxplat::common

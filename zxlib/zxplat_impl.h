@@ -13,6 +13,9 @@ namespace zxplat::common {
 // the environment variable ZX_BOX_OUT names.  False if it names none.
 bool divert_box(std::string_view text);
 
+// The same for the debugger's texts and ZX_DEBUG_OUT.
+bool divert_debug_output(std::string_view text);
+
 // The caption, the style and the text, each with a line feed behind it, as
 // they go to such a place.
 class BoxText {

@@ -64,10 +64,17 @@ void write_last_words(const char* text) {
   if (!common::divert_box(text)) common::write_to_standard_error(text);
 }
 
-constexpr ProcessCalls k_calls = {end_process,      end_process_at_once,
-                                  wall_clock,       uptime,
-                                  pause_for,        write_box,
-                                  write_last_words, posix::break_into_debugger};
+// Debuggers have no ear for texts here.
+void write_debug_output(const char* text) { common::divert_debug_output(text); }
+
+bool is_windows_95() { return false; }
+
+constexpr ProcessCalls k_calls = {
+    end_process,        end_process_at_once,
+    wall_clock,         uptime,
+    pause_for,          write_box,
+    write_last_words,   posix::break_into_debugger,
+    write_debug_output, is_windows_95};
 
 bool is_open(Fd fd) { return ::fcntl(fd, F_GETFD) != -1; }
 

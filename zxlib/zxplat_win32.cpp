@@ -123,10 +123,23 @@ void say_last_words(const char* text) {
   if (!common::divert_box(text)) ::FatalAppExitA(0, text);
 }
 
-constexpr ProcessCalls k_calls = {end_process,    end_process_at_once,
-                                  wall_clock,     uptime,
-                                  pause_for,      show_box,
-                                  say_last_words, win32::break_into_debugger};
+void show_in_debugger(const char* text) {
+  common::divert_debug_output(text);
+  ::OutputDebugStringA(text);
+}
+
+// The low word of the version is the major number and, above it, the minor
+// one; the highest bit tells the platform, 1 or 2.
+bool is_windows_95() {
+  const DWORD version = ::GetVersion();
+  return (version & 0x8000FFFF) == 0x80000004;
+}
+
+constexpr ProcessCalls k_calls = {end_process,      end_process_at_once,
+                                  wall_clock,       uptime,
+                                  pause_for,        show_box,
+                                  say_last_words,   win32::break_into_debugger,
+                                  show_in_debugger, is_windows_95};
 
 // The runtime's answer for a standard stream without anything behind it is
 // either of two negative numbers.

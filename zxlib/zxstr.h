@@ -1,6 +1,6 @@
 // zxstr.h - zxStr, the library's string: a byte text with shared
 // representation and copy on write; zxIStr, its form with room inside the
-// object; the checksum of 16 bits.
+// object; the checksums of 16 and of 32 bits.
 //
 // Differences from std::string:
 //   - copying and passing by value costs a count, not a copy; the characters
@@ -310,5 +310,13 @@ void fatal_exit(const zxStr& text);
 // and reaches disk: it never changes.
 std::uint16_t crc16(const void* bytes, std::size_t size);
 std::uint16_t crc16_add(std::uint16_t crc, const void* bytes, std::size_t size);
+
+// The checksum of 32 bits: the polynomial 0xEDB88320, the lowest bit first,
+// from 0xFFFFFFFF on, and no final inversion, so that the result is the
+// complement of what others call the CRC-32.  crc32_add() goes on from an
+// earlier result, crc32_byte() by a single byte.
+std::uint32_t crc32(const void* bytes, std::size_t size);
+std::uint32_t crc32_add(std::uint32_t crc, const void* bytes, std::size_t size);
+std::uint32_t crc32_byte(std::uint32_t crc, std::uint8_t byte);
 
 #endif  // ZXSTR_H
