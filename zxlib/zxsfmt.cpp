@@ -101,7 +101,7 @@ bool Composer::run() {
   for (;;) {
     const char* const plain = at;
     at = skip_plain(at);
-    if (at != plain) out.append(plain, zx_count(zx_distance(plain, at)));
+    append_view(out, {plain, zx_distance(plain, at)});
     if (*at == '\0') return left == 0;
     if (*at == '\n') {
       out.append("\r\n", 2);
@@ -258,6 +258,14 @@ zxFmtEnv& environment(Entry entry) {
 
 // ---- default forms
 
+// As in "\xc8".
+static void append_byte(zxStr& out, std::uint8_t byte) {
+  constexpr std::string_view k_digits = "0123456789abcdef";
+  out.append("\\x", 2);
+  if (byte >= 16) out.append(k_digits[byte >> 4]);
+  out.append(k_digits[byte & 0xF]);
+}
+
 void append_default_form(zxStr& out, const zxFmtArg& arg) {
   switch (arg.tag) {
     case 'i':
@@ -270,16 +278,14 @@ void append_default_form(zxStr& out, const zxFmtArg& arg) {
       out.append(static_cast<char>(arg.number));
       return;
     case 'b':
-      out.append("\\x", 2);
-      return append_whole(out, arg.word, 16);
+      return append_byte(out, static_cast<std::uint8_t>(arg.word));
     case zxFmtArg::k_bool:
       out.append(arg.word != 0 ? "true" : "false");
       return;
     case 'f':
       return append_number(out, arg.real);
     case 'z':
-      out.append(static_cast<const char*>(arg.pointer));
-      return;
+      return append_view(out, static_cast<const char*>(arg.pointer));
     case 's':
     case zxFmtArg::k_text:
       out.append(pointee<zxStr>(arg));

@@ -11,11 +11,6 @@
 namespace zxsfmt_detail {
 namespace {
 
-// A view of nothing may have no place either.
-void append_view(zxStr& out, std::string_view text) {
-  if (!text.empty()) out.append(text.data(), zx_count(text.size()));
-}
-
 // ---- fields of limited length
 
 // What stands between "%" and the letter, as it counts for all outputs but
@@ -62,12 +57,17 @@ bool append_field(zxStr& out, const Form& form, std::string_view prefix,
   const std::int64_t total =
       std::max<std::int64_t>(length, form.measures.width);
   if (!ZX_ASSERT(total < k_field_limit)) return false;
-  const std::int64_t blanks = total - length;
-  if (!form.left) append_times(out, ' ', blanks);
-  append_view(out, prefix);
-  append_times(out, '0', zeros);
-  append_view(out, body);
-  if (form.left) append_times(out, ' ', blanks);
+  char* const start = out.tail(static_cast<std::int32_t>(total));
+  if (start == nullptr) return false;
+  const auto blanks = static_cast<std::size_t>(total - length);
+  char* to = start;
+  if (!form.left) to = std::fill_n(to, blanks, ' ');
+  to = std::copy_n(prefix.data(), prefix.size(), to);
+  to = std::fill_n(to, zeros, '0');
+  zx_copy(to, body.data(), body.size());
+  to += body.size();
+  if (form.left) std::fill_n(to, blanks, ' ');
+  out.extend(static_cast<std::int32_t>(total));
   return true;
 }
 
@@ -395,11 +395,14 @@ bool append_directive(zxStr& out, const Directive& directive,
 
 // ---- pieces
 
-void append_whole(zxStr& out, std::int64_t number, int base) {
-  char digits[24];
-  const char* const end =
-      std::to_chars(digits, digits + sizeof digits, number, base).ptr;
-  out.append(digits, zx_count(zx_distance(digits, end)));
+void append_whole(zxStr& out, std::int64_t number) {
+  constexpr std::int32_t k_room = 21;
+  char* const start = out.tail(k_room);
+  if (start == nullptr) return;
+  char* end = start;
+  if (number < 0) *end++ = '-';
+  end = write_whole(end, static_cast<std::uint64_t>(std::abs(number)));
+  out.extend(static_cast<std::int32_t>(end - start));
 }
 
 void append_address(zxStr& out, const void* address) {
@@ -412,10 +415,11 @@ void append_times(zxStr& out, char byte, std::int64_t n) {
   if (n <= 0) return;
   const std::int64_t length = out.length() + n;
   if (!ZX_ASSERT(length <= INT32_MAX)) return;
-  const std::int32_t start = out.length();
-  char* const bytes = out.buffer(static_cast<std::int32_t>(length));
-  if (bytes != nullptr)
-    std::memset(bytes + start, byte, static_cast<std::size_t>(n));
+  const auto count = static_cast<std::int32_t>(n);
+  char* const to = out.tail(count);
+  if (to == nullptr) return;
+  std::memset(to, byte, zx_size(count));
+  out.extend(count);
 }
 
 std::int32_t read_digits(std::string_view& text) {

@@ -18,6 +18,9 @@ namespace zxsfmt_detail {
 // negative; exact ties go away from zero; exponents have three digits at
 // least.  Each writes to `out` and returns the end of the text.
 
+// A whole number; it takes up to 20 bytes.
+char* write_whole(char* out, std::uint64_t number);
+
 // "%.*f".  It takes up to fixed_room() bytes.
 char* write_fixed(char* out, double number, std::int32_t precision);
 std::size_t fixed_room(double number, std::int32_t precision);
@@ -102,7 +105,15 @@ inline std::size_t zx_distance(const char* from, const char* to) {
   return static_cast<std::size_t>(to - from);
 }
 
-void append_whole(zxStr& out, std::int64_t number, int base = 10);
+// Appends a text; an empty one may have no place.
+inline void append_view(zxStr& out, std::string_view text) {
+  char* const to = out.tail(zx_count(text.size()));
+  if (to == nullptr) return;
+  zx_copy(to, text.data(), text.size());
+  out.extend(static_cast<std::int32_t>(text.size()));
+}
+
+void append_whole(zxStr& out, std::int64_t number);
 
 // Hexadecimal digits, as many as an address can have.
 void append_address(zxStr& out, const void* address);

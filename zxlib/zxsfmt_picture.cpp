@@ -335,7 +335,7 @@ bool append_number(zxStr& out, double number, std::string_view pattern,
   }
   Text text(bytes);
   picture.write(text);
-  out.append(bytes, text.length());
+  append_view(out, text.view());
   return true;
 }
 
