@@ -434,14 +434,10 @@ char* write_whole(char* out, std::uint64_t number) {
   return put_digits(out, word, digit_count(word));
 }
 
-}  // namespace zxsfmt_detail
-
-void append_number(zxStr& out, double number) {
-  using namespace zxsfmt_detail;
-  constexpr std::int32_t k_room = 32;
-  char* const start = out.tail(k_room);
-  if (start == nullptr) return;
-  char* end = start;
+void append_number(Output& out, double number) {
+  constexpr std::int64_t k_room = 32;
+  char* end = out.room(k_room);
+  if (end == nullptr) return;
   if (std::isnan(number)) {
     end = copy(end, "nan", 3);
   } else {
@@ -454,5 +450,12 @@ void append_number(zxStr& out, double number) {
     else
       end = write_general(end, number, k_default_digits, false);
   }
-  out.extend(static_cast<std::int32_t>(end - start));
+  out.take_to(end);
+}
+
+}  // namespace zxsfmt_detail
+
+void append_number(zxStr& out, double number) {
+  zxsfmt_detail::Output to(out);
+  zxsfmt_detail::append_number(to, number);
 }

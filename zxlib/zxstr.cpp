@@ -61,7 +61,7 @@ bool zxStr::is_within(const char* place) const {
 // Moves the characters into a new block of capacity n, of this string alone.
 void zxStr::take_exactly(std::int32_t n) {
   zxStrRep* fresh = new_block(n);
-  std::memcpy(fresh->data, rep->data, zx_size(rep->length) + 1);
+  zx_copy(fresh->data, rep->data, zx_size(rep->length) + 1);
   fresh->length = rep->length;
   release();
   rep = fresh;
