@@ -35,7 +35,8 @@ inline void multiply(Whole& number, std::uint32_t by) {
     part = static_cast<std::uint32_t>(carry % k_billion);
     carry /= k_billion;
   }
-  if (carry != 0) number.push_back(static_cast<std::uint32_t>(carry));
+  for (; carry != 0; carry /= k_billion)
+    number.push_back(static_cast<std::uint32_t>(carry % k_billion));
 }
 
 // number x base^power, where base^step still has 32 bits.
