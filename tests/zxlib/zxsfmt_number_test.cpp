@@ -130,7 +130,7 @@ class Random {
     if (chance(25)) form.flags += '0';
     if (chance(70)) form.precision = static_cast<int>(below(61));
     if (chance(30)) form.precision = static_cast<int>(below(9));
-    form.letter = letters[below(letters.size())];
+    form.letter = letters[static_cast<std::size_t>(below(letters.size()))];
     return form;
   }
 
@@ -607,13 +607,24 @@ std::string run_time_text(const std::string& format, auto... values) {
   return text.data();
 }
 
+// True where the run time of the Windows target strays from the standard: it
+// shows signs under letters without sign, and no digit for a zero in octal
+// without digits.
+bool is_told_wrongly(std::uint32_t word, const Form& form) {
+  if (!kit::on_windows() || form.letter == 'd' || form.letter == 'i')
+    return false;
+  return form.has('+') || form.has(' ') ||
+         (form.letter == 'o' && form.precision == 0 && word == 0);
+}
+
 TEST(zxsfmt_number, the_model_knows_integers_as_the_run_time_does) {
-  if (kit::on_windows()) GTEST_SKIP() << k_no_run_time;
   for_each_form([](const Form& form) {
-    for (const std::uint32_t word : k_words)
+    for (const std::uint32_t word : k_words) {
+      if (is_told_wrongly(word, form)) continue;
       ASSERT_EQ(number_model::text_of(word, form),
                 run_time_text(directive(form), word))
           << directive(form) << " of " << word;
+    }
   });
 }
 
@@ -699,7 +710,7 @@ TEST(zxsfmt_number, the_model_lays_out_as_the_run_time_does) {
   EXPECT_GT(compared, 50'000);
 }
 
-// The default form: the run time's text, its exponent widened, ties corrected.
+// ---- the default form: the run time's text, widened, ties corrected
 
 // A number as digits and a power of ten: d.dd... x 10^exponent, of exactly
 // 15 digits.
