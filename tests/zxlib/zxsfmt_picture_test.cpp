@@ -17,6 +17,7 @@
 #include "kit/cases.h"
 #include "kit/failure.h"
 #include "kit/text.h"
+#include "number_model.h"
 #include "zxmainf.h"
 #include "zxsfmt.h"
 
@@ -459,6 +460,16 @@ TEST(zxsfmt_picture, the_largest_numbers_have_all_their_digits) {
   EXPECT_EQ(shown("%20[]v", 1.7976931348623157e308), std::string(20, '*'));
   EXPECT_EQ(shown("%[p]v", 1.7976931348623157e308), "inf%");
   EXPECT_EQ(shown("%.7[]v", 5e-324), "0.0000000");
+}
+
+// No double has more than 1074 decimals; from then on they are zeros.
+TEST(zxsfmt_picture, any_precision_is_served) {
+  for (const double number : {5e-324, 0.1, 1.7976931348623157e308})
+    for (const int precision : {60, 1072, 1073, 1074, 1075, 1100, 2000})
+      EXPECT_EQ(
+          shown(("%." + std::to_string(precision) + "[]v").c_str(), number),
+          number_model::fixed(number_model::exact(number), precision, false));
+  EXPECT_EQ(shown("%.100000[0]v", 0.5), "0.5");
 }
 
 // --------------------------------------------------------- pictures as text --
