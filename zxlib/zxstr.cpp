@@ -328,7 +328,12 @@ char* zxStr::tail_growing(std::int32_t n) {
   if (!check() || !ZX_ASSERT(n >= 0)) return nullptr;
   const std::int32_t wanted = sum_of(sum_of(rep->length, n), k_margin);
   if (!ZX_ASSERT(wanted >= k_margin)) return nullptr;
-  rep->length + n <= rep->capacity ? unshare() : make_room(wanted);
+  if (rep == &zx_empty_rep)
+    rep = new_block(wanted);
+  else if (rep->length + n <= rep->capacity)
+    unshare();
+  else
+    make_room(wanted);
   return rep->data + rep->length;
 }
 
