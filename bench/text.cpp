@@ -41,7 +41,7 @@ std::string name(std::mt19937& random) {
 // A number with 1 to `most` digits, each count as likely.
 int number_of_digits(std::mt19937& random, unsigned most) {
   unsigned limit = 10;
-  for (unsigned digits = 1 + random() % most; digits > 1; --digits) limit *= 10;
+  for (auto digits = 1 + random() % most; digits > 1; --digits) limit *= 10;
   return static_cast<int>(random() % limit);
 }
 

@@ -6,6 +6,7 @@
 #include <fribidi.h>
 
 #include <array>
+#include <cstdlib>
 
 #include "text.h"
 
@@ -48,11 +49,13 @@ std::string by_steps(std::size_t i) {
   FriBidiParType base = FRIBIDI_PAR_RTL;
   fribidi_get_bidi_types(line.characters, line.size, types);
   fribidi_get_bracket_types(line.characters, line.size, types, brackets);
-  fribidi_get_par_embedding_levels_ex(types, brackets, line.size, &base,
-                                      levels);
+  if (fribidi_get_par_embedding_levels_ex(types, brackets, line.size, &base,
+                                          levels) == 0)
+    std::abort();
   fribidi_shape_mirroring(levels, line.size, line.characters);
-  fribidi_reorder_line(FRIBIDI_FLAGS_DEFAULT, types, line.size, 0, base, levels,
-                       line.characters, nullptr);
+  if (fribidi_reorder_line(FRIBIDI_FLAGS_DEFAULT, types, line.size, 0, base,
+                           levels, line.characters, nullptr) == 0)
+    std::abort();
   return line.in_utf8();
 }
 
@@ -60,8 +63,9 @@ std::string by_log2vis(std::size_t i) {
   const Line line(lines()[i]);
   Line result = line;
   FriBidiParType base = FRIBIDI_PAR_RTL;
-  fribidi_log2vis(line.characters, line.size, &base, result.characters, nullptr,
-                  nullptr, nullptr);
+  if (fribidi_log2vis(line.characters, line.size, &base, result.characters,
+                      nullptr, nullptr, nullptr) == 0)
+    std::abort();
   return result.in_utf8();
 }
 

@@ -45,9 +45,10 @@ std::string item(Random& random) {
     case 3:
       return formatted("%d.%d%%", random);
     case 4:
-      return "(" + hebrew_word(random) + ")";
+      return hebrew_word(random).insert(0, "(").append(")");
     case 5:
-      return word(random, 'a', 26, 8);
+      // A number next to it would be another's part to FriBidi.
+      return word(random, 'a', 26, 8).append(" ").append(hebrew_word(random));
     default:
       return hebrew_word(random);
   }
@@ -56,7 +57,7 @@ std::string item(Random& random) {
 std::string line(Random& random) {
   const std::size_t size = 10 + random() % 51;
   std::string text = hebrew_word(random);
-  while (text.size() < size) text += " " + item(random);
+  while (text.size() < size) text.append(" ").append(item(random));
   text.resize(size);
   return text;
 }

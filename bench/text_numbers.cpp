@@ -41,7 +41,7 @@ std::vector<std::string> written(std::vector<std::string> texts) {
     const std::size_t first = text[0] == '-' ? 1 : 0;
     std::size_t place = std::min(text.find('.'), text.size());
     while (place > first + 3) text.insert(place -= 3, ",");
-    text = "  " + text + " ";
+    text.insert(0, "  ").append(" ");
   }
   return texts;
 }
