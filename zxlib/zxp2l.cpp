@@ -2,9 +2,12 @@
 // Tests: tests/zxlib/zxp2l_test.cpp.
 #include "zxp2l.h"
 
+#include <algorithm>
 #include <climits>
 #include <cstring>
 #include <string_view>
+
+#include "zxplat.h"
 
 namespace {
 
@@ -140,10 +143,16 @@ Run split_physical_run(std::string_view text, bool base) {
 
 // ---- reversing
 
+// True if a percent sign behind a number is a part of it; asked once.
+bool percent_joins() {
+  static const bool joins = !zxplat::process.is_windows_95();
+  return joins;
+}
+
 // True if a number ends with byte i: a digit, or a percent sign behind one.
 bool ends_number(std::string_view run, std::size_t i) {
   if (is_digit(run[i])) return true;
-  return run[i] == '%' && i > 0 && is_digit(run[i - 1]);
+  return run[i] == '%' && i > 0 && is_digit(run[i - 1]) && percent_joins();
 }
 
 // Where the number that ends with byte i starts: over digits, over a
@@ -300,12 +309,36 @@ bool has_room_for_twice(const zxStr& text) {
   return ZX_ASSERT(text.length() <= INT32_MAX / 2);
 }
 
-// Moves the bytes of one class by a distance.
+// Moves the bytes of one class by a distance.  A text without any stays
+// shared.
 void shift_class(zxStr& text, unsigned class_bit, int distance) {
-  for (std::int32_t i = 0; i < text.length(); ++i) {
-    const char byte = text.c_str()[i];
-    if (zx_is(byte, class_bit)) text.at(i) = static_cast<char>(byte + distance);
+  const auto is_moved = [class_bit](char c) { return zx_is(c, class_bit); };
+  const char* const found = std::find_if(text.begin(), text.end(), is_moved);
+  if (found == text.end()) return;
+  const std::int32_t first = static_cast<std::int32_t>(found - text.begin());
+  char* const bytes = &text.at(first) - first;
+  for (std::int32_t i = first; i < text.length(); ++i)
+    if (is_moved(bytes[i])) bytes[i] = static_cast<char>(bytes[i] + distance);
+}
+
+// Units of 16 bits: 0 to 127 for themselves, bytes from 128 on by their
+// distance from the byte of alef, none behind tav.
+zxStr to_utf16(const zxStr& text, int alef_byte) {
+  constexpr int k_alef = 0x5D0;
+  constexpr int k_tav = 0x5EA;
+  if (!has_room_for_twice(text)) return {};
+  zxStr result;
+  char* const start = result.buffer(2 * text.length());
+  char* out = start;
+  for (const char character : text.view()) {
+    const int byte = static_cast<unsigned char>(character);
+    const int unit = byte < 128 ? byte : byte - alef_byte + k_alef;
+    if (unit > k_tav) continue;
+    *out++ = static_cast<char>(unit & 0xFF);
+    *out++ = static_cast<char>(unit >> 8);
   }
+  result.set_length(static_cast<std::int32_t>(out - start));
+  return result;
 }
 
 }  // namespace
@@ -358,6 +391,10 @@ void ansi_to_dos(zxStr& text) {
   shift_class(text, k_class_hebrew, -k_dos_distance);
 }
 
+zxStr dos_to_utf16(const zxStr& text) { return to_utf16(text, 128); }
+
+zxStr ansi_to_utf16(const zxStr& text) { return to_utf16(text, 224); }
+
 zxStr ansi_to_utf8(const zxStr& text) {
   if (!has_room_for_twice(text)) return {};
   zxStr result;
@@ -408,7 +445,7 @@ std::size_t number_end(std::string_view run, std::size_t i) {
         end + 1 < size && is_separator(run[end]) && is_digit(run[end + 1]);
     if (!joins) break;
   }
-  if (end < size && run[end] == '%') ++end;
+  if (end < size && run[end] == '%' && percent_joins()) ++end;
   return end;
 }
 

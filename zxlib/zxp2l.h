@@ -15,6 +15,9 @@
 // Base right to left, Hebrew shown as capitals:
 //   physical  ".DCBA abc (12.5%) FE"    logical  "EF (12.5%) abc ABCD."
 //
+// On Windows 95 a percent sign is no part of the number ahead of it, so "50%"
+// changes its order there; which system it is, is asked once per process.
+//
 // A run against the base direction without a letter of its own fails an
 // assertion (a mark 253 that no Latin letter follows, or 254 likewise); the
 // text so far comes back if that is dropped.

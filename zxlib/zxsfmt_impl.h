@@ -1,0 +1,134 @@
+// zxsfmt_impl.h - private to zxsfmt*.cpp: the parts of a directive, and the
+// texts of numbers.
+#ifndef ZXSFMT_IMPL_H
+#define ZXSFMT_IMPL_H
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <string_view>
+
+#include "zxsfmt.h"
+
+namespace zxsfmt_detail {
+
+// ----------------------------------------------------- numbers as digits --
+//
+// zxsfmt_number.cpp: exact texts of doubles.  Numbers are finite and not
+// negative; exact ties go away from zero; exponents have three digits at
+// least.  Each writes to `out` and returns the end of the text.
+
+// "%.*f".  It takes up to fixed_room() bytes.
+char* write_fixed(char* out, double number, std::int32_t precision);
+std::size_t fixed_room(double number, std::int32_t precision);
+
+// "%.*e", with a point behind the digit whatever the precision if `point`.
+// It takes up to precision + 10 bytes; the precision is k_most_digits - 1 at
+// most.
+char* write_exponent(char* out, double number, std::int32_t precision,
+                     bool point);
+
+// "%.*g": up to `precision` significant digits, as "%f" from 0.0001 up to
+// where the digits end, else as "%e"; no trailing zeros unless `zeros`.  It
+// takes up to precision + 12 bytes; the precision is from 1 to k_most_digits.
+char* write_general(char* out, double number, std::int32_t precision,
+                    bool zeros);
+
+// No double has more significant digits.
+inline constexpr std::int32_t k_most_digits = 770;
+
+// ------------------------------------------------------------ directives --
+
+// A "%" directive as it was read: all of it but for the bracket and the "l",
+// with numbers in the place of "*".
+class Directive {
+ public:
+  void add(char byte) {
+    if (length < k_most) spec[length] = byte;
+    ++length;
+  }
+  bool is_too_long() const { return length > k_most; }
+
+  // False if it is too long.
+  bool set_bracket(std::string_view text) {
+    has_bracket = true;
+    if (text.size() > k_most_bracket) return false;
+    text.copy(bracket, text.size());
+    bracket[text.size()] = '\0';
+    return true;
+  }
+
+  char letter() const { return spec[length - 1]; }
+  // What stands between the "%" and the letter.
+  std::string_view middle() const { return {spec + 1, length - 2}; }
+
+  static constexpr std::size_t k_most_bracket = 19;
+  bool has_long = false;
+  bool has_bracket = false;
+  char bracket[k_most_bracket + 1];
+
+ private:
+  static constexpr std::size_t k_most = 31;
+
+  char spec[k_most];
+  std::size_t length = 0;
+};
+
+// Carries out a directive with its argument; false if they do not fit.
+bool append_directive(zxStr& out, const Directive& directive,
+                      const zxFmtArg& arg);
+
+// The number of a "%v" directive in a picture; false for an argument without
+// a number.
+bool append_picture(zxStr& out, const Directive& directive,
+                    const zxFmtArg& arg);
+
+// The default form of an argument.
+void append_default_form(zxStr& out, const zxFmtArg& arg);
+
+// Carries out the escape that stands behind a "$" and steps over it; false if
+// there is none.
+bool append_escape(zxStr& out, const char*& at, zxFmtEnv& env);
+
+// ----------------------------------------------------------------- pieces --
+
+template <class T>
+const T& pointee(const zxFmtArg& arg) {
+  return *static_cast<const T*>(arg.pointer);
+}
+
+// The bytes from one place up to another.
+inline std::size_t zx_distance(const char* from, const char* to) {
+  return static_cast<std::size_t>(to - from);
+}
+
+void append_whole(zxStr& out, std::int64_t number, int base = 10);
+
+// Hexadecimal digits, as many as an address can have.
+void append_address(zxStr& out, const void* address);
+
+// Texts with another between them.
+zxStr joined(const zxQVA<zxStr>& texts, const char* between);
+
+// The moment of a zxTime, of a time_t or of the start of a zxDate.
+std::optional<std::int64_t> moment_of(const zxFmtArg& arg);
+
+// Appends a character n times; nothing if n is not above 0.  Lengths beyond
+// 31 bits fail an assertion.
+void append_times(zxStr& out, char byte, std::int64_t n);
+
+// Reads decimal digits, a number beyond 31 bits counting as the highest.
+std::int32_t read_digits(std::string_view& text);
+
+// The width and the precision of a directive, each -1 if not given.
+struct Measures {
+  std::int32_t width = -1;
+  std::int32_t precision = -1;
+};
+
+// Reads digits, and behind a "." the precision; a "." alone means 0.
+Measures read_measures(std::string_view& text);
+
+}  // namespace zxsfmt_detail
+
+#endif  // ZXSFMT_IMPL_H
