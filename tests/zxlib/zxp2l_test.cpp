@@ -22,6 +22,7 @@
 #include "kit/cases.h"
 #include "kit/failure.h"
 #include "kit/failure_road.h"
+#include "kit/target.h"
 #include "kit/text.h"
 #include "zxplat.h"
 
@@ -574,6 +575,22 @@ TEST(zxp2l, hebrew_comes_out_in_units_of_16_bits) {
   EXPECT_EQ(std_str(dos_to_utf16("\x9A\x9B\xE0\xFD\xFE\xFF.")), "\xEA\x05.\0"s);
   // U+0570 is as far below alef as byte 128 is below byte 224.
   EXPECT_EQ(std_str(ansi_to_utf16("\x80")), "\x70\x05"s);
+}
+
+// Their results could take twice the length, which must be a length too.
+TEST(zxp2l_slow, a_text_of_half_of_all_lengths_is_an_assertion) {
+  if (kit::on_windows()) GTEST_SKIP() << "no program of 32 bits has the room";
+  constexpr std::int32_t k_length = INT32_MAX / 2 + 1;
+  zxStr text;
+  text.set_length(k_length);
+  using Convert = zxStr (*)(const zxStr&);
+  for (const Convert convert : std::initializer_list<Convert>{
+           [](const zxStr& t) { return logical_from_phys(t, true); },
+           [](const zxStr& t) { return phys_from_logical(t, true); },
+           ansi_to_utf8, ansi_to_utf16, dos_to_utf16}) {
+    EXPECT_ASSERTION(convert(text), "zxp2l");
+    kit::with_failures_dropped([&] { EXPECT_TRUE(convert(text).is_empty()); });
+  }
 }
 
 // One unit, the low byte first.
