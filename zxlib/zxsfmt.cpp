@@ -88,7 +88,7 @@ class Composer {
   bool dispatch(const Directive& directive);
   bool dollar();
 
-  zxStr& out;
+  Output out;
   const Block out_block;
   const char* at;
   zxFmtEnv& env;
@@ -101,17 +101,17 @@ bool Composer::run() {
   for (;;) {
     const char* const plain = at;
     at = skip_plain(at);
-    if (at != plain) out.append(plain, zx_count(zx_distance(plain, at)));
+    out.add(std::string_view(plain, zx_distance(plain, at)));
     if (*at == '\0') return left == 0;
     if (*at == '\n') {
-      out.append("\r\n", 2);
+      out.add("\r\n");
       ++at;
       continue;
     }
     const char* const mark = at;
     const Outcome outcome = step();
     if (outcome == Outcome::done) continue;
-    if (outcome == Outcome::failed) out.append(mark);
+    if (outcome == Outcome::failed) out.add(mark);
     return false;
   }
 }
@@ -142,7 +142,7 @@ const zxFmtArg* Composer::take() {
 Composer::Outcome Composer::step() {
   const char mark = *at++;
   if (*at == mark) {
-    out.append(mark);
+    out.add(mark);
     ++at;
     return Outcome::done;
   }
@@ -182,7 +182,9 @@ Composer::Outcome Composer::percent() {
 bool Composer::side(bool is_left) {
   const zxFmtArg* arg = take();
   if (arg == nullptr) return false;
-  out.append(is_left ? env.fmt_left(*arg) : env.fmt_right(*arg));
+  const zxStr text = is_left ? env.fmt_left(*arg) : env.fmt_right(*arg);
+  out.reload();  // it is another's code
+  out.add(text);
   return true;
 }
 
@@ -243,7 +245,7 @@ bool Composer::dispatch(const Directive& directive) {
   const zxFmtArg* arg = take();
   if (arg == nullptr) return false;
   if (!replaces_all(*arg)) return append_directive(out, directive, *arg);
-  out = static_cast<const char*>(arg->pointer);
+  out.replace(static_cast<const char*>(arg->pointer));
   return true;
 }
 
@@ -258,7 +260,15 @@ zxFmtEnv& environment(Entry entry) {
 
 // ---- default forms
 
-void append_default_form(zxStr& out, const zxFmtArg& arg) {
+// As in "\xc8".
+static void append_byte(Output& out, std::uint8_t byte) {
+  constexpr std::string_view k_digits = "0123456789abcdef";
+  out.add("\\x");
+  if (byte >= 16) out.add(k_digits[byte >> 4]);
+  out.add(k_digits[byte & 0xF]);
+}
+
+void append_default_form(Output& out, const zxFmtArg& arg) {
   switch (arg.tag) {
     case 'i':
     case 'l':
@@ -267,34 +277,31 @@ void append_default_form(zxStr& out, const zxFmtArg& arg) {
     case 'v':
       return append_whole(out, arg.word);
     case 'c':
-      out.append(static_cast<char>(arg.number));
+      out.add(static_cast<char>(arg.number));
       return;
     case 'b':
-      out.append("\\x", 2);
-      return append_whole(out, arg.word, 16);
+      return append_byte(out, static_cast<std::uint8_t>(arg.word));
     case zxFmtArg::k_bool:
-      out.append(arg.word != 0 ? "true" : "false");
-      return;
+      return out.add(arg.word != 0 ? "true" : "false");
     case 'f':
       return append_number(out, arg.real);
     case 'z':
-      out.append(static_cast<const char*>(arg.pointer));
-      return;
+      return out.add(static_cast<const char*>(arg.pointer));
     case 's':
     case zxFmtArg::k_text:
-      out.append(pointee<zxStr>(arg));
+      out.add(pointee<zxStr>(arg));
       return;
     case 't':
-      out.append(pointee<zxDate>(arg).to_text());
+      out.add(pointee<zxDate>(arg).to_text());
       return;
     case 'M':
-      out.append(pointee<zxTime>(arg).to_text());
+      out.add(pointee<zxTime>(arg).to_text());
       return;
     case 'm':
-      out.append(format_time_t(moment_of(arg), 0));
+      out.add(format_time_t(moment_of(arg), 0));
       return;
     case 'k':
-      out.append(joined(pointee<zxQVA<zxStr>>(arg), " "));
+      out.add(joined(pointee<zxQVA<zxStr>>(arg), " "));
       return;
     case 'p':
       return append_address(out, arg.pointer);
@@ -303,14 +310,37 @@ void append_default_form(zxStr& out, const zxFmtArg& arg) {
   }
 }
 
+// ---- the result
+
+void Output::reload() {
+  end = string.tail(0);
+  limit =
+      end == nullptr ? nullptr : end + (string.capacity() - string.length());
+}
+
+char* Output::grow(std::int64_t n) {
+  if (!ZX_ASSERT(n <= INT32_MAX)) return nullptr;
+  char* const place = string.tail(static_cast<std::int32_t>(n));
+  if (place == nullptr) return nullptr;
+  end = place;
+  limit = end + (string.capacity() - string.length());
+  return end;
+}
+
+void Output::add_times(char byte, std::int64_t n) {
+  if (n <= 0) return;
+  char* const to = room(n);
+  if (to == nullptr) return;
+  std::memset(to, byte, static_cast<std::size_t>(n));
+  take_to(to + n);
+}
+
 bool compose(Entry entry, zxStr& out, const char* format, std::int32_t count,
              const zxFmtArg* args) {
   return sfmt_core(out, format, environment(entry), count, args);
 }
 
-void check_with_position(bool good) {
-  if (!good) bail_code(2006, pos_string(zx_pos));
-}
+void fail_with_position() { bail_code(2006, pos_string(zx_pos)); }
 
 void bail_with(bool good, std::int32_t number, const zxStr& text) {
   good ? bail_code(number, text) : bail_code(2006);
@@ -333,7 +363,7 @@ bool sfmt_core(zxStr& out, const char* format, zxFmtEnv& env,
     const zxStr held = format;
     return sfmt_core(out, held.c_str(), env, count, args);
   }
-  out.set_length(0);
+  if (out.length() != 0) out.set_length(0);
   if (!ZX_ASSERT(format != nullptr)) return false;
   return Composer(out, format, env, count, args).run();
 }

@@ -11,11 +11,6 @@
 namespace zxsfmt_detail {
 namespace {
 
-// A view of nothing may have no place either.
-void append_view(zxStr& out, std::string_view text) {
-  if (!text.empty()) out.append(text.data(), zx_count(text.size()));
-}
-
 // ---- fields of limited length
 
 // What stands between "%" and the letter, as it counts for all outputs but
@@ -55,24 +50,28 @@ constexpr std::int64_t k_field_limit = 256;
 
 // Appends a field: a prefix and a body, `zeros` between them, blanks around
 // them up to the width.
-bool append_field(zxStr& out, const Form& form, std::string_view prefix,
+bool append_field(Output& out, const Form& form, std::string_view prefix,
                   std::int64_t zeros, std::string_view body) {
   const std::int64_t length =
       static_cast<std::int64_t>(prefix.size() + body.size()) + zeros;
   const std::int64_t total =
       std::max<std::int64_t>(length, form.measures.width);
   if (!ZX_ASSERT(total < k_field_limit)) return false;
-  const std::int64_t blanks = total - length;
-  if (!form.left) append_times(out, ' ', blanks);
-  append_view(out, prefix);
-  append_times(out, '0', zeros);
-  append_view(out, body);
-  if (form.left) append_times(out, ' ', blanks);
+  char* to = out.room(total);
+  if (to == nullptr) return false;
+  const auto blanks = static_cast<std::size_t>(total - length);
+  if (!form.left) to = std::fill_n(to, blanks, ' ');
+  to = std::copy_n(prefix.data(), prefix.size(), to);
+  to = std::fill_n(to, zeros, '0');
+  zx_copy(to, body.data(), body.size());
+  to += body.size();
+  if (form.left) to = std::fill_n(to, blanks, ' ');
+  out.take_to(to);
   return true;
 }
 
 // A number: where zeros fill the width they stand behind the sign.
-bool append_signed_field(zxStr& out, const Form& form, std::string_view prefix,
+bool append_signed_field(Output& out, const Form& form, std::string_view prefix,
                          std::int64_t zeros, std::string_view body,
                          bool may_fill) {
   if (may_fill && form.zeros && !form.left) {
@@ -84,7 +83,7 @@ bool append_signed_field(zxStr& out, const Form& form, std::string_view prefix,
 }
 
 // The same for a text, of which a precision keeps the start.
-bool append_text_field(zxStr& out, std::string_view spec,
+bool append_text_field(Output& out, std::string_view spec,
                        std::string_view text) {
   const Form form = read_form(spec);
   if (form.measures.precision >= 0)
@@ -129,7 +128,7 @@ void to_upper(char* text, char* end) {
   std::transform(text, end, text, zx_upper);
 }
 
-bool append_integer(zxStr& out, const Directive& directive,
+bool append_integer(Output& out, const Directive& directive,
                     const zxFmtArg& arg) {
   if (!is_integer(arg)) return false;
   const Form form = read_form(directive.middle());
@@ -155,14 +154,14 @@ bool append_integer(zxStr& out, const Directive& directive,
 }
 
 // A NUL ends the field that it stands in.
-bool append_character(zxStr& out, const Directive& directive,
+bool append_character(Output& out, const Directive& directive,
                       const zxFmtArg& arg) {
   if (!is_integer(arg) || arg.tag == zxFmtArg::k_bool) return false;
   Form form = read_form(directive.middle());
   const char byte = static_cast<char>(arg.number);
   if (byte != '\0') return append_field(out, form, {}, 0, {&byte, 1});
   if (!ZX_ASSERT(form.measures.width < k_field_limit)) return false;
-  if (!form.left) append_times(out, ' ', form.measures.width - 1);
+  if (!form.left) out.add_times(' ', form.measures.width - 1);
   return true;
 }
 
@@ -186,7 +185,7 @@ char* write_magnitude(char* out, double number, char letter,
   }
 }
 
-bool append_double(zxStr& out, const Directive& directive,
+bool append_double(Output& out, const Directive& directive,
                    const zxFmtArg& arg) {
   if (arg.tag != 'f') return false;
   constexpr std::int32_t k_usual_precision = 6;
@@ -207,7 +206,7 @@ bool append_double(zxStr& out, const Directive& directive,
                           form.alternate);
   else
     end = std::copy_n(std::isnan(arg.real) ? "nan" : "inf", 3, text);
-  if (letter != directive.letter()) to_upper(text, end);
+  if (is_number && letter != directive.letter()) to_upper(text, end);
   const std::string_view sign =
       std::isnan(arg.real) ? "" : sign_of(std::signbit(arg.real), form);
   return append_signed_field(out, form, sign, 0, {text, zx_distance(text, end)},
@@ -224,7 +223,7 @@ void write_address(char* out, const void* address) {
     out[i] = "0123456789ABCDEF"[rest & 0xF];
 }
 
-bool append_pointer(zxStr& out, const Directive& directive,
+bool append_pointer(Output& out, const Directive& directive,
                     const zxFmtArg& arg) {
   if (arg.tag != 'p') return false;
   char digits[k_address_digits];
@@ -237,7 +236,7 @@ bool append_pointer(zxStr& out, const Directive& directive,
 
 // Flags count in this order only: "#" keeps the end of a text that is cut,
 // "-" puts the blanks behind it.
-void append_padded(zxStr& out, std::string_view spec, std::string_view text) {
+void append_padded(Output& out, std::string_view spec, std::string_view text) {
   const auto read_flag = [&](char flag) {
     const bool is_set = spec.starts_with(flag);
     if (is_set) spec.remove_prefix(1);
@@ -252,31 +251,31 @@ void append_padded(zxStr& out, std::string_view spec, std::string_view text) {
   }
   const std::int64_t blanks =
       measures.width - static_cast<std::int64_t>(text.size());
-  if (!left) append_times(out, ' ', blanks);
-  append_view(out, text);
-  if (left) append_times(out, ' ', blanks);
+  if (!left) out.add_times(' ', blanks);
+  out.add(text);
+  if (left) out.add_times(' ', blanks);
 }
 
 // The text of an argument that is one; false for another, and for `out`,
 // which has been emptied.
-bool read_text(const zxStr& out, const zxFmtArg& arg, std::string_view& text) {
+bool read_text(const Output& out, const zxFmtArg& arg, std::string_view& text) {
   if (arg.tag == 'z') {
     text = static_cast<const char*>(arg.pointer);
     return true;
   }
-  if (arg.tag != 's' || !ZX_ASSERT(arg.pointer != &out)) return false;
+  if (arg.tag != 's' || !ZX_ASSERT(arg.pointer != &out.text())) return false;
   text = pointee<zxStr>(arg).view();
   return true;
 }
 
-bool append_text(zxStr& out, const Directive& directive, const zxFmtArg& arg) {
+bool append_text(Output& out, const Directive& directive, const zxFmtArg& arg) {
   std::string_view text;
   if (!read_text(out, arg, text)) return false;
   append_padded(out, directive.middle(), text);
   return true;
 }
 
-bool append_reversed(zxStr& out, const Directive& directive,
+bool append_reversed(Output& out, const Directive& directive,
                      const zxFmtArg& arg) {
   std::string_view text;
   if (!read_text(out, arg, text)) return false;
@@ -298,7 +297,7 @@ int cut_digit(std::string_view& spec) {
   return digit;
 }
 
-bool append_list(zxStr& out, const Directive& directive, const zxFmtArg& arg) {
+bool append_list(Output& out, const Directive& directive, const zxFmtArg& arg) {
   if (arg.tag != 'k') return false;
   std::string_view spec = directive.middle();
   const bool by_lines = cut_digit(spec) == 1;
@@ -312,7 +311,7 @@ bool append_list(zxStr& out, const Directive& directive, const zxFmtArg& arg) {
 
 bool is_time(const zxFmtArg& arg) { return arg.tag == 'M' || arg.tag == 'm'; }
 
-bool append_form_of_time(zxStr& out, const Directive& directive,
+bool append_form_of_time(Output& out, const Directive& directive,
                          const zxFmtArg& arg) {
   if (!is_time(arg)) return false;
   std::string_view spec = directive.middle();
@@ -323,7 +322,7 @@ bool append_form_of_time(zxStr& out, const Directive& directive,
   return append_text_field(out, spec, text.view());
 }
 
-bool append_date(zxStr& out, const Directive& directive, const zxFmtArg& arg) {
+bool append_date(Output& out, const Directive& directive, const zxFmtArg& arg) {
   zxDate date;
   if (arg.tag == 't')
     date = pointee<zxDate>(arg);
@@ -335,7 +334,7 @@ bool append_date(zxStr& out, const Directive& directive, const zxFmtArg& arg) {
   return append_text_field(out, directive.middle(), text.view());
 }
 
-bool append_formed_time(zxStr& out, const Directive& directive,
+bool append_formed_time(Output& out, const Directive& directive,
                         const zxFmtArg& arg) {
   std::string_view spec = directive.middle();
   read_measures(spec);
@@ -350,7 +349,7 @@ bool append_formed_time(zxStr& out, const Directive& directive,
 
 // ---- by letter
 
-bool append_directive(zxStr& out, const Directive& directive,
+bool append_directive(Output& out, const Directive& directive,
                       const zxFmtArg& arg) {
   const char letter = directive.letter();
   const bool takes_bracket = letter == 'T' || letter == 't' || letter == 'v';
@@ -395,27 +394,18 @@ bool append_directive(zxStr& out, const Directive& directive,
 
 // ---- pieces
 
-void append_whole(zxStr& out, std::int64_t number, int base) {
-  char digits[24];
-  const char* const end =
-      std::to_chars(digits, digits + sizeof digits, number, base).ptr;
-  out.append(digits, zx_count(zx_distance(digits, end)));
+void append_whole(Output& out, std::int64_t number) {
+  constexpr std::int64_t k_room = 21;
+  char* end = out.room(k_room);
+  if (end == nullptr) return;
+  if (number < 0) *end++ = '-';
+  out.take_to(write_whole(end, static_cast<std::uint64_t>(std::abs(number))));
 }
 
-void append_address(zxStr& out, const void* address) {
+void append_address(Output& out, const void* address) {
   char digits[k_address_digits];
   write_address(digits, address);
-  out.append(digits, k_address_digits);
-}
-
-void append_times(zxStr& out, char byte, std::int64_t n) {
-  if (n <= 0) return;
-  const std::int64_t length = out.length() + n;
-  if (!ZX_ASSERT(length <= INT32_MAX)) return;
-  const std::int32_t start = out.length();
-  char* const bytes = out.buffer(static_cast<std::int32_t>(length));
-  if (bytes != nullptr)
-    std::memset(bytes + start, byte, static_cast<std::size_t>(n));
+  out.add(std::string_view(digits, k_address_digits));
 }
 
 std::int32_t read_digits(std::string_view& text) {

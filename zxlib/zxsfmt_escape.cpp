@@ -1,5 +1,7 @@
 // zxsfmt_escape.cpp - the "$" escapes: text that takes no argument.
 // Tests: tests/zxlib/zxsfmt_test.cpp.
+#include <algorithm>
+
 #include "zxregexe.h"
 #include "zxsfmt_impl.h"
 
@@ -15,35 +17,35 @@ std::int32_t digits_at(const char*& at) {
   return read_digits(digits);
 }
 
-void append_group(zxStr& out, std::size_t slot) {
+void append_group(Output& out, std::size_t slot) {
   const char* const start = zx_match.start[slot];
   if (start != nullptr)
-    out.append(start, zx_count(zx_distance(start, zx_match.end[slot])));
+    out.add(std::string_view(start, zx_distance(start, zx_match.end[slot])));
 }
 
-void append_now(zxStr& out, std::int32_t form) {
-  out.append(format_time_t({}, form));
+void append_now(Output& out, std::int32_t form) {
+  out.add(format_time_t({}, form));
 }
 
 // ---- columns
 
 // "$c79": no text beyond that column.
-void cut_at_column(zxStr& out, std::int32_t column) {
+void cut_at_column(Output& out, std::int32_t column) {
   constexpr std::int32_t k_usual = 79;
   if (column == 0) column = k_usual;
-  if (out.length() > column) out.set_length(column);
+  if (out.length() > column) out.cut(column);
 }
 
 // "$s20": blanks up to that column; without one, up to the next tab stop.
-void fill_to_column(zxStr& out, std::int64_t column) {
+void fill_to_column(Output& out, std::int64_t column) {
   constexpr std::int32_t k_tab = 10;
   if (column == 0) column = (out.length() / k_tab + std::int64_t{1}) * k_tab;
-  append_times(out, ' ', column - out.length());
+  out.add_times(' ', column - out.length());
 }
 
 // "$r-=79": a text, of which the first byte may be anything and the others no
 // digits, so many times.
-bool repeat(zxStr& out, const char*& at) {
+bool repeat(Output& out, const char*& at) {
   const char* const start = at;
   if (*at == '\0') return false;
   do ++at;
@@ -52,45 +54,46 @@ bool repeat(zxStr& out, const char*& at) {
   const std::size_t size = zx_distance(start, at);
   const std::int32_t count = digits_at(at);
   if (size == 1) {
-    append_times(out, *start, count);
+    out.add_times(*start, count);
     return true;
   }
-  const std::int64_t length =
-      out.length() + static_cast<std::int64_t>(size) * count;
-  if (!ZX_ASSERT(length <= INT32_MAX)) return true;
-  out.reserve(static_cast<std::int32_t>(length));
-  for (std::int32_t i = 0; i < count; ++i) out.append(start, zx_count(size));
+  char* to = out.room(static_cast<std::int64_t>(size) * count);
+  if (to == nullptr) return true;
+  for (std::int32_t i = 0; i < count; ++i) to = std::copy_n(start, size, to);
+  out.take_to(to);
   return true;
 }
 
 // ---- references
 
-void append_if(zxStr& out, const zxStr* text) {
-  if (text != nullptr) out.append(*text);
+void append_if(Output& out, const zxStr* text) {
+  if (text != nullptr) out.add(*text);
 }
 
-void append_arg(zxStr& out, std::int32_t n) {
+void append_arg(Output& out, std::int32_t n) {
   if (zx_fmt_program.args != nullptr)
-    out.append(zx_fmt_program.args->get_or(n - 1));
+    out.add(zx_fmt_program.args->get_or(n - 1));
 }
 
-void append_args(zxStr& out) {
+void append_args(Output& out) {
   if (zx_fmt_program.args != nullptr)
-    out.append(joined(*zx_fmt_program.args, " "));
+    out.add(joined(*zx_fmt_program.args, " "));
 }
 
 // A name up to the closing byte, which may be missing.
-void append_named(zxStr& out, const char*& at, char closing, zxFmtEnv& env) {
+void append_named(Output& out, const char*& at, char closing, zxFmtEnv& env) {
   const char* const start = at;
   while (zx_is(*at, k_class_latin | k_class_digit) || *at == '_') ++at;
   const zxStr name(start, zx_count(zx_distance(start, at)));
   if (*at == closing) ++at;
-  out.append(env.lookup(name));
+  const zxStr text = env.lookup(name);
+  out.reload();  // it is another's code
+  out.add(text);
 }
 
 // What stands behind "$%" and "${".  The forms of one byte have no closing
 // byte.
-void append_reference(zxStr& out, const char*& at, char closing,
+void append_reference(Output& out, const char*& at, char closing,
                       zxFmtEnv& env) {
   switch (*at) {
     case '*':
@@ -111,7 +114,7 @@ void append_reference(zxStr& out, const char*& at, char closing,
 
 }  // namespace
 
-bool append_escape(zxStr& out, const char*& at, zxFmtEnv& env) {
+bool append_escape(Output& out, const char*& at, zxFmtEnv& env) {
   const char letter = *at;
   if (letter == '\0') return false;
   ++at;

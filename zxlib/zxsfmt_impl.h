@@ -18,6 +18,9 @@ namespace zxsfmt_detail {
 // negative; exact ties go away from zero; exponents have three digits at
 // least.  Each writes to `out` and returns the end of the text.
 
+// A whole number; it takes up to 20 bytes.
+char* write_whole(char* out, std::uint64_t number);
+
 // "%.*f".  It takes up to fixed_room() bytes.
 char* write_fixed(char* out, double number, std::int32_t precision);
 std::size_t fixed_room(double number, std::int32_t precision);
@@ -36,6 +39,67 @@ char* write_general(char* out, double number, std::int32_t precision,
 
 // No double has more significant digits.
 inline constexpr std::int32_t k_most_digits = 770;
+
+// ------------------------------------------------------------- the result --
+
+// The string under composition, written to behind its end.  The string is as
+// it should be between any two calls; whoever changes it in another way has
+// to call reload().
+class Output {
+ public:
+  explicit Output(zxStr& result) : string(result) { reload(); }
+
+  const zxStr& text() const { return string; }
+  std::int32_t length() const { return string.length(); }
+
+  // The place behind the end with room for n bytes, of which those up to the
+  // end that is given to take_to() become text.  Null if n was refused.
+  char* room(std::int64_t n) { return n <= limit - end ? end : grow(n); }
+  void take_to(char* new_end) {
+    string.extend(static_cast<std::int32_t>(new_end - end));
+    end = new_end;
+  }
+
+  void add(char byte) {
+    if (char* const to = room(1)) {
+      *to = byte;
+      take_to(to + 1);
+    }
+  }
+  void add(std::string_view text) {
+    if (char* const to = room(static_cast<std::int64_t>(text.size()))) {
+      zx_copy(to, text.data(), text.size());
+      take_to(to + text.size());
+    }
+  }
+  void add(const char* text) { add(std::string_view(text)); }
+  // The text may be the result itself.
+  void add(const zxStr& text) {
+    if (&text != &string) return add(text.view());
+    string.append(text);
+    reload();
+  }
+
+  // Nothing if n is not above 0.  Lengths beyond 31 bits fail an assertion.
+  void add_times(char byte, std::int64_t n);
+
+  void cut(std::int32_t n) {
+    string.set_length(n);
+    reload();
+  }
+  void replace(const char* text) {
+    string = text;
+    reload();
+  }
+  void reload();
+
+ private:
+  char* grow(std::int64_t n);
+
+  zxStr& string;
+  char* end;
+  const char* limit;
+};
 
 // ------------------------------------------------------------ directives --
 
@@ -75,20 +139,20 @@ class Directive {
 };
 
 // Carries out a directive with its argument; false if they do not fit.
-bool append_directive(zxStr& out, const Directive& directive,
+bool append_directive(Output& out, const Directive& directive,
                       const zxFmtArg& arg);
 
 // The number of a "%v" directive in a picture; false for an argument without
 // a number.
-bool append_picture(zxStr& out, const Directive& directive,
+bool append_picture(Output& out, const Directive& directive,
                     const zxFmtArg& arg);
 
 // The default form of an argument.
-void append_default_form(zxStr& out, const zxFmtArg& arg);
+void append_default_form(Output& out, const zxFmtArg& arg);
 
 // Carries out the escape that stands behind a "$" and steps over it; false if
 // there is none.
-bool append_escape(zxStr& out, const char*& at, zxFmtEnv& env);
+bool append_escape(Output& out, const char*& at, zxFmtEnv& env);
 
 // ----------------------------------------------------------------- pieces --
 
@@ -102,20 +166,19 @@ inline std::size_t zx_distance(const char* from, const char* to) {
   return static_cast<std::size_t>(to - from);
 }
 
-void append_whole(zxStr& out, std::int64_t number, int base = 10);
+void append_whole(Output& out, std::int64_t number);
+
+// The default form of a double.
+void append_number(Output& out, double number);
 
 // Hexadecimal digits, as many as an address can have.
-void append_address(zxStr& out, const void* address);
+void append_address(Output& out, const void* address);
 
 // Texts with another between them.
 zxStr joined(const zxQVA<zxStr>& texts, const char* between);
 
 // The moment of a zxTime, of a time_t or of the start of a zxDate.
 std::optional<std::int64_t> moment_of(const zxFmtArg& arg);
-
-// Appends a character n times; nothing if n is not above 0.  Lengths beyond
-// 31 bits fail an assertion.
-void append_times(zxStr& out, char byte, std::int64_t n);
 
 // Reads decimal digits, a number beyond 31 bits counting as the highest.
 std::int32_t read_digits(std::string_view& text);

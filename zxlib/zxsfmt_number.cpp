@@ -119,9 +119,54 @@ bool scaled(double number, int decimals, std::uint64_t& result) {
   return true;
 }
 
-char* write_whole(char* out, std::uint64_t number) {
-  constexpr int k_most = 20;
-  return std::to_chars(out, out + k_most, number).ptr;
+// ---- digits of whole numbers
+
+constexpr auto make_pairs() {
+  std::array<char, 200> pairs{};
+  for (std::size_t n = 0; n < 100; ++n) {
+    pairs[2 * n] = static_cast<char>('0' + n / 10);
+    pairs[2 * n + 1] = static_cast<char>('0' + n % 10);
+  }
+  return pairs;
+}
+constexpr auto k_pairs = make_pairs();
+
+char* put_pair(char* out, std::size_t n) {
+  std::memcpy(out, &k_pairs[2 * n], 2);
+  return out + 2;
+}
+
+template <class Word>
+int digit_count(Word number) {
+  constexpr int k_bits = static_cast<int>(8 * sizeof(Word));
+  const int guess = (k_bits - std::countl_zero(number | 1)) * 1233 >> 12;
+  return guess +
+         ((number | 1) >= k_powers_of_10[static_cast<std::size_t>(guess)]);
+}
+
+// Fills in the digits ahead of a place, as many as there are.
+template <class Word>
+void put_digits_ahead(char* end, Word number, int count) {
+  for (; count >= 2; count -= 2, number /= 100)
+    put_pair(end -= 2, static_cast<std::size_t>(number % 100));
+  if (count == 1) end[-1] = static_cast<char>('0' + number % 10);
+}
+
+template <class Word>
+char* put_digits(char* out, Word number, int count) {
+  put_digits_ahead(out + count, number, count);
+  return out + count;
+}
+
+// Halves are cheaper than the whole, far more so on one of the targets.
+char* put_digits_in_parts(char* out, std::uint64_t number, int count) {
+  constexpr std::uint64_t k_part = 1'000'000'000;
+  constexpr int k_part_digits = 9;
+  if (number <= UINT32_MAX && count <= k_part_digits + 1)
+    return put_digits(out, static_cast<std::uint32_t>(number), count);
+  out = put_digits_in_parts(out, number / k_part, count - k_part_digits);
+  return put_digits(out, static_cast<std::uint32_t>(number % k_part),
+                    k_part_digits);
 }
 
 // ---- rounding of decimal text
@@ -167,22 +212,23 @@ int exponent_guess(double number) {
   return log2 * 1233 >> 12;
 }
 
-// Numbers whose digits are those of one whole number.
-bool round_by_whole_number(double number, int count, Digits& digits) {
+// Numbers whose digits are those of one whole number, which stands for
+// whole / 10^decimals.
+struct Scaled {
+  std::uint64_t whole;
+  int decimals;
+};
+
+bool round_by_whole_number(double number, int count, Scaled& result) {
   constexpr double k_least = 1e-18;
   constexpr double k_beyond = 1e18;
   constexpr int k_most = 18;
   if (count > k_most || number < k_least || number >= k_beyond) return false;
-  digits.exponent = exponent_guess(number);
-  std::uint64_t whole;
-  const std::uint64_t beyond = k_powers_of_10[static_cast<std::size_t>(count)];
-  if (!scaled(number, count - 1 - digits.exponent, whole)) return false;
-  if (whole >= beyond) {
-    ++digits.exponent;
-    if (!scaled(number, count - 1 - digits.exponent, whole)) return false;
-  }
-  write_whole(digits.bytes, whole);
-  return true;
+  result.decimals = count - 1 - exponent_guess(number);
+  if (!scaled(number, result.decimals, result.whole)) return false;
+  if (result.whole < k_powers_of_10[static_cast<std::size_t>(count)])
+    return true;
+  return scaled(number, --result.decimals, result.whole);
 }
 
 // Fills in the digits and the exponent from a text as "d.ddde-05".
@@ -218,11 +264,15 @@ void round_by_text(double number, int count, Digits& digits) {
 
 // The number rounded to `count` digits, up to k_most_digits.
 void round_to_digits(double number, int count, Digits& digits) {
+  Scaled rounded;
   digits.count = count;
   if (number == 0) {
     std::memset(digits.bytes, '0', static_cast<std::size_t>(count));
     digits.exponent = 0;
-  } else if (!round_by_whole_number(number, count, digits)) {
+  } else if (round_by_whole_number(number, count, rounded)) {
+    put_digits_in_parts(digits.bytes, rounded.whole, count);
+    digits.exponent = count - 1 - rounded.decimals;
+  } else {
     round_by_text(number, count, digits);
   }
 }
@@ -277,20 +327,37 @@ char* write_plain(char* out, const Digits& digits, bool point) {
 
 // ---- a fixed number of decimals
 
-// The digits of a whole number with the point ahead of the last ones.
-char* write_with_point(char* out, std::uint64_t whole, int precision) {
-  char* end = write_whole(out, whole);
-  if (precision == 0) return end;
-  const int missing = precision + 1 - static_cast<int>(end - out);
-  if (missing > 0) {
-    std::memmove(out + missing, out, static_cast<std::size_t>(end - out));
-    fill(out, '0', missing);
-    end += missing;
-  }
-  char* const point = end - precision;
-  std::memmove(point + 1, point, static_cast<std::size_t>(precision));
-  *point = '.';
-  return end + 1;
+// whole / 10^decimals
+char* write_with_point(char* out, Scaled number) {
+  if (number.decimals == 0) return write_whole(out, number.whole);
+  const std::uint64_t unit =
+      k_powers_of_10[static_cast<std::size_t>(number.decimals)];
+  out = write_whole(out, number.whole / unit);
+  *out++ = '.';
+  return put_digits_in_parts(out, number.whole % unit, number.decimals);
+}
+
+// Takes the zeros at the end of a fraction off, and the point behind which
+// nothing is left.
+char* strip_zeros(char* end) {
+  while (end[-1] == '0') --end;
+  return end[-1] == '.' ? end - 1 : end;
+}
+
+// Numbers with up to four decimals and 15 digits in all, as tables hold them;
+// null for others.
+char* write_short(char* out, double number) {
+  constexpr double k_beyond = 1e11;
+  constexpr double k_unit = 1e4;
+  if (number >= k_beyond) return nullptr;
+  const auto whole = static_cast<std::uint64_t>(number * k_unit + 0.5);
+  if (static_cast<double>(whole) / k_unit != number) return nullptr;
+  constexpr std::uint64_t k_units = 10'000;
+  out = write_whole(out, whole / k_units);
+  const auto fraction = static_cast<std::uint32_t>(whole % k_units);
+  if (fraction == 0) return out;
+  *out++ = '.';
+  return strip_zeros(put_digits(out, fraction, 4));
 }
 
 char* fixed(char* out, double number, int precision) {
@@ -323,9 +390,9 @@ std::size_t fixed_room(double number, std::int32_t precision) {
 }
 
 char* write_fixed(char* out, double number, std::int32_t precision) {
-  std::uint64_t whole;
-  if (scaled(number, precision, whole))
-    return write_with_point(out, whole, precision);
+  Scaled number_as = {0, precision};
+  if (scaled(number, precision, number_as.whole))
+    return write_with_point(out, number_as);
   constexpr std::int32_t k_most_decimals = 1074;
   if (precision <= k_most_decimals)
     return write_fixed_by_text(out, number, precision);
@@ -342,6 +409,14 @@ char* write_exponent(char* out, double number, std::int32_t precision,
 
 char* write_general(char* out, double number, std::int32_t precision,
                     bool zeros) {
+  constexpr double k_least_plain = 1e-4;
+  Scaled rounded;
+  if (number >= k_least_plain &&
+      round_by_whole_number(number, precision, rounded) &&
+      rounded.decimals >= 0 && !zeros) {
+    out = write_with_point(out, rounded);
+    return rounded.decimals > 0 ? strip_zeros(out) : out;
+  }
   Digits digits;
   round_to_digits(number, precision, digits);
   if (!zeros)
@@ -352,20 +427,35 @@ char* write_general(char* out, double number, std::int32_t precision,
   return write_with_power(out, digits, zeros);
 }
 
+char* write_whole(char* out, std::uint64_t number) {
+  if (number > UINT32_MAX)
+    return put_digits_in_parts(out, number, digit_count(number));
+  const auto word = static_cast<std::uint32_t>(number);
+  return put_digits(out, word, digit_count(word));
+}
+
+void append_number(Output& out, double number) {
+  constexpr std::int64_t k_room = 32;
+  char* end = out.room(k_room);
+  if (end == nullptr) return;
+  if (std::isnan(number)) {
+    end = copy(end, "nan", 3);
+  } else {
+    if (std::signbit(number)) *end++ = '-';
+    number = std::fabs(number);
+    if (std::isinf(number))
+      end = copy(end, "inf", 3);
+    else if (char* const short_end = write_short(end, number))
+      end = short_end;
+    else
+      end = write_general(end, number, k_default_digits, false);
+  }
+  out.take_to(end);
+}
+
 }  // namespace zxsfmt_detail
 
 void append_number(zxStr& out, double number) {
-  using namespace zxsfmt_detail;
-  if (std::isnan(number)) {
-    out.append("nan", 3);
-    return;
-  }
-  char text[k_default_digits + 16];
-  char* end = text;
-  if (std::signbit(number)) *end++ = '-';
-  if (std::isinf(number))
-    end = copy(end, "inf", 3);
-  else
-    end = write_general(end, std::fabs(number), k_default_digits, false);
-  out.append(text, static_cast<std::int32_t>(end - text));
+  zxsfmt_detail::Output to(out);
+  zxsfmt_detail::append_number(to, number);
 }

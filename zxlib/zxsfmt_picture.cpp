@@ -314,12 +314,12 @@ void Picture::add_signs(Text& text) const {
   if (flags.has('d')) text.add('$');
 }
 
-bool append_number(zxStr& out, double number, std::string_view pattern,
-                   Measures measures) {
+bool append_in_picture(Output& out, double number, std::string_view pattern,
+                       Measures measures) {
   Flags flags;
   if (!read_flags(pattern, flags)) return false;
   if (flags.has('b') && number == 0) {
-    append_times(out, ' ', measures.width);
+    out.add_times(' ', measures.width);
     return true;
   }
   if (!ZX_ASSERT(measures.width < k_width_limit)) return false;
@@ -335,13 +335,13 @@ bool append_number(zxStr& out, double number, std::string_view pattern,
   }
   Text text(bytes);
   picture.write(text);
-  out.append(bytes, text.length());
+  out.add(text.view());
   return true;
 }
 
 }  // namespace
 
-bool append_picture(zxStr& out, const Directive& directive,
+bool append_picture(Output& out, const Directive& directive,
                     const zxFmtArg& arg) {
   std::string_view middle = directive.middle();
   const Measures measures = read_measures(middle);
@@ -349,12 +349,12 @@ bool append_picture(zxStr& out, const Directive& directive,
   const std::optional<double> number = number_of(arg);
   if (!number) return false;
   if (!std::isfinite(*number)) {
-    out.append("#ERR", 4);
+    out.add("#ERR");
     return true;
   }
   const std::string_view pattern =
       directive.has_bracket ? std::string_view(directive.bracket) : ",";
-  return append_number(out, *number, pattern, measures);
+  return append_in_picture(out, *number, pattern, measures);
 }
 
 }  // namespace zxsfmt_detail
