@@ -906,7 +906,8 @@ TEST(zxtime, a_moment_without_a_local_time_shows_as_zeros) {
 
 TEST(zxtime, the_first_moment_has_a_local_time) {
   const InZone utc("UTC0");
-  EXPECT_EQ(text_of(format_time_t(1, std::int32_t{0})), "01-01-70 00:00:01");
+  EXPECT_EQ(text_of(format_time_t(std::optional<std::int64_t>(1), 0)),
+            "01-01-70 00:00:01");
 }
 
 // ---- forms of one's own
@@ -943,7 +944,6 @@ TEST(zxtime, the_letters_of_forms) {
       {"%X", {"01:46:40", "12:00:00", "00:00:01"}},
       {"%y", {"01", "09", "70"}},
       {"%Y", {"2001", "2009", "1970"}},
-      {"%Z", {"UTC", "UTC", "UTC"}},
       {"%%", {"%", "%", "%"}},
       {"", {"", "", ""}},
       {"%Y%m%d-%H%M%S",
@@ -957,11 +957,18 @@ TEST(zxtime, the_letters_of_forms) {
           << row.form;
 }
 
-// The C locale has one text for it on each system, but not the same.
+// The C locales of the systems do not agree on this one.
 TEST(zxtime, date_and_time_in_one_letter) {
   const InZone utc("UTC0");
-  EXPECT_EQ(text_of(format_time_t(1'000'000'000, "%c")),
-            "Sun Sep  9 01:46:40 2001");
+  EXPECT_EQ(
+      text_of(format_time_t(1'000'000'000, "%c")),
+      kit::on_windows() ? "09/09/01 01:46:40" : "Sun Sep  9 01:46:40 2001");
+}
+
+TEST(zxtime, the_name_of_the_zone_in_one_letter) {
+  const InZone utc("UTC0");
+  // Wine cuts it short.
+  EXPECT_EQ(text_of(format_time_t(1'000'000'000, "%Z")).substr(0, 2), "UT");
 }
 
 TEST(zxtime, a_form_with_another_letter_has_no_text) {
