@@ -120,53 +120,54 @@ bool scaled(double number, int decimals, std::uint64_t& result) {
 }
 
 // ---- digits of whole numbers
+//
+// Eight digits at a time, each in a byte of one word, the first in the lowest:
+// how many there are is no branch then, which nobody could predict.
 
-constexpr auto make_pairs() {
-  std::array<char, 200> pairs{};
-  for (std::size_t n = 0; n < 100; ++n) {
-    pairs[2 * n] = static_cast<char>('0' + n / 10);
-    pairs[2 * n + 1] = static_cast<char>('0' + n % 10);
+static_assert(std::endian::native == std::endian::little);
+
+constexpr std::uint64_t k_zeros = 0x3030303030303030;
+constexpr std::uint32_t k_beyond_eight = 100'000'000;
+
+// The two halves of each part of a word, by a multiplication instead of a
+// division: parts of 4 digits become parts of 2, these become single ones.
+std::uint64_t eight_digits(std::uint32_t number) {
+  const std::uint64_t by_4 =
+      number / 10'000 | static_cast<std::uint64_t>(number % 10'000) << 32;
+  const std::uint64_t upper_2 = by_4 * 10'486 >> 20 & 0x0000007F0000007F;
+  const std::uint64_t by_2 = upper_2 | (by_4 - 100 * upper_2) << 16;
+  const std::uint64_t upper_1 = by_2 * 103 >> 10 & 0x000F000F000F000F;
+  return upper_1 | (by_2 - 10 * upper_1) << 8;
+}
+
+// All eight, zeros in front included.
+char* put_eight(char* out, std::uint32_t number) {
+  const std::uint64_t digits = eight_digits(number) | k_zeros;
+  std::memcpy(out, &digits, 8);
+  return out + 8;
+}
+
+// A number below k_beyond_eight without zeros in front; it takes 8 bytes.
+char* put_up_to_eight(char* out, std::uint32_t number) {
+  const std::uint64_t digits = eight_digits(number);
+  constexpr std::uint64_t k_last = 1ULL << 56;  // which stays for 0
+  const int zeros = std::countr_zero(digits | k_last) / 8;
+  const std::uint64_t text = (digits | k_zeros) >> (8 * zeros);
+  std::memcpy(out, &text, 8);
+  return out + 8 - zeros;
+}
+
+// Exactly `count` digits, zeros in front included.
+char* put_digits(char* out, std::uint64_t number, int count) {
+  if (count > 8) {
+    out = put_digits(out, number / k_beyond_eight, count - 8);
+    return put_eight(out, static_cast<std::uint32_t>(number % k_beyond_eight));
   }
-  return pairs;
-}
-constexpr auto k_pairs = make_pairs();
-
-char* put_pair(char* out, std::size_t n) {
-  std::memcpy(out, &k_pairs[2 * n], 2);
-  return out + 2;
-}
-
-template <class Word>
-int digit_count(Word number) {
-  constexpr int k_bits = static_cast<int>(8 * sizeof(Word));
-  const int guess = (k_bits - std::countl_zero(number | 1)) * 1233 >> 12;
-  return guess +
-         ((number | 1) >= k_powers_of_10[static_cast<std::size_t>(guess)]);
-}
-
-// Fills in the digits ahead of a place, as many as there are.
-template <class Word>
-void put_digits_ahead(char* end, Word number, int count) {
-  for (; count >= 2; count -= 2, number /= 100)
-    put_pair(end -= 2, static_cast<std::size_t>(number % 100));
-  if (count == 1) end[-1] = static_cast<char>('0' + number % 10);
-}
-
-template <class Word>
-char* put_digits(char* out, Word number, int count) {
-  put_digits_ahead(out + count, number, count);
+  const std::uint64_t text =
+      (eight_digits(static_cast<std::uint32_t>(number)) | k_zeros) >>
+      (8 * (8 - count));
+  std::memcpy(out, &text, static_cast<std::size_t>(count));
   return out + count;
-}
-
-// Halves are cheaper than the whole, far more so on one of the targets.
-char* put_digits_in_parts(char* out, std::uint64_t number, int count) {
-  constexpr std::uint64_t k_part = 1'000'000'000;
-  constexpr int k_part_digits = 9;
-  if (number <= UINT32_MAX && count <= k_part_digits + 1)
-    return put_digits(out, static_cast<std::uint32_t>(number), count);
-  out = put_digits_in_parts(out, number / k_part, count - k_part_digits);
-  return put_digits(out, static_cast<std::uint32_t>(number % k_part),
-                    k_part_digits);
 }
 
 // ---- rounding of decimal text
@@ -270,7 +271,7 @@ void round_to_digits(double number, int count, Digits& digits) {
     std::memset(digits.bytes, '0', static_cast<std::size_t>(count));
     digits.exponent = 0;
   } else if (round_by_whole_number(number, count, rounded)) {
-    put_digits_in_parts(digits.bytes, rounded.whole, count);
+    put_digits(digits.bytes, rounded.whole, count);
     digits.exponent = count - 1 - rounded.decimals;
   } else {
     round_by_text(number, count, digits);
@@ -334,7 +335,7 @@ char* write_with_point(char* out, Scaled number) {
       k_powers_of_10[static_cast<std::size_t>(number.decimals)];
   out = write_whole(out, number.whole / unit);
   *out++ = '.';
-  return put_digits_in_parts(out, number.whole % unit, number.decimals);
+  return put_digits(out, number.whole % unit, number.decimals);
 }
 
 // Takes the zeros at the end of a fraction off, and the point behind which
@@ -354,10 +355,14 @@ char* write_short(char* out, double number) {
   if (static_cast<double>(whole) / k_unit != number) return nullptr;
   constexpr std::uint64_t k_units = 10'000;
   out = write_whole(out, whole / k_units);
-  const auto fraction = static_cast<std::uint32_t>(whole % k_units);
-  if (fraction == 0) return out;
-  *out++ = '.';
-  return strip_zeros(put_digits(out, fraction, 4));
+
+  // The point and the digits up to the last that is not 0.
+  const std::uint64_t digits =
+      eight_digits(static_cast<std::uint32_t>(whole % k_units)) >> 32;
+  const std::uint64_t text = '.' | (digits | (k_zeros >> 32)) << 8;
+  std::memcpy(out, &text, 8);
+  const int used = (64 - std::countl_zero(digits) + 7) / 8;
+  return out + used + (used != 0 ? 1 : 0);
 }
 
 char* fixed(char* out, double number, int precision) {
@@ -428,10 +433,10 @@ char* write_general(char* out, double number, std::int32_t precision,
 }
 
 char* write_whole(char* out, std::uint64_t number) {
-  if (number > UINT32_MAX)
-    return put_digits_in_parts(out, number, digit_count(number));
-  const auto word = static_cast<std::uint32_t>(number);
-  return put_digits(out, word, digit_count(word));
+  if (number < k_beyond_eight)
+    return put_up_to_eight(out, static_cast<std::uint32_t>(number));
+  out = write_whole(out, number / k_beyond_eight);
+  return put_eight(out, static_cast<std::uint32_t>(number % k_beyond_eight));
 }
 
 void append_number(Output& out, double number) {
