@@ -381,9 +381,11 @@ zxStr convert_lines(const zxStr& text, AppendLine append_line) {
   return result;
 }
 
-// Results may take twice a text's length, which must be a length too.
+// Results may take twice a text's length, which must be a length too, with
+// the margin that strings grow by.
 bool has_room_for_twice(const zxStr& text) {
-  return ZX_ASSERT(text.length() <= INT32_MAX / 2);
+  constexpr std::int32_t k_margin = 64;
+  return ZX_ASSERT(text.length() <= (INT32_MAX - k_margin) / 2);
 }
 
 // Moves the bytes of one class by a distance.  A text without any stays
@@ -396,23 +398,6 @@ void shift_class(zxStr& text, unsigned class_bit, int distance) {
   char* const bytes = &text.at(first) - first;
   for (std::int32_t i = first; i < text.length(); ++i)
     if (is_moved(bytes[i])) bytes[i] = static_cast<char>(bytes[i] + distance);
-}
-
-// Text in units of 16 bits, by the code point of each byte.
-template <class CodeOf>
-zxStr to_utf16(const zxStr& text, CodeOf code_of) {
-  if (!has_room_for_twice(text)) return {};
-  zxStr result;
-  char* const start = result.tail(2 * text.length());
-  char* out = start;
-  for (const char byte : text.view()) {
-    const int code = code_of(static_cast<unsigned char>(byte));
-    if (code < 0) continue;
-    *out++ = static_cast<char>(code & 0xFF);
-    *out++ = static_cast<char>(code >> 8);
-  }
-  result.extend(static_cast<std::int32_t>(out - start));
-  return result;
 }
 
 }  // namespace
@@ -451,56 +436,74 @@ void ansi_to_dos(zxStr& text) {
   shift_class(text, k_class_hebrew, -k_dos_distance);
 }
 
+// ---- Unicode
+
 namespace {
 
-// The bytes of a character from the first on; both are stored, and only
+// The one or two bytes that a character becomes; both are stored, and only
 // those that count are kept.
-struct Utf8 {
+struct Unit {
   char bytes[2];
   std::uint8_t size;
 };
 
-constexpr auto make_utf8() {
-  std::array<Utf8, 256> table{};
-  for (int byte = 0; byte < 256; ++byte) {
-    const int code = zxp2l_detail::ansi_code(byte);
-    Utf8& utf8 = table[static_cast<std::size_t>(byte)];
-    if (code < 0)
-      utf8 = {{}, 0};
-    else if (code < 128)
-      utf8 = {{static_cast<char>(code), '\0'}, 1};
-    else
-      utf8 = {{static_cast<char>(0xC0 | code >> 6),
-               static_cast<char>(0x80 | (code & 0x3F))},
-              2};
+class UnitMap {
+ public:
+  template <class UnitOf>
+  constexpr explicit UnitMap(UnitOf unit_of) {
+    for (int byte = 0; byte < 256; ++byte)
+      units[static_cast<std::size_t>(byte)] = unit_of(byte);
   }
-  return table;
-}
-constexpr auto k_utf8 = make_utf8();
+  zxStr encode(const zxStr& text) const;
 
-}  // namespace
+ private:
+  std::array<Unit, 256> units{};
+};
 
-zxStr dos_to_utf16(const zxStr& text) {
-  return to_utf16(text, zxp2l_detail::dos_code);
-}
-
-zxStr ansi_to_utf16(const zxStr& text) {
-  return to_utf16(text, zxp2l_detail::ansi_code);
-}
-
-zxStr ansi_to_utf8(const zxStr& text) {
-  if (!has_room_for_twice(text)) return {};
+zxStr UnitMap::encode(const zxStr& text) const {
   zxStr result;
+  if (!has_room_for_twice(text)) return result;
   char* const start = result.tail(2 * text.length());
   char* out = start;
   for (const char byte : text.view()) {
-    const Utf8& utf8 = k_utf8[static_cast<unsigned char>(byte)];
-    std::memcpy(out, utf8.bytes, 2);
-    out += utf8.size;
+    const Unit& unit = units[static_cast<unsigned char>(byte)];
+    std::memcpy(out, unit.bytes, 2);
+    out += unit.size;
   }
   result.extend(static_cast<std::int32_t>(out - start));
   return result;
 }
+
+constexpr Unit utf8_unit(int code) {
+  if (code < 0) return {{}, 0};
+  if (code < 128) return {{static_cast<char>(code), '\0'}, 1};
+  return {{static_cast<char>(0xC0 | code >> 6),
+           static_cast<char>(0x80 | (code & 0x3F))},
+          2};
+}
+
+constexpr Unit utf16_unit(int code) {
+  if (code < 0) return {{}, 0};
+  return {{static_cast<char>(code & 0xFF), static_cast<char>(code >> 8)}, 2};
+}
+
+constexpr UnitMap k_ansi_to_utf8([](int byte) {
+  return utf8_unit(zxp2l_detail::ansi_code(byte));
+});
+constexpr UnitMap k_ansi_to_utf16([](int byte) {
+  return utf16_unit(zxp2l_detail::ansi_code(byte));
+});
+constexpr UnitMap k_dos_to_utf16([](int byte) {
+  return utf16_unit(zxp2l_detail::dos_code(byte));
+});
+
+}  // namespace
+
+zxStr dos_to_utf16(const zxStr& text) { return k_dos_to_utf16.encode(text); }
+
+zxStr ansi_to_utf16(const zxStr& text) { return k_ansi_to_utf16.encode(text); }
+
+zxStr ansi_to_utf8(const zxStr& text) { return k_ansi_to_utf8.encode(text); }
 
 // ---- straight to UTF-8
 //

@@ -114,7 +114,7 @@ class Directive {
     if (length < k_most) spec[length] = byte;
     ++length;
   }
-  bool is_too_long() const { return length > k_most; }
+  bool is_too_long() const { return length + (has_long ? 1 : 0) > k_most; }
 
   // False if it is too long.
   bool set_bracket(std::string_view text) {
