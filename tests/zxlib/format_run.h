@@ -13,6 +13,7 @@
 #include <utility>
 #include <vector>
 
+#include "kit/failure.h"
 #include "kit/target.h"
 #include "kit/text.h"
 #include "zxplat.h"
@@ -54,6 +55,14 @@ Composed compose(const char* format, const Args&... args) {
   zxFmtEnv env;
   return compose_in(env, format, args...);
 }
+
+// That a statement fails an assertion of this module, whichever of its files
+// that stands in.
+#define EXPECT_SFMT_ASSERTION(statement)                          \
+  EXPECT_TRUE(kit::failure_of([&] {                               \
+                static_cast<void>(statement);                     \
+              }).message.starts_with("1000: bailed out: zxsfmt")) \
+      << #statement
 
 // Time stands still at a moment.
 class Clock {
