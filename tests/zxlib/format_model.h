@@ -61,7 +61,7 @@ enum class Kind {
   good,       // the whole text
   bad,        // a bad format
   assertion,  // a mistake of the program, not of the format
-  not_told,   // nothing is said about this
+  not_told,   // nothing is said about this, or the text would be huge
 };
 
 struct Outcome {
@@ -142,8 +142,11 @@ class Model {
     return c;
   }
   std::string digits() {
+    constexpr long double k_most = 9999;
     std::string found;
     while (is_digit(byte())) found += next();
+    if (found.size() > 40 || (!found.empty() && std::stold(found) > k_most))
+      throw NotTold{};
     return found;
   }
 

@@ -248,7 +248,7 @@ TEST(zxsfmt_directives, an_array_is_joined) {
   EXPECT_EQ(compose("%.2L", texts), good("a  bc\n"));
   EXPECT_EQ(compose("%.0L", texts), good("a  bc\n"));
   EXPECT_EQ(compose("%8L", texts), good("  a  bc\n"));
-  EXPECT_EQ(compose("%10.1L", texts), good(" a\r\n\r\nbc\n"));
+  EXPECT_EQ(compose("%10.1L", texts), good("  a\r\n\r\nbc\n"));
   EXPECT_EQ(compose("%-8L|", texts), good("a  bc\n  |"));
   // Two digits are a precision.
   EXPECT_EQ(compose("%.04L", texts), good("a  b"));

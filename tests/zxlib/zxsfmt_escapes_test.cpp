@@ -258,9 +258,7 @@ TEST(zxsfmt_escapes, only_an_escape_takes_a_table) {
   zxSA<zxStr> table;
   EXPECT_EQ(compose("$$", table), bad("$"));
   EXPECT_EQ(compose("a", table), bad("a"));
-  EXPECT_EQ(compose("#", table), bad("#"));
   EXPECT_EQ(compose("%s", table), bad("%s"));
-  EXPECT_EQ(compose("#$M", table, 1), bad("#$M"));
   EXPECT_EQ(compose("$M", 1, table), bad(""));
 }
 
