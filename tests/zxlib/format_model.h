@@ -132,6 +132,7 @@ class Model {
   static constexpr std::size_t k_spec_limit = 31;
   static constexpr std::size_t k_bracket_limit = 19;
   static constexpr std::size_t k_text_limit = 255;
+  static constexpr std::int64_t k_most = 9999;  // of widths and columns
 
   // ---- the format and the arguments
 
@@ -142,10 +143,11 @@ class Model {
     return c;
   }
   std::string digits() {
-    constexpr long double k_most = 9999;
     std::string found;
     while (is_digit(byte())) found += next();
-    if (found.size() > 40 || (!found.empty() && std::stold(found) > k_most))
+    if (found.size() > 40 ||
+        (!found.empty() &&
+         std::stold(found) > static_cast<long double>(k_most)))
       throw NotTold{};
     return found;
   }
@@ -268,8 +270,7 @@ class Model {
       counted(std::string(1, next()));
       spec.has_l = true;
     }
-    spec.letter = next();
-    if (spec.letter == '\0') throw BadDirective{};
+    spec.letter = next();  // at the format's end it is none that is known
     counted(std::string(1, spec.letter));
     return spec;
   }
@@ -285,6 +286,7 @@ class Model {
     next();
     const Value value = take<BadStar>();
     if (value.tag != 'i') throw BadStar{};
+    if (value.number > k_most || value.number < -k_most) throw NotTold{};
     return counted(std::to_string(value.number));
   }
 
