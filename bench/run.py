@@ -39,7 +39,10 @@ def figure(value):
 
 
 def goal(value):
-    return "-" if value is None else "%.2f" % value
+    if value is None:
+        return "-"
+    text = "%.3f" % value
+    return text[:-1] if text.endswith("0") else text
 
 
 def cells(row):

@@ -118,10 +118,11 @@ find_program(ZX_PYTHON3 python3)
 set(zx_launcher ${CMAKE_CROSSCOMPILING_EMULATOR})
 list(JOIN zx_launcher " " zx_launcher)
 
-# Without Python the check is there, too, and says why it was skipped.
-function(zx_add_check name source)
+# Runs `source` with the program that it checks.  Without Python the check is
+# there, too, and says why it was skipped.
+function(zx_add_check name source program)
   if(ZX_PYTHON3)
-    string(STRIP "${zx_launcher} $<TARGET_FILE:vtx2csv>" command)
+    string(STRIP "${zx_launcher} $<TARGET_FILE:${program}>" command)
     add_test(NAME ${name} WORKING_DIRECTORY ${zx_work_dir}
              COMMAND ${ZX_PYTHON3} ${source} --tool ${command}
                      --bin-dir ${CMAKE_BINARY_DIR}/bin ${ARGN})
@@ -134,10 +135,19 @@ function(zx_add_check name source)
 ZX_BIN_DIR=${CMAKE_BINARY_DIR}/bin;ZX_SOURCE_DIR=${CMAKE_SOURCE_DIR}")
 endfunction()
 
-file(GLOB checks CONFIGURE_DEPENDS ${CMAKE_SOURCE_DIR}/tests/e2e/*_check.py)
-foreach(source IN LISTS checks)
-  cmake_path(GET source STEM stem)
-  zx_add_check(e2e/${stem} ${source} --quick)
-  zx_add_check(e2e/${stem}.slow ${source})
-  set_tests_properties(e2e/${stem}.slow PROPERTIES LABELS slow TIMEOUT 1800)
+# Those of the programs drive the tool; those of a module drive the test
+# program, which carries out a case for them.
+set(zx_check_program_e2e vtx2csv)
+set(zx_check_program_zxlib zx_tests)
+foreach(folder e2e zxlib)
+  file(GLOB checks CONFIGURE_DEPENDS
+       ${CMAKE_SOURCE_DIR}/tests/${folder}/*_check.py)
+  set(program ${zx_check_program_${folder}})
+  foreach(source IN LISTS checks)
+    cmake_path(GET source STEM stem)
+    zx_add_check(${folder}/${stem} ${source} ${program} --quick)
+    zx_add_check(${folder}/${stem}.slow ${source} ${program})
+    set_tests_properties(${folder}/${stem}.slow PROPERTIES LABELS slow
+                         TIMEOUT 1800)
+  endforeach()
 endforeach()

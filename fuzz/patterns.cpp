@@ -20,6 +20,7 @@
 #include <string_view>
 #include <vector>
 
+#include "fuzz/input.h"
 #include "fuzz/targets.h"
 #include "zxregexc.h"
 #include "zxregexe.h"
@@ -66,22 +67,6 @@ Input input_of(Bytes bytes) {
   input.subject = rest.substr(0, k_longest_subject);
   return input;
 }
-
-// A copy that ends where its memory ends, so that no byte behind it can be
-// read unnoticed.
-class Text {
- public:
-  explicit Text(std::string_view text)
-      : size(text.size()), memory(new char[1 + size]) {
-    std::copy(text.begin(), text.end(), memory.get() + 1);
-  }
-  const char* begin() const { return memory.get() + 1; }
-  const char* end() const { return begin() + size; }
-
- private:
-  std::size_t size;
-  std::unique_ptr<char[]> memory;
-};
 
 // ---- programs
 

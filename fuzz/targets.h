@@ -14,8 +14,11 @@ namespace fuzz {
 
 using Bytes = std::span<const std::uint8_t>;
 
-// Patterns: fuzz/patterns.cpp says how the bytes are read.
+// Each source, fuzz/TARGET.cpp, says how the bytes are read.
+void formats(Bytes input);
+void hebrew(Bytes input);
 void patterns(Bytes input);
+void unescape(Bytes input);
 
 // Ends the process unless it holds.
 void require(bool holds, const char* what);

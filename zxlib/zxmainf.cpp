@@ -124,6 +124,7 @@ void init_zxlib_args(int argc, const char* const* argv) {
   std::atexit(clear_at_exit);
   fill_hooks();
   zx_is_started = true;
+  zx_fmt_program = {&g_args, &program_path, &program_name};
   set_program_values(argc > 0 && argv[0] != nullptr ? argv[0] : "");
   for (int i = 1; i < argc; ++i) g_args.append(argv[i]);
   bind_standard_streams();

@@ -9,6 +9,7 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <type_traits>
 
 // ------------------------------------------------------ source positions --
@@ -157,6 +158,37 @@ constexpr char zx_upper(char byte) {
 }
 constexpr char zx_lower(char byte) {
   return zx_is(byte, k_class_upper) ? static_cast<char>(byte + 32) : byte;
+}
+
+// ----------------------------------------------------------------- bytes --
+
+namespace zxmisc_detail {
+// Copies `size` bytes as two overlapping pieces.
+template <std::size_t piece>
+void copy_ends(char* to, const char* from, std::size_t size) {
+  char first[piece], last[piece];
+  std::memcpy(first, from, piece);
+  std::memcpy(last, from + size - piece, piece);
+  std::memcpy(to, first, piece);
+  std::memcpy(to + size - piece, last, piece);
+}
+}  // namespace zxmisc_detail
+
+// Copies text that is short most of the time, when a call would take as long
+// as the copying.  The two places may overlap.
+inline void zx_copy(char* to, const char* from, std::size_t size) {
+  if (size > 32)
+    std::memmove(to, from, size);
+  else if (size >= 16)
+    zxmisc_detail::copy_ends<16>(to, from, size);
+  else if (size >= 8)
+    zxmisc_detail::copy_ends<8>(to, from, size);
+  else if (size >= 4)
+    zxmisc_detail::copy_ends<4>(to, from, size);
+  else if (size >= 2)
+    zxmisc_detail::copy_ends<2>(to, from, size);
+  else if (size == 1)
+    *to = *from;
 }
 
 // ---------------------------------------------------------- checked casts --

@@ -1,108 +1,158 @@
-// zxsfmt.cpp - the format language: scanner and default forms.
-// Tests: tests/zxlib/zxsfmt_test.cpp.
+// zxsfmt.cpp - the format language: scanner, default forms, environments.
+// Tests: tests/zxlib/zxsfmt_test.cpp, zxsfmt_model_test.cpp.
 #include "zxsfmt.h"
 
+#include <array>
+#include <charconv>
 #include <cstring>
+#include <string_view>
 
-#include "zxtext.h"
+#include "zxplat.h"
+#include "zxregexe.h"
+#include "zxsfmt_impl.h"
 
+zxTakeFromList zx_fmt_take_from_list = [](void*, zxFmtArg&, bool&) {
+  return false;
+};
+zxFmtProgram zx_fmt_program = {};
+
+namespace zxsfmt_detail {
 namespace {
 
-// One pass over a format.
+// ---- bytes that mean something
+
+constexpr auto make_special() {
+  std::array<bool, 256> table{};
+  for (const char byte : {'\0', '\n', '#', '%', '$'})
+    table[static_cast<unsigned char>(byte)] = true;
+  return table;
+}
+constexpr auto k_special = make_special();
+
+// The first byte that means something.
+const char* skip_plain(const char* at) {
+  while (!k_special[static_cast<unsigned char>(*at)]) ++at;
+  return at;
+}
+
+// ---- blocks of memory
+
+// The memory of a string that it can write to in place.
+class Block {
+ public:
+  explicit Block(const zxStr& text)
+      : start(reinterpret_cast<std::uintptr_t>(text.c_str())),
+        size(static_cast<std::uintptr_t>(text.capacity())) {}
+
+  bool holds(const void* place) const {
+    return size != 0 && reinterpret_cast<std::uintptr_t>(place) - start <= size;
+  }
+
+ private:
+  std::uintptr_t start;
+  std::uintptr_t size;
+};
+
+// ---- one pass over a format
+
 class Composer {
  public:
-  Composer(zxStr& text, const char* format, std::int32_t arg_count,
-           const zxFmtArg* arg_list)
-      : out(text), at(format), left(arg_count), args(arg_list) {}
+  Composer(zxStr& text, const char* format, zxFmtEnv& environment,
+           std::int32_t arg_count, const zxFmtArg* arg_list)
+      : out(text),
+        out_block(text),
+        at(format),
+        env(environment),
+        left(arg_count),
+        args(arg_list) {}
 
   bool run();
 
  private:
-  bool directive();
-  bool placeholder();
-  bool percent();
-  const zxFmtArg* take() { return left > 0 ? (--left, args++) : nullptr; }
+  // How a directive went.  All but the silent failure of a "*" leave the
+  // rest of the format.
+  enum class Outcome : std::uint8_t { done, failed, failed_silently };
 
-  zxStr& out;
+  static Outcome outcome_of(bool good) {
+    return good ? Outcome::done : Outcome::failed;
+  }
+
+  const zxFmtArg* take();
+  Outcome step();
+  bool placeholder();
+  Outcome percent();
+  bool side(bool is_left);
+  Outcome read(Directive& directive);
+  Outcome read_number(Directive& directive);
+  bool read_bracket(Directive& directive);
+  bool dispatch(const Directive& directive);
+  bool dollar();
+
+  Output out;
+  const Block out_block;
   const char* at;
+  zxFmtEnv& env;
   std::int32_t left;
   const zxFmtArg* args;
+  zxFmtArg element = 0;  // of a list
 };
 
-bool is_mark(char byte) { return byte == '#' || byte == '%' || byte == '$'; }
-
-// The bytes up to the next that means something.
-std::size_t plain_run(const char* text) { return std::strcspn(text, "#%$\n"); }
-
-void append_int(zxStr& out, std::int32_t number) {
-  char room[12];
-  zxText digits(room);
-  digits.add_int(number);
-  out.append(room, zx_count(digits.length()));
-}
-
-template <class T>
-const T& pointee(const zxFmtArg& arg) {
-  return *reinterpret_cast<const T*>(arg.value);
-}
-
-void append_default_form(zxStr& out, const zxFmtArg& arg) {
-  switch (arg.tag) {
-    case 'i':
-      append_int(out, static_cast<std::int32_t>(arg.value));
-      break;
-    case 'c':
-      out.append(static_cast<char>(arg.value));
-      break;
-    case 'z':
-      out.append(reinterpret_cast<const char*>(arg.value));
-      break;
-    case 's':
-      out.append(pointee<zxStr>(arg));
-      break;
-    case 'f':
-      append_number(out, pointee<double>(arg));
-      break;
-    case 't':
-      out.append(pointee<zxDate>(arg).to_text());
-      break;
-    default:
-      ZX_ASSERT(false);
-  }
-}
-
 bool Composer::run() {
-  out.set_length(0);
-  while (*at != '\0') {
-    const std::size_t plain = plain_run(at);
-    if (plain > 0) out.append(at, zx_count(plain));
-    at += plain;
+  for (;;) {
+    const char* const plain = at;
+    at = skip_plain(at);
+    out.add(std::string_view(plain, zx_distance(plain, at)));
+    if (*at == '\0') return left == 0;
     if (*at == '\n') {
-      out.append("\r\n", 2);
+      out.add("\r\n");
       ++at;
-    } else if (*at != '\0' && !directive()) {
-      out.append(at);
-      return false;
+      continue;
     }
+    const char* const mark = at;
+    const Outcome outcome = step();
+    if (outcome == Outcome::done) continue;
+    if (outcome == Outcome::failed) out.add(mark);
+    return false;
   }
-  return left == 0;
 }
 
-// Carries out the directive at `at` and steps over it; on failure `at` stays
-// at its mark.
-bool Composer::directive() {
-  if (is_mark(*at) && at[1] == *at) {
-    out.append(*at);
-    at += 2;
-    return true;
+// The next argument, which lasts until the one behind it is taken; null if
+// there is none, or none that may be used.
+const zxFmtArg* Composer::take() {
+  if (left == 0) return nullptr;
+  const zxFmtArg* arg = args;
+  if (arg->tag == zxFmtArg::k_list) {
+    bool is_last = false;
+    if (!zx_fmt_take_from_list(const_cast<void*>(arg->pointer), element,
+                               is_last))
+      return nullptr;
+    if (is_last) left = 0;
+    arg = &element;
+  } else {
+    --left;
+    ++args;
   }
-  switch (*at) {
+  const bool is_usable =
+      arg->tag != 'z' ||
+      ZX_ASSERT(arg->pointer != nullptr && !out_block.holds(arg->pointer));
+  return is_usable ? arg : nullptr;
+}
+
+// Carries out what stands at a mark and steps over it.
+Composer::Outcome Composer::step() {
+  const char mark = *at++;
+  if (*at == mark) {
+    out.add(mark);
+    ++at;
+    return Outcome::done;
+  }
+  switch (mark) {
     case '#':
-      return placeholder();
-    case '%':
-      return percent();
+      return outcome_of(placeholder());
+    case '$':
+      return outcome_of(dollar());
     default:
-      return false;
+      return percent();
   }
 }
 
@@ -110,30 +160,225 @@ bool Composer::placeholder() {
   const zxFmtArg* arg = take();
   if (arg == nullptr) return false;
   append_default_form(out, *arg);
-  ++at;
   return true;
 }
 
-bool Composer::percent() {
-  if (at[1] != 't') return false;
+bool Composer::dollar() {
+  if (left > 0 && args->tag == zxFmtArg::k_table)
+    env.set_table(static_cast<const zxSA<zxStr>*>(take()->pointer));
+  return append_escape(out, at, env);
+}
+
+// ---- directives
+
+Composer::Outcome Composer::percent() {
+  if (*at == '<' || *at == '>') return outcome_of(side(*at++ == '<'));
+  Directive directive;
+  const Outcome outcome = read(directive);
+  if (outcome != Outcome::done) return outcome;
+  return outcome_of(dispatch(directive));
+}
+
+bool Composer::side(bool is_left) {
   const zxFmtArg* arg = take();
-  if (arg == nullptr || arg->tag != 't') return false;
-  append_default_form(out, *arg);
-  at += 2;
+  if (arg == nullptr) return false;
+  const zxStr text = is_left ? env.fmt_left(*arg) : env.fmt_right(*arg);
+  out.reload();  // it is another's code
+  out.add(text);
   return true;
+}
+
+// %[flags][width][.precision][bracket][l]letter
+Composer::Outcome Composer::read(Directive& directive) {
+  directive.add('%');
+  while (*at == ' ' || *at == '#' || *at == '+' || *at == '-')
+    directive.add(*at++);
+  Outcome outcome = read_number(directive);
+  if (outcome == Outcome::done && *at == '.') {
+    directive.add(*at++);
+    outcome = read_number(directive);
+  }
+  if (outcome != Outcome::done) return outcome;
+  if (*at == '[' && !read_bracket(directive)) return Outcome::failed;
+  if (*at == 'l') {
+    directive.has_long = true;
+    ++at;
+  }
+  directive.add(*at);
+  if (*at != '\0') ++at;
+  return outcome_of(!directive.is_too_long());
+}
+
+// Digits, or the int of a "*".
+Composer::Outcome Composer::read_number(Directive& directive) {
+  if (*at != '*') {
+    while (zx_is_digit(*at)) directive.add(*at++);
+    return Outcome::done;
+  }
+  ++at;
+  const zxFmtArg* arg = take();
+  if (arg == nullptr || arg->tag != 'i') return Outcome::failed_silently;
+  char digits[12];
+  const char* const end =
+      std::to_chars(digits, digits + sizeof digits, arg->number).ptr;
+  for (const char* p = digits; p != end; ++p) directive.add(*p);
+  return Outcome::done;
+}
+
+// False for one that is too long or never ends.
+bool Composer::read_bracket(Directive& directive) {
+  const char* const start = ++at;
+  while (*at != ']')
+    if (*at++ == '\0') return false;
+  return directive.set_bracket({start, zx_distance(start, at++)});
+}
+
+// A value that could not be worked out comes as one of two words, and takes
+// the place of all that stands ahead of it.
+bool replaces_all(const zxFmtArg& arg) {
+  if (arg.tag != 'z') return false;
+  const std::string_view text = static_cast<const char*>(arg.pointer);
+  return text == "err" || text == "void";
+}
+
+bool Composer::dispatch(const Directive& directive) {
+  const zxFmtArg* arg = take();
+  if (arg == nullptr) return false;
+  if (!replaces_all(*arg)) return append_directive(out, directive, *arg);
+  out.replace(static_cast<const char*>(arg->pointer));
+  return true;
+}
+
+// ---- the entries
+
+zxFmtEnv& environment(Entry entry) {
+  static zxFmtEnv environments[static_cast<std::size_t>(Entry::fprint) + 1];
+  return environments[static_cast<std::size_t>(entry)];
 }
 
 }  // namespace
 
-bool sfmt_core(zxStr& out, const char* format, std::int32_t count,
-               const zxFmtArg* args) {
-  return Composer(out, format, count, args).run();
+// ---- default forms
+
+// As in "\xc8".
+static void append_byte(Output& out, std::uint8_t byte) {
+  constexpr std::string_view k_digits = "0123456789abcdef";
+  out.add("\\x");
+  if (byte >= 16) out.add(k_digits[byte >> 4]);
+  out.add(k_digits[byte & 0xF]);
 }
 
-namespace zxsfmt_detail {
+void append_default_form(Output& out, const zxFmtArg& arg) {
+  switch (arg.tag) {
+    case 'i':
+    case 'l':
+      return append_whole(out, arg.number);
+    case 'u':
+    case 'v':
+      return append_whole(out, arg.word);
+    case 'c':
+      out.add(static_cast<char>(arg.number));
+      return;
+    case 'b':
+      return append_byte(out, static_cast<std::uint8_t>(arg.word));
+    case zxFmtArg::k_bool:
+      return out.add(arg.word != 0 ? "true" : "false");
+    case 'f':
+      return append_number(out, arg.real);
+    case 'z':
+      return out.add(static_cast<const char*>(arg.pointer));
+    case 's':
+    case zxFmtArg::k_text:
+      out.add(pointee<zxStr>(arg));
+      return;
+    case 't':
+      out.add(pointee<zxDate>(arg).to_text());
+      return;
+    case 'M':
+      out.add(pointee<zxTime>(arg).to_text());
+      return;
+    case 'm':
+      out.add(format_time_t(moment_of(arg), 0));
+      return;
+    case 'k':
+      out.add(joined(pointee<zxQVA<zxStr>>(arg), " "));
+      return;
+    case 'p':
+      return append_address(out, arg.pointer);
+    default:
+      ZX_ASSERT(false);
+  }
+}
+
+// ---- the result
+
+void Output::reload() {
+  end = string.tail(0);
+  limit =
+      end == nullptr ? nullptr : end + (string.capacity() - string.length());
+}
+
+char* Output::grow(std::int64_t n) {
+  if (!ZX_ASSERT(n <= INT32_MAX)) return nullptr;
+  char* const place = string.tail(static_cast<std::int32_t>(n));
+  if (place == nullptr) return nullptr;
+  end = place;
+  limit = end + (string.capacity() - string.length());
+  return end;
+}
+
+void Output::add_times(char byte, std::int64_t n) {
+  if (n <= 0) return;
+  char* const to = room(n);
+  if (to == nullptr) return;
+  std::memset(to, byte, static_cast<std::size_t>(n));
+  take_to(to + n);
+}
+
+bool compose(Entry entry, zxStr& out, const char* format, std::int32_t count,
+             const zxFmtArg* args) {
+  return sfmt_core(out, format, environment(entry), count, args);
+}
 
 void fail_with_position() { bail_code(2006, pos_string(zx_pos)); }
-void fail() { bail_code(2006); }
-void bail_text(const zxStr& text) { bail_code(0, text); }
+
+void bail_with(bool good, std::int32_t number, const zxStr& text) {
+  good ? bail_code(number, text) : bail_code(2006);
+}
+
+void print(bool good, zxBFile& file, const zxStr& text) {
+  good ? file.puts(text) : bail_code(2006);
+}
+
+void print_in_debugger(bool good, const zxStr& text) {
+  good ? zxplat::process.debug_output(text.c_str()) : bail_code(2006);
+}
 
 }  // namespace zxsfmt_detail
+
+bool sfmt_core(zxStr& out, const char* format, zxFmtEnv& env,
+               std::int32_t count, const zxFmtArg* args) {
+  using namespace zxsfmt_detail;
+  if (Block(out).holds(format)) {
+    const zxStr held = format;
+    return sfmt_core(out, held.c_str(), env, count, args);
+  }
+  if (out.length() != 0) out.set_length(0);
+  if (!ZX_ASSERT(format != nullptr)) return false;
+  return Composer(out, format, env, count, args).run();
+}
+
+// ---- the environment
+
+zxStr zxFmtEnv::fmt_left(const zxFmtArg&) { return {}; }
+zxStr zxFmtEnv::fmt_right(const zxFmtArg&) { return {}; }
+
+zxStr zxFmtEnv::lookup(const zxStr& name) {
+  if (table != nullptr) return table->get(name);
+  zxStr variable = name;
+  variable.to_upper();
+  const char* const value = zxplat::environment_variable(variable.c_str());
+  return value != nullptr ? zxStr(value) : zxStr();
+}
+
+void zxFmtEnv::set_table(const zxSA<zxStr>* entries) { table = entries; }

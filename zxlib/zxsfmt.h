@@ -69,10 +69,11 @@
 //   m    pointer to a time_t   pointer   "dd-mm-yy hh:mm:ss"; null is now
 //   k    array of zxStr        pointer   the strings, a blank between them
 //   p    any other pointer     pointer   its address in hexadecimal
-//   3    zxSA<zxStr>           pointer   nothing: the table of a "$" escape
+//   3    zxSA<zxStr>           pointer   (is the table of a "$" escape)
 //
-// A long or unsigned long beyond 32 bits fails an assertion.  Types that are
-// not here do not compile.
+// "#" with what it cannot show, a table among it, fails an assertion and adds
+// nothing.  A long or unsigned long beyond 32 bits fails an assertion.  Types
+// that are not here do not compile.
 struct zxFmtArg {
   // Tags without a type of their own.
   static constexpr std::uint32_t k_void = 0;    // of a list: no form at all
@@ -234,7 +235,11 @@ enum class Entry : std::uint8_t {
 // What the entries do behind composing; `good` tells how that went.
 bool compose(Entry entry, zxStr& out, const char* format, std::int32_t count,
              const zxFmtArg* args);
-void check_with_position(bool good);
+void fail_with_position();
+inline void check_with_position(bool good) {
+  if (!good) [[unlikely]]
+    fail_with_position();
+}
 void bail_with(bool good, std::int32_t number, const zxStr& text);
 void print(bool good, zxBFile& file, const zxStr& text);
 void print_in_debugger(bool good, const zxStr& text);

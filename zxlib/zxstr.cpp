@@ -29,39 +29,12 @@ std::int32_t sum_of(std::int32_t a, std::int32_t b) {
   return sum > INT32_MAX ? -1 : static_cast<std::int32_t>(sum);
 }
 
-// Copies `size` bytes as two overlapping pieces.
-template <std::size_t piece>
-void copy_ends(char* to, const char* from, std::size_t size) {
-  char first[piece], last[piece];
-  std::memcpy(first, from, piece);
-  std::memcpy(last, from + size - piece, piece);
-  std::memcpy(to, first, piece);
-  std::memcpy(to + size - piece, last, piece);
-}
-
-// Copies text that is short most of the time, when a call would take as long
-// as the copying.  The two places may overlap.
-inline void copy_text(char* to, const char* from, std::size_t size) {
-  if (size > 32)
-    std::memmove(to, from, size);
-  else if (size >= 16)
-    copy_ends<16>(to, from, size);
-  else if (size >= 8)
-    copy_ends<8>(to, from, size);
-  else if (size >= 4)
-    copy_ends<4>(to, from, size);
-  else if (size >= 2)
-    copy_ends<2>(to, from, size);
-  else if (size == 1)
-    *to = *from;
-}
-
 // Sets the characters of a block that is large enough for both pieces; `a`
 // may lie within it.
 void fill(zxStrRep* rep, const char* a, std::int32_t a_length, const char* b,
           std::int32_t b_length) {
-  copy_text(rep->data, a, zx_size(a_length));
-  copy_text(rep->data + a_length, b, zx_size(b_length));
+  zx_copy(rep->data, a, zx_size(a_length));
+  zx_copy(rep->data + a_length, b, zx_size(b_length));
   rep->length = a_length + b_length;
   rep->data[rep->length] = '\0';
 }
@@ -88,7 +61,7 @@ bool zxStr::is_within(const char* place) const {
 // Moves the characters into a new block of capacity n, of this string alone.
 void zxStr::take_exactly(std::int32_t n) {
   zxStrRep* fresh = new_block(n);
-  std::memcpy(fresh->data, rep->data, zx_size(rep->length) + 1);
+  zx_copy(fresh->data, rep->data, zx_size(rep->length) + 1);
   fresh->length = rep->length;
   release();
   rep = fresh;
@@ -189,7 +162,7 @@ void zxStr::build(const char* a, std::int32_t a_length, const char* b,
                          a != nullptr && a_length >= 0 &&
                          a_length <= rep->capacity;
   if (!is_simple) return build_in_general(a, a_length, b, b_length);
-  copy_text(rep->data, a, zx_size(a_length));
+  zx_copy(rep->data, a, zx_size(a_length));
   rep->length = a_length;
   rep->data[a_length] = '\0';
 }
@@ -351,6 +324,19 @@ zxStr& zxStr::append_growing(char byte) {
   return *this;
 }
 
+char* zxStr::tail_growing(std::int32_t n) {
+  if (!check() || !ZX_ASSERT(n >= 0)) return nullptr;
+  const std::int32_t wanted = sum_of(sum_of(rep->length, n), k_margin);
+  if (!ZX_ASSERT(wanted >= k_margin)) return nullptr;
+  if (rep == &zx_empty_rep)
+    rep = new_block(wanted);
+  else if (rep->length + n <= rep->capacity)
+    unshare();
+  else
+    make_room(wanted);
+  return rep->data + rep->length;
+}
+
 zxStr& zxStr::append(const char* characters, std::int32_t size) {
   if (!check() || !ZX_ASSERT(characters != nullptr && size >= 0)) return *this;
   const std::int32_t old_length = rep->length;
@@ -368,7 +354,7 @@ zxStr& zxStr::append(const char* characters, std::int32_t size) {
     make_room(wanted);
     if (own_text) characters = rep->data + offset;
   }
-  copy_text(rep->data + old_length, characters, zx_size(size));
+  zx_copy(rep->data + old_length, characters, zx_size(size));
   rep->length = sum;
   rep->data[sum] = '\0';
   return *this;

@@ -170,6 +170,23 @@ class zxStr {
   zxStr& operator+=(const char* text) { return append(text); }
   zxStr& operator+=(const zxStr& other) { return append(other); }
 
+  // The place behind the text, with room for n more characters in a block that
+  // is not shared; it grows as append() makes it.  The caller writes there,
+  // not beyond the room, and extend() adds what counts.  Null if n was
+  // refused: negative, or beyond what a string can hold.
+  char* tail(std::int32_t n) {
+    zxStrRep& r = *rep;
+    if (!is_sound(r) || r.refs >= 2 || n < 0 || r.capacity - r.length < n)
+        [[unlikely]]
+      return tail_growing(n);
+    return r.data + zx_wide(r.length);
+  }
+  // Up to n of the last tail().
+  void extend(std::int32_t n) {
+    rep->length += n;
+    rep->data[zx_wide(rep->length)] = '\0';
+  }
+
   // ---- the rest
   // Copies the characters and a NUL out; a null buffer, or a size that is not
   // above the length, fails an assertion.
@@ -229,6 +246,7 @@ class zxStr {
     if (rep->refs != 0 && --rep->refs == 0) zx_realloc(rep, 0);
   }
   zxStr& append_growing(char byte);
+  char* tail_growing(std::int32_t n);
   bool is_within(const char* place) const;
   void take_exactly(std::int32_t n);
   void resize_block(std::int32_t n);

@@ -216,12 +216,38 @@ zxStr zxTime::to_text() const {
 
 // ---- moments
 
+std::int64_t start_of_day(zxDate date) {
+  std::int32_t year, month, day;
+  if (!date.get_full(year, month, day)) return -1;
+  const std::int64_t moment = std::int64_t{date.days()} * k_seconds_of_day +
+                              zxplat::standard_zone_offset();
+  return fits_32_bits(moment) ? moment : -1;
+}
+
 std::tm local_fields(std::int64_t moment) {
   std::tm fields = {};
   if (moment >= 1 && zxplat::local_time(moment, fields)) return fields;
   fields = {};
   fields.tm_mday = 1;
   return fields;
+}
+
+// The C library knows more letters, each its own.
+static bool has_known_letters_only(std::string_view form) {
+  constexpr std::string_view k_known = "aAbBcdHIjmMpSUwWxXyYZ%";
+  for (std::size_t at = form.find('%'); at != form.npos;
+       at = form.find('%', at + 2))
+    if (at + 1 == form.size() || k_known.find(form[at + 1]) == k_known.npos)
+      return false;
+  return true;
+}
+
+zxStr format_time_t(std::int64_t moment, const char* form) {
+  if (!has_known_letters_only(form)) return {};
+  constexpr std::size_t k_room = 80;
+  char text[k_room];
+  const std::tm fields = local_fields(moment);
+  return {text, zx_count(std::strftime(text, sizeof text, form, &fields))};
 }
 
 zxStr format_time_t(std::optional<std::int64_t> moment, std::int32_t index) {

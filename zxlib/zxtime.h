@@ -141,6 +141,11 @@ class zxTime {
 };
 static_assert(sizeof(zxTime) == 4);
 
+// The moment at which a day begins, by a clock without daylight saving; -1
+// for one beyond 32 bits.  A date outside the calendar fails an assertion, and
+// is -1 too.
+std::int64_t start_of_day(zxDate date);
+
 // What the local clock shows at a moment, daylight saving included.  A moment
 // below 1 or beyond the year 3000 has no such thing: its fields are all 0,
 // but for the day of the month, which is 1.

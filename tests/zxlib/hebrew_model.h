@@ -9,6 +9,7 @@
 #include <optional>
 #include <string>
 #include <utility>
+#include <vector>
 
 namespace hebrew_model {
 
@@ -102,7 +103,10 @@ inline Run split_run(const Text& text, bool base) {
 
 // ---- reversing
 
-inline Text reverse_run(const Text& source, bool mark) {
+// Windows 95 has percent signs that belong to no number.
+enum class System { any, windows_95 };
+
+inline Text reverse_run(const Text& source, bool mark, System system) {
   Text out;
   int at = static_cast<int>(source.size()) - 1;
   const auto byte = [&](int i) {
@@ -113,7 +117,8 @@ inline Text reverse_run(const Text& source, bool mark) {
       --at;
       continue;
     }
-    const bool percent = byte(at) == '%' && at >= 1 && is_digit(byte(at - 1));
+    const bool percent = system != System::windows_95 && byte(at) == '%' &&
+                         at >= 1 && is_digit(byte(at - 1));
     if (!is_digit(byte(at)) && !percent) {
       out += static_cast<char>(exchanged(byte(at)));
       --at;
@@ -155,7 +160,8 @@ inline bool leads_with_digit(const Text& text) {
   return false;
 }
 
-inline Maybe logical_from_phys(const Text& text, bool base) {
+inline Maybe logical_from_phys(const Text& text, bool base,
+                               System system = System::any) {
   Text rest = to_1255(text);
   Text output;
   while (!rest.empty()) {
@@ -169,7 +175,7 @@ inline Maybe logical_from_phys(const Text& text, bool base) {
     }
     Text piece = rest.substr(0, run.length);
     rest = rest.substr(run.length);
-    if (run.rtl) piece = reverse_run(piece, true);
+    if (run.rtl) piece = reverse_run(piece, true, system);
 
     if (output.empty() && rest.empty()) {
       output = piece;
@@ -186,7 +192,8 @@ inline Maybe logical_from_phys(const Text& text, bool base) {
   return output;
 }
 
-inline Text phys_from_logical(const Text& text, bool base) {
+inline Text phys_from_logical(const Text& text, bool base,
+                              System system = System::any) {
   Text rest = text;
   Text output;
   while (!rest.empty()) {
@@ -195,7 +202,7 @@ inline Text phys_from_logical(const Text& text, bool base) {
     rest = rest.substr(run.length);
     Text piece;
     if (run.rtl) {
-      piece = reverse_run(source, false);
+      piece = reverse_run(source, false, system);
     } else {
       for (const char c : source)
         if (static_cast<unsigned char>(c) != k_ltr_mark) piece += c;
@@ -222,14 +229,17 @@ Maybe by_lines(const Text& text, Convert convert) {
   }
 }
 
-inline Maybe logical_from_phys_lines(const Text& text, bool base) {
-  return by_lines(
-      text, [&](const Text& line) { return logical_from_phys(line, base); });
+inline Maybe logical_from_phys_lines(const Text& text, bool base,
+                                     System system = System::any) {
+  return by_lines(text, [&](const Text& line) {
+    return logical_from_phys(line, base, system);
+  });
 }
 
-inline Maybe phys_from_logical_lines(const Text& text, bool base) {
+inline Maybe phys_from_logical_lines(const Text& text, bool base,
+                                     System system = System::any) {
   return by_lines(text, [&](const Text& line) {
-    return Maybe(phys_from_logical(line, base));
+    return Maybe(phys_from_logical(line, base, system));
   });
 }
 
@@ -243,13 +253,44 @@ inline Text utf8_of(unsigned code) {
   return {c(0xE0 + code / 4096), c(0x80 + code / 64 % 64), c(0x80 + code % 64)};
 }
 
-inline Text ansi_to_utf8(const Text& text) {
-  Text result;
+// The code points of a text whose alef is this byte.
+inline std::vector<unsigned> codes_of(const Text& text, unsigned alef) {
+  std::vector<unsigned> codes;
   for (const char c : text) {
     const auto value = static_cast<unsigned char>(c);
-    const unsigned code = value < 128 ? value : value + 1488U - 224U;
-    if (code < 1515) result += utf8_of(code);
+    const unsigned code = value < 128 ? value : value + 1488U - alef;
+    if (code < 1515) codes.push_back(code);
   }
+  return codes;
+}
+
+inline Text ansi_to_utf8(const Text& text) {
+  Text result;
+  for (const unsigned code : codes_of(text, 224)) result += utf8_of(code);
+  return result;
+}
+
+// Units of two bytes, the low one first.
+inline Text to_utf16(const Text& text, unsigned alef) {
+  Text result;
+  for (const unsigned code : codes_of(text, alef)) {
+    result += static_cast<char>(code % 256);
+    result += static_cast<char>(code / 256);
+  }
+  return result;
+}
+inline Text ansi_to_utf16(const Text& text) { return to_utf16(text, 224); }
+inline Text dos_to_utf16(const Text& text) { return to_utf16(text, 128); }
+
+// What a target file gets of physical text: without the dropped bytes, which
+// are ASCII.
+inline Maybe exported(const Text& text, const Text& dropped,
+                      System system = System::any) {
+  const Maybe logical = logical_from_phys_lines(text, true, system);
+  if (!logical) return {};
+  Text result;
+  for (const char c : ansi_to_utf8(*logical))
+    if (dropped.find(c) == Text::npos) result += c;
   return result;
 }
 

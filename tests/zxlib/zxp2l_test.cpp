@@ -12,14 +12,19 @@
 
 #include <chrono>
 #include <initializer_list>
+#include <memory>
 #include <random>
 #include <string>
 #include <string_view>
 #include <vector>
 
 #include "hebrew_model.h"
+#include "kit/cases.h"
 #include "kit/failure.h"
+#include "kit/failure_road.h"
+#include "kit/target.h"
 #include "kit/text.h"
+#include "zxplat.h"
 
 namespace {
 
@@ -139,6 +144,7 @@ TEST(zxp2l, latin_text_stays_but_its_neutral_ends_change_sides) {
       {"(abc)", "(abc)", "(abc)"},
       {"abc (", ") abc", "abc ("},
       {"abc12", "12abc", "abc12"},
+      {"abc 12", "12 abc", "abc 12"},
       {"a1b", "a1b", "a1b"},
   });
 }
@@ -559,6 +565,194 @@ TEST(zxp2l, every_byte_has_its_utf8) {
             hebrew_model::ansi_to_utf8(all_bytes()));
 }
 
+TEST(zxp2l, hebrew_comes_out_in_units_of_16_bits) {
+  EXPECT_EQ(std_str(ansi_to_utf16("")), "");
+  EXPECT_EQ(std_str(dos_to_utf16("")), "");
+  EXPECT_EQ(std_str(ansi_to_utf16("a\xE0z")), "a\0\xD0\x05z\0"s);
+  EXPECT_EQ(std_str(dos_to_utf16("a\x80z")), "a\0\xD0\x05z\0"s);
+  // Tav is the last letter, the marks are behind it.
+  EXPECT_EQ(std_str(ansi_to_utf16("\xFA\xFB\xFD\xFE\xFF.")), "\xEA\x05.\0"s);
+  EXPECT_EQ(std_str(dos_to_utf16("\x9A\x9B\xE0\xFD\xFE\xFF.")), "\xEA\x05.\0"s);
+  // U+0570 is as far below alef as byte 128 is below byte 224.
+  EXPECT_EQ(std_str(ansi_to_utf16("\x80")), "\x70\x05"s);
+}
+
+// Their results could take twice the length, which must be a length too.
+TEST(zxp2l_slow, a_text_of_half_of_all_lengths_is_an_assertion) {
+  if (kit::on_windows()) GTEST_SKIP() << "no program of 32 bits has the room";
+  constexpr std::int32_t k_length = INT32_MAX / 2 + 1;
+  zxStr text;
+  text.set_length(k_length);
+  using Convert = zxStr (*)(const zxStr&);
+  for (const Convert convert : std::initializer_list<Convert>{
+           [](const zxStr& t) { return logical_from_phys(t, true); },
+           [](const zxStr& t) { return phys_from_logical(t, true); },
+           ansi_to_utf8, ansi_to_utf16, dos_to_utf16}) {
+    EXPECT_ASSERTION(convert(text), "zxp2l");
+    kit::with_failures_dropped([&] { EXPECT_TRUE(convert(text).is_empty()); });
+  }
+}
+
+// One unit, the low byte first.
+std::string unit(int code) {
+  return {static_cast<char>(code % 256), static_cast<char>(code / 256)};
+}
+
+TEST(zxp2l, every_byte_has_its_unit_of_16_bits) {
+  for (int i = 0; i < 256; ++i) {
+    SCOPED_TRACE(i);
+    const zxStr byte = str(std::string(1, static_cast<char>(i)));
+    std::string of_ansi, of_dos;
+    if (i < 128) of_ansi = of_dos = unit(i);
+    if (i >= 128 && i <= 250) of_ansi = unit(0x570 + i - 128);
+    if (i >= 128 && i <= 154) of_dos = unit(0x5D0 + i - 128);
+    EXPECT_EQ(std_str(ansi_to_utf16(byte)), of_ansi);
+    EXPECT_EQ(std_str(dos_to_utf16(byte)), of_dos);
+  }
+  EXPECT_EQ(std_str(ansi_to_utf16(str(all_bytes()))),
+            hebrew_model::ansi_to_utf16(all_bytes()));
+  EXPECT_EQ(std_str(dos_to_utf16(str(all_bytes()))),
+            hebrew_model::dos_to_utf16(all_bytes()));
+}
+
+TEST(zxp2l, a_long_text_is_converted_whole) {
+  const std::string letters(100'000, '\x80');
+  std::string units;
+  for (std::size_t i = 0; i < letters.size(); ++i) units += "\xD0\x05";
+  EXPECT_TRUE(std_str(dos_to_utf16(str(letters))) == units);
+}
+
+// ---- the road of exports
+
+// The result of a conversion into room of exactly the size that it may take.
+std::string exported(const zxLogicalExport& target, const std::string& text) {
+  const std::unique_ptr<char[]> room(
+      new char[zxLogicalExport::room_for(text.size())]);
+  return std::string(target.convert(room.get(), text));
+}
+
+constexpr zxLogicalExport k_whole("");
+constexpr zxLogicalExport k_cells("\",5");
+
+TEST(zxp2l, a_field_is_exported_in_utf8) {
+  struct Field {
+    std::string source;
+    std::string expected;
+  };
+  const Field k_rows[] = {
+      {"", ""},
+      {"\x82\x81\x80", "\xD7\x90\xD7\x91\xD7\x92"},
+      {"\x9A", "\xD7\xAA"},
+      {"\x81 12.5% \x80", "\xD7\x90 12.5% \xD7\x91"},
+      {"\x81 $12 \x80", "\xD7\x90 $12 \xD7\x91"},
+      {"$12 \x80", "\xD7\x90 12$"},
+      {"(\x80", "\xD7\x90)"},
+      {"abc.", ".abc"},
+      {"12 abc", "abc 12"},
+      {"\x81\r\n\r\n\x80.", "\xD7\x91\r\n\r\n.\xD7\x90"},
+      {"\x81\r", "\r\xD7\x91"},
+      {"\x80\xFB\xFE", "\xD7\x90"},
+  };
+  for (const Field& row : k_rows)
+    EXPECT_EQ(exported(k_whole, row.source), row.expected);
+}
+
+TEST(zxp2l, bytes_without_room_in_the_target_are_dropped_at_the_end) {
+  EXPECT_EQ(exported(k_cells, "a,b\"c"), "abc");
+  // They still hold a number together and part it from others.
+  EXPECT_EQ(exported(k_cells, "\x81 12,34 \x80"), "\xD7\x90 1234 \xD7\x91");
+  EXPECT_EQ(exported(k_cells, "\x81 12\"34 \x80"), "\xD7\x90 3412 \xD7\x91");
+  EXPECT_EQ(exported(k_cells, "\x81 1.5% \x80"), "\xD7\x90 1.% \xD7\x91");
+  EXPECT_EQ(exported(k_cells, ",\"5"), "");
+}
+
+TEST(zxp2l, an_export_fails_and_goes_on_as_the_two_conversions) {
+  EXPECT_ASSERTION(exported(k_whole, dos("A<")), "zxp2l");
+  kit::with_failures_dropped([] {
+    EXPECT_EQ(exported(k_whole, dos("CBA<")), exported(k_whole, dos("CBA")));
+    EXPECT_EQ(exported(k_whole, dos("<\r\nBA")),
+              "\r\n" + exported(k_whole, dos("BA")));
+  });
+}
+
+// ---- Windows 95
+
+// On it a percent sign belongs to no number.
+constexpr Row k_percent_rows[] = {
+    {"C50%A", "A%50C", "A%50C"},
+    {"C5%A", "A%5C", "A%5C"},
+    {"5%", "%5", "5%"},
+    {"C%50A", "A50%C", "A50%C"},
+    {"C1%2A", "A2%1C", "A2%1C"},
+    {"C5%%A", "A%%5C", "A%%5C"},
+    {"C12.5%A", "A%12.5C", "A%12.5C"},
+    {"C$50%A", "A%$50C", "A%$50C"},
+    // The sign is not next to the number any more, which needs no mark.
+    {"C5%$A", "A$%5C", "A$%5C"},
+    // Elsewhere nothing is different.
+    {"C 12,345.67 A", "A 12,345.67 C", "A 12,345.67 C"},
+    {"C12$A", "A$>12C", "A$>12C"},
+    {"5% abc", "abc> %5", "5% abc"},
+};
+
+// What differs from the rows there, as text.
+std::string differences_on_windows_95() {
+  std::string found;
+  const auto compare = [&](const char* what, const Row& row,
+                           const std::string& got, const char* expected) {
+    if (got != expected)
+      found += what + " of "s + row.source + ": " + got + "\n";
+  };
+  for (const Row& row : k_percent_rows) {
+    compare("rtl", row, shown(logical(dos(row.source), true), 224), row.rtl);
+    compare("ltr", row, shown(logical(dos(row.source), false), 224), row.ltr);
+  }
+  if (physical(ansi("A 50% C"), true) != dos("C %50 A"))
+    found += "back to display order\n";
+  return found;
+}
+
+// The answers that the platform gives in a case, and how often it was asked.
+int times_asked = 0;
+bool yes() { return ++times_asked > 0; }
+bool no() { return ++times_asked < 0; }
+
+ZX_CASE(zxp2l_on_windows_95) {
+  times_asked = 0;
+  zxplat::process.is_windows_95 = yes;
+  std::string said = differences_on_windows_95();
+  said += "asked " + std::to_string(times_asked);
+  zxplat::process.is_windows_95 = no;
+  said +=
+      differences_on_windows_95() + "; asked " + std::to_string(times_asked);
+  kit::say(said);
+  return 0;
+}
+
+TEST(zxp2l, on_windows_95_a_percent_sign_belongs_to_no_number) {
+  const kit::ProcessResult result = kit::run_case("zxp2l_on_windows_95");
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out, "asked 1; asked 1");
+}
+
+// The same for the road of exports, which may be the first to ask.
+ZX_CASE(zxp2l_exports_on_windows_95) {
+  times_asked = 0;
+  zxplat::process.is_windows_95 = yes;
+  std::string said = exported(k_whole, "b 50% a \x80 5%\x81");
+  zxplat::process.is_windows_95 = no;
+  said += ", " + exported(k_whole, "50%\x80");
+  kit::say(said + ", asked " + std::to_string(times_asked));
+  return 0;
+}
+
+TEST(zxp2l, exports_on_windows_95_are_those_of_its_screens) {
+  const kit::ProcessResult result =
+      kit::run_case("zxp2l_exports_on_windows_95");
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out, "\xD7\x91%5 \xD7\x90 b 50% a, \xD7\x90%50, asked 1");
+}
+
 // ---- against the model
 
 // The alphabets, each a string from which bytes are drawn alike.
@@ -617,7 +811,14 @@ bool agrees(const std::string& line, bool rtl, Convert convert,
   return false;
 }
 
+// The road of exports in the shape of the others; its base is right to left.
+zxStr export_cell(const zxStr& text, bool) {
+  return str(exported(k_cells, std_str(text)));
+}
+
 bool agrees_in_all(const std::string& line) {
+  if (!agrees(line, true, export_cell, hebrew_model::exported(line, "\",5")))
+    return false;
   for (const bool rtl : {true, false})
     if (!agrees(line, rtl, logical_from_phys,
                 hebrew_model::logical_from_phys(line, rtl)) ||
@@ -634,7 +835,10 @@ bool agrees_in_all_as_lines(const std::string& text) {
         !agrees(text, rtl, phys_from_logical_lines,
                 hebrew_model::phys_from_logical_lines(text, rtl)))
       return false;
-  return std_str(ansi_to_utf8(str(text))) == hebrew_model::ansi_to_utf8(text);
+  const zxStr source = str(text);
+  return std_str(ansi_to_utf8(source)) == hebrew_model::ansi_to_utf8(text) &&
+         std_str(ansi_to_utf16(source)) == hebrew_model::ansi_to_utf16(text) &&
+         std_str(dos_to_utf16(source)) == hebrew_model::dos_to_utf16(text);
 }
 
 void compare_random_lines(int count, unsigned seed) {
@@ -643,7 +847,7 @@ void compare_random_lines(int count, unsigned seed) {
     const std::string line = lines.next();
     if (!agrees_in_all(line)) return;
     if (i % 8 == 0 && !agrees_in_all_as_lines(line))
-      FAIL() << "as lines or in UTF-8: '" << shown(line, 128) << "'";
+      FAIL() << "as lines or in Unicode: '" << shown(line, 128) << "'";
   }
 }
 
@@ -665,6 +869,38 @@ TEST(zxp2l, all_short_lines_agree_with_the_model) {
       if (!agrees_in_all(line)) return;
     }
   }
+}
+
+// True if a line without failures has the results of the model.
+bool agrees_on_windows_95(const std::string& line) {
+  constexpr auto k_system = hebrew_model::System::windows_95;
+  for (const bool rtl : {true, false}) {
+    const auto there = hebrew_model::logical_from_phys(line, rtl, k_system);
+    if (there && logical(line, rtl) != *there) return false;
+    const auto back = hebrew_model::phys_from_logical(line, rtl, k_system);
+    if (physical(line, rtl) != back) return false;
+  }
+  const auto cell = hebrew_model::exported(line, "\",5", k_system);
+  return !cell || exported(k_cells, line) == *cell;
+}
+
+ZX_CASE(zxp2l_random_lines_on_windows_95) {
+  zxplat::process.is_windows_95 = yes;
+  Lines lines(3);
+  for (int i = 0; i < 50'000; ++i) {
+    const std::string line = lines.next();
+    if (agrees_on_windows_95(line)) continue;
+    kit::say(shown(line, 128));
+    return 1;
+  }
+  return 0;
+}
+
+TEST(zxp2l, random_lines_on_windows_95_agree_with_the_model) {
+  const kit::ProcessResult result =
+      kit::run_case("zxp2l_random_lines_on_windows_95");
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out, "");
 }
 
 TEST(zxp2l_slow, millions_of_random_lines_agree_with_the_model) {

@@ -1553,6 +1553,110 @@ TEST(zxplat, boxes_are_written_to_standard_error_natively) {
   }
 }
 
+// ------------------------------------------------------ debugger output --
+
+constexpr const char* k_debug_variable = "ZX_DEBUG_OUT";
+
+TEST(zxplat, texts_for_the_debugger_are_added_to_the_file) {
+  const TempDir dir;
+  const Variables variables({k_debug_variable, k_box_variable});
+  kit::set_variable(k_debug_variable, dir.file("texts").c_str());
+  kit::set_variable(k_box_variable, dir.file("boxes").c_str());
+  for (const char* text : {"one", "", "two\n", "a\r\n\xF9%s%n"})
+    zxplat::process.debug_output(text);
+  EXPECT_EQ(kit::read_file(dir.file("texts")), "onetwo\na\r\n\xF9%s%n");
+  EXPECT_EQ(kit::names_in(dir.path()), Names{"texts"});
+}
+
+TEST(zxplat, a_long_text_for_the_debugger_is_written_whole) {
+  const TempDir dir;
+  const Variables variables({k_debug_variable});
+  kit::set_variable(k_debug_variable, dir.file("texts").c_str());
+  const std::string text(100'000, 'x');
+  zxplat::process.debug_output(text.c_str());
+  EXPECT_TRUE(kit::read_file(dir.file("texts")) == text);
+}
+
+ZX_CASE(zxplat_tells_the_debugger) {
+  zxplat::prepare_process();
+  zxplat::process.debug_output("text\n");
+  zxplat::process.debug_output("more");
+  return 3;
+}
+
+// What a process that tells the debugger two texts shows.
+void expect_debugger_told(const kit::ProcessOptions& options,
+                          const std::string& errors) {
+  const kit::ProcessResult result =
+      kit::run_case("zxplat_tells_the_debugger", {}, options);
+  EXPECT_EQ(result.exit_code, 3);
+  EXPECT_EQ(result.err, errors);
+  EXPECT_EQ(result.out, "");
+}
+
+TEST(zxplat, texts_for_the_debugger_can_be_sent_to_standard_error) {
+  kit::ProcessOptions options;
+  options.variables = {{k_debug_variable, "-"}};
+  expect_debugger_told(options, "text\nmore");
+}
+
+TEST(zxplat, texts_for_the_debugger_are_nowhere_without_a_place) {
+  const TempDir dir;
+  kit::ProcessOptions unset;
+  unset.removed_variables = {k_debug_variable};
+  kit::ProcessOptions empty;
+  empty.variables = {{k_debug_variable, ""}};
+  kit::ProcessOptions not_to_be_opened;
+  not_to_be_opened.variables = {{k_debug_variable, dir.file("no\\texts")}};
+  for (auto options : {unset, empty, not_to_be_opened}) {
+    options.directory = dir.path();
+    expect_debugger_told(options, "");
+  }
+  EXPECT_EQ(kit::names_in(dir.path()), Names{});
+}
+
+// ----------------------------------------------------------- environment --
+
+ZX_CASE(zxplat_shows_variables) {
+  for (int i = 1; i < argc; ++i) {
+    const char* value = zxplat::environment_variable(argv[i]);
+    std::string shown = "none";
+    if (value != nullptr) shown = std::string("'") + value + "'";
+    zxplat::write_all(zxplat::k_stdout_fd, shown + ";");
+  }
+  return 0;
+}
+
+TEST(zxplat, the_environment_has_values_for_names) {
+  kit::ProcessOptions options;
+  options.variables = {{"ZX_TEST_ONE", "a b=c %s\xF9"},
+                       {"ZX_TEST_ONE_MORE", "longer"}};
+  options.removed_variables = {"ZX_TEST_TWO"};
+  const kit::ProcessResult result = kit::run_case(
+      "zxplat_shows_variables",
+      {"ZX_TEST_ONE", "ZX_TEST_ONE_MORE", "ZX_TEST_TWO", "ZX_TEST_ON", ""},
+      options);
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out, "'a b=c %s\xF9';'longer';none;none;none;");
+}
+
+TEST(zxplat, a_changed_environment_is_seen) {
+  constexpr const char* k_name = "ZX_TEST_CHANGED";
+  const Variables variables({k_name});
+  EXPECT_EQ(zxplat::environment_variable(k_name), nullptr);
+  for (const char* value : {"x", "another, longer value"}) {
+    kit::set_variable(k_name, value);
+    EXPECT_STREQ(zxplat::environment_variable(k_name), value);
+  }
+  kit::set_variable(k_name, nullptr);
+  EXPECT_EQ(zxplat::environment_variable(k_name), nullptr);
+}
+
+TEST(zxplat, no_system_of_these_days_is_windows_95) {
+  EXPECT_FALSE(zxplat::process.is_windows_95());
+  EXPECT_FALSE(zxplat::system_process.is_windows_95());
+}
+
 // ---------------------------------------------------------------- faults --
 
 // Functions that end in a fault, and where their frame is then.  Sanitizers

@@ -1,22 +1,19 @@
 // zxsfmt_test.cpp - the format language: which types are arguments, plain
-// text, default forms, bad formats, the entries, and the text of doubles
-// against a model.  zxsfmt_directives_test.cpp has the "%" directives,
-// zxsfmt_table_test.cpp all of them by all tags, zxsfmt_escapes_test.cpp the
-// "$" escapes, environments and lists, zxsfmt_model_test.cpp random formats.
+// text, default forms, bad formats, the entries.  More of it is in
+//   zxsfmt_directives_test.cpp  the "%" directives, limits and aliases
+//   zxsfmt_table_test.cpp       each directive by each tag
+//   zxsfmt_escapes_test.cpp     the "$" escapes, environments, lists
+//   zxsfmt_number_test.cpp      the text of numbers
+//   zxsfmt_picture_test.cpp     pictures of numbers
+//   zxsfmt_model_test.cpp       random formats against a second interpreter
+//   zxsfmt_page_test.cpp        the examples of the page
 // Tests zxlib/zxsfmt.h and zxsfmt*.cpp.
 #include "zxsfmt.h"
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
-#include <bit>
 #include <climits>
-#include <cmath>
 #include <cstdint>
-#include <cstdio>
-#include <cstdlib>
-#include <limits>
-#include <random>
 #include <string>
 #include <string_view>
 #include <type_traits>
@@ -28,6 +25,7 @@
 #include "kit/tempdir.h"
 #include "kit/text.h"
 #include "zxmainf.h"
+#include "zxplat.h"
 
 namespace {
 
@@ -39,12 +37,6 @@ using kit::read_file;
 using kit::TempDir;
 using kit::text_of;
 using namespace std::string_literals;
-
-std::string number_text(double number) {
-  zxStr text;
-  append_number(text, number);
-  return text_of(text);
-}
 
 // ---- which types have a form
 
@@ -627,250 +619,6 @@ TEST(zxsfmt, bailf_takes_sixteen_arguments) {
             1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15, 16),
       "########,########,1,2,3,4,5,6,7,8,9,10,11,12,13,14,15,16",
       "[0-0-0/E-0/E/########,###/]");
-}
-
-// ---- the text of doubles
-
-TEST(zxsfmt, numbers_worked_out_by_hand) {
-  using limits = std::numeric_limits<double>;
-  const struct {
-    double number;
-    const char* text;
-  } rows[] = {
-      {0.0, "0"},
-      {-0.0, "-0"},
-      {1.0, "1"},
-      {-1.0, "-1"},
-      {10.0, "10"},
-      {12.5, "12.5"},
-      {0.1, "0.1"},
-      {-0.001, "-0.001"},
-      {1.0 / 3.0, "0.333333333333333"},
-      {2.0 / 3.0, "0.666666666666667"},
-      {200.0 / 3.0, "66.6666666666667"},
-      {100000.0, "100000"},
-      {123456789.0, "123456789"},
-      {123456789012345.0, "123456789012345"},
-      {1234567890123456.0, "1.23456789012346e+015"},
-      {1e14, "100000000000000"},
-      {1e15, "1e+015"},
-      {-1e15, "-1e+015"},
-      {999999999999999.0, "999999999999999"},
-      {999999999999999.875, "1e+015"},
-      {0.0001, "0.0001"},
-      {0.00012, "0.00012"},
-      {0.00001234, "1.234e-005"},
-      {0.00009999999999999999, "0.0001"},
-      {0.0000999999999999999, "9.99999999999999e-005"},
-      {0.00000001, "1e-008"},
-      {1e99, "1e+099"},
-      {1e100, "1e+100"},
-      {1e-99, "1e-099"},
-      {1e-100, "1e-100"},
-      {1.7976931348623157e308, "1.79769313486232e+308"},
-      {2.2250738585072014e-308, "2.2250738585072e-308"},
-      {4.9406564584124654e-324, "4.94065645841247e-324"},
-      {-4.9406564584124654e-324, "-4.94065645841247e-324"},
-      {limits::infinity(), "inf"},
-      {-limits::infinity(), "-inf"},
-      {limits::quiet_NaN(), "nan"},
-      {-limits::quiet_NaN(), "nan"},
-  };
-  for (const auto& row : rows) {
-    EXPECT_EQ(number_text(row.number), row.text);
-    EXPECT_EQ(text_of(sfmt("#", row.number)), row.text);
-  }
-}
-
-// Numbers exactly half-way between two texts of 15 digits.  Going to the even
-// digit would give another text for most of them.
-TEST(zxsfmt, exact_ties_go_away_from_zero) {
-  const struct {
-    double number;
-    const char* text;
-  } rows[] = {
-      {1234567890123.125, "1234567890123.13"},
-      {-1234567890123.125, "-1234567890123.13"},
-      {123456789012344.5, "123456789012345"},
-      {100000000000000.5, "100000000000001"},
-      {4398046511104.125, "4398046511104.13"},  // 2^42 + 1/8
-      {1000000000000005.0, "1.00000000000001e+015"},
-      {-1000000000000005.0, "-1.00000000000001e+015"},
-      {1234567890123465.0, "1.23456789012347e+015"},
-      {10000000000000050.0, "1.00000000000001e+016"},
-      {2.384185791015625e-7, "2.38418579101563e-007"},  // 2^-22
-      {-2.384185791015625e-7, "-2.38418579101563e-007"},
-      {4.76837158203125e-7, "4.76837158203125e-007"},  // 2^-21, 15 digits
-      {999999999999999.5, "1e+015"},
-      {9007199254740985.0, "9.00719925474099e+015"},
-  };
-  for (const auto& row : rows) EXPECT_EQ(number_text(row.number), row.text);
-}
-
-TEST(zxsfmt, the_neighbours_of_a_tie_go_to_their_own_side) {
-  constexpr double k_tie = 1234567890123.125;
-  EXPECT_EQ(number_text(std::nextafter(k_tie, 0.0)), "1234567890123.12");
-  EXPECT_EQ(number_text(std::nextafter(k_tie, 2e12)), "1234567890123.13");
-}
-
-TEST(zxsfmt, a_number_is_appended_to_what_is_there) {
-  zxStr text = "x=";
-  append_number(text, -2.5);
-  EXPECT_EQ(text_of(text), "x=-2.5");
-}
-
-// A number as digits and a power of ten: d.dd... x 10^exponent, of exactly
-// 15 digits.
-struct Digits {
-  bool negative;
-  std::uint64_t digits;
-  int exponent;
-};
-
-constexpr std::uint64_t k_ten_to_14 = 100'000'000'000'000;
-constexpr std::uint64_t k_ten_to_15 = 10 * k_ten_to_14;
-constexpr std::uint64_t k_ten_to_16 = 10 * k_ten_to_15;
-
-std::string with_point(std::string digits, std::size_t place) {
-  digits.insert(place, ".");
-  while (digits.back() == '0') digits.pop_back();
-  if (digits.back() == '.') digits.pop_back();
-  return digits;
-}
-
-std::string exponent_text(int exponent) {
-  char text[16];
-  std::snprintf(text, sizeof text, "e%c%03d", exponent < 0 ? '-' : '+',
-                std::abs(exponent));
-  return text;
-}
-
-// The digits laid out as the default form asks.
-std::string laid_out(const Digits& number) {
-  const std::string digits = std::to_string(number.digits);
-  const std::string sign = number.negative ? "-" : "";
-  const int exponent = number.exponent;
-  if (exponent < -4 || exponent >= 15)
-    return sign + with_point(digits, 1) + exponent_text(exponent);
-  if (exponent >= 0)
-    return sign + with_point(digits, static_cast<std::size_t>(exponent) + 1);
-  const std::string zeros(static_cast<std::size_t>(-exponent), '0');
-  return sign + with_point(zeros + digits, 1);
-}
-
-// The text of a number of 16 digits that ends in 5, with the power of ten of
-// its first digit.
-std::string text_of_tie(bool negative, std::uint64_t digits, int exponent) {
-  std::uint64_t rounded = digits / 10 + 1;
-  if (rounded == k_ten_to_15) {
-    rounded = k_ten_to_14;
-    ++exponent;
-  }
-  return laid_out({negative, rounded, exponent});
-}
-
-// True, with the digits, if the number has exactly 16 digits of which the
-// last is a 5.  With an odd m and x = m / 2^k the digits are those of
-// m * 5^k, and the last is a 5 by itself; in whole numbers it has to be
-// looked for.
-bool is_tie(double x, std::uint64_t& digits, int& exponent) {
-  int power = 0;
-  const double fraction = std::frexp(std::fabs(x), &power);
-  auto m = static_cast<std::uint64_t>(std::ldexp(fraction, 53));
-  if (m == 0) return false;
-  int k = 53 - power;
-  for (; m % 2 == 0; m /= 2) --k;
-  if (k < 0) {  // the one even number of this kind: 10 times 16 digits
-    digits = m / 5;
-    exponent = 16;
-    return k == -1 && m % 50 == 25 && digits >= k_ten_to_15;
-  }
-  if (k > 22) return false;
-  for (int i = 0; i < k; ++i) {
-    if (m > k_ten_to_16 / 5) return false;
-    m *= 5;
-  }
-  digits = m;
-  exponent = 15 - k;
-  return m >= k_ten_to_15 && m < k_ten_to_16 && m % 10 == 5;
-}
-
-// The run time's text, its exponent widened, ties corrected.
-std::string expected_text(double x) {
-  if (std::isnan(x)) return "nan";
-  if (std::isinf(x)) return x < 0 ? "-inf" : "inf";
-  std::uint64_t digits = 0;
-  int exponent = 0;
-  if (is_tie(x, digits, exponent))
-    return text_of_tie(std::signbit(x), digits, exponent);
-  char buffer[64];
-  std::snprintf(buffer, sizeof buffer, "%.15g", x);
-  std::string text = buffer;
-  const std::size_t e = text.find('e');
-  if (e == text.npos) return text;
-  return text.substr(0, e) + exponent_text(std::atoi(text.c_str() + e + 1));
-}
-
-void expect_random_numbers(std::uint64_t count, unsigned seed) {
-  std::mt19937_64 random(seed);
-  zxStr text;
-  for (std::uint64_t i = 0; i < count; ++i) {
-    const std::uint64_t bits = random();
-    const double x = std::bit_cast<double>(bits);
-    text.set_length(0);
-    append_number(text, x);
-    const std::string expected = expected_text(x);
-    ASSERT_EQ(text.view(), expected) << std::hex << bits;
-  }
-}
-
-TEST(zxsfmt, the_model_knows_ties_by_hand) {
-  EXPECT_EQ(expected_text(1234567890123.125), "1234567890123.13");
-  EXPECT_EQ(expected_text(1000000000000005.0), "1.00000000000001e+015");
-  EXPECT_EQ(expected_text(10000000000000050.0), "1.00000000000001e+016");
-  EXPECT_EQ(expected_text(999999999999999.5), "1e+015");
-  EXPECT_EQ(expected_text(std::ldexp(1.0, -22)), "2.38418579101563e-007");
-  EXPECT_EQ(laid_out({true, 123'450'000'000'000, -2}), "-0.012345");
-  EXPECT_EQ(laid_out({false, 120'000'000'000'000, 2}), "120");
-}
-
-TEST(zxsfmt, random_bits_are_numbers_as_the_run_time_writes_them) {
-  expect_random_numbers(1'000'000, 1);
-}
-
-// Numbers of everyday size: random bits are nearly always huge or tiny.
-TEST(zxsfmt, decimal_numbers_are_as_the_run_time_writes_them) {
-  std::mt19937_64 random(2);
-  for (int i = 0; i < 300'000; ++i) {
-    const auto whole = static_cast<double>(
-        static_cast<std::int64_t>(random()) >> (random() % 64));
-    const double x = whole / std::pow(10.0, static_cast<int>(random() % 12));
-    ASSERT_EQ(number_text(x), expected_text(x)) << i;
-  }
-}
-
-TEST(zxsfmt, random_ties_go_away_from_zero) {
-  std::mt19937_64 random(3);
-  constexpr std::uint64_t k_largest = std::uint64_t{1} << 53;
-  std::uint64_t scale = 1;  // 5^k
-  for (int k = 0; k <= 22; ++k, scale *= 5) {
-    const std::uint64_t low = (k_ten_to_15 + scale - 1) / scale;
-    const std::uint64_t high = std::min((k_ten_to_16 - 1) / scale, k_largest);
-    for (int i = 0; i < 5000; ++i) {
-      const std::uint64_t m = (low + random() % (high - low + 1)) | 1;
-      const std::uint64_t digits = m * scale;
-      if (m > high || digits % 10 != 5) continue;
-      const bool negative = random() % 2 != 0;
-      const double x =
-          std::ldexp(static_cast<double>(m), -k) * (negative ? -1 : 1);
-      ASSERT_EQ(number_text(x), text_of_tie(negative, digits, 15 - k))
-          << m << " / 2^" << k;
-    }
-  }
-}
-
-TEST(zxsfmt_slow, fifty_million_random_numbers) {
-  expect_random_numbers(50'000'000, 4);
 }
 
 }  // namespace

@@ -906,7 +906,120 @@ TEST(zxtime, a_moment_without_a_local_time_shows_as_zeros) {
 
 TEST(zxtime, the_first_moment_has_a_local_time) {
   const InZone utc("UTC0");
-  EXPECT_EQ(text_of(format_time_t(1, 0)), "01-01-70 00:00:01");
+  EXPECT_EQ(text_of(format_time_t(std::optional<std::int64_t>(1), 0)),
+            "01-01-70 00:00:01");
+}
+
+// ---- forms of one's own
+
+// 2001-09-09 01:46:40 was a Sunday, 2009-07-01 12:00:00 a Wednesday and
+// 1970-01-01 00:00:01 a Thursday, UTC.  Week 1 of %U starts with the first
+// Sunday of a year, that of %W with the first Monday.
+constexpr std::int64_t k_moments[] = {1'000'000'000, 1'246'449'600, 1};
+
+struct Letter {
+  const char* form;
+  const char* texts[std::size(k_moments)];
+};
+
+TEST(zxtime, the_letters_of_forms) {
+  const InZone utc("UTC0");
+  const Letter k_rows[] = {
+      {"%a", {"Sun", "Wed", "Thu"}},
+      {"%A", {"Sunday", "Wednesday", "Thursday"}},
+      {"%b", {"Sep", "Jul", "Jan"}},
+      {"%B", {"September", "July", "January"}},
+      {"%d", {"09", "01", "01"}},
+      {"%H", {"01", "12", "00"}},
+      {"%I", {"01", "12", "12"}},
+      {"%j", {"252", "182", "001"}},
+      {"%m", {"09", "07", "01"}},
+      {"%M", {"46", "00", "00"}},
+      {"%p", {"AM", "PM", "AM"}},
+      {"%S", {"40", "00", "01"}},
+      {"%U", {"36", "26", "00"}},
+      {"%w", {"0", "3", "4"}},
+      {"%W", {"36", "26", "00"}},
+      {"%x", {"09/09/01", "07/01/09", "01/01/70"}},
+      {"%X", {"01:46:40", "12:00:00", "00:00:01"}},
+      {"%y", {"01", "09", "70"}},
+      {"%Y", {"2001", "2009", "1970"}},
+      {"%%", {"%", "%", "%"}},
+      {"", {"", "", ""}},
+      {"%Y%m%d-%H%M%S",
+       {"20010909-014640", "20090701-120000", "19700101-000001"}},
+      {" a%%Y \xE0\n%d.",
+       {" a%Y \xE0\n09.", " a%Y \xE0\n01.", " a%Y \xE0\n01."}},
+  };
+  for (const Letter& row : k_rows)
+    for (std::size_t i = 0; i < std::size(k_moments); ++i)
+      EXPECT_EQ(text_of(format_time_t(k_moments[i], row.form)), row.texts[i])
+          << row.form;
+}
+
+// The C locales of the systems do not agree on this one.
+TEST(zxtime, date_and_time_in_one_letter) {
+  const InZone utc("UTC0");
+  EXPECT_EQ(
+      text_of(format_time_t(1'000'000'000, "%c")),
+      kit::on_windows() ? "09/09/01 01:46:40" : "Sun Sep  9 01:46:40 2001");
+}
+
+TEST(zxtime, the_name_of_the_zone_in_one_letter) {
+  const InZone utc("UTC0");
+  // Wine cuts it short.
+  EXPECT_EQ(text_of(format_time_t(1'000'000'000, "%Z")).substr(0, 2), "UT");
+}
+
+TEST(zxtime, a_form_with_another_letter_has_no_text) {
+  const InZone utc("UTC0");
+  const std::string k_letters = "aAbBcdHIjmMpSUwWxXyYZ%";
+  for (int byte = 1; byte < 256; ++byte) {
+    SCOPED_TRACE(byte);
+    const char letter = static_cast<char>(byte);
+    const bool is_known = k_letters.find(letter) != k_letters.npos;
+    const std::string form = std::string("%d%") + letter + "%m";
+    const std::string text =
+        text_of(format_time_t(1'000'000'000, form.c_str()));
+    EXPECT_EQ(text.empty(), !is_known) << text;
+  }
+  for (const char* form : {"%", "abc%", "%%%", "%d%", "%5d", "%-d", "%#d",
+                           "%Ey", "%Od", "% d", "%\n"})
+    EXPECT_EQ(text_of(format_time_t(1'000'000'000, form)), "") << form;
+}
+
+TEST(zxtime, a_text_of_a_form_has_up_to_79_bytes) {
+  const InZone utc("UTC0");
+  const auto shown = [](const std::string& form) {
+    return text_of(format_time_t(1'000'000'000, form.c_str()));
+  };
+  EXPECT_EQ(shown(std::string(79, 'x')), std::string(79, 'x'));
+  EXPECT_EQ(shown(std::string(80, 'x')), "");
+  EXPECT_EQ(shown(std::string(75, 'x') + "%Y"), std::string(75, 'x') + "2001");
+  EXPECT_EQ(shown(std::string(76, 'x') + "%Y"), "");
+  EXPECT_EQ(shown(std::string(10'000, 'x')), "");
+  // The form itself may be longer.
+  std::string form, text;
+  for (int i = 0; i < 79; ++i) form += "%w", text += '0';
+  EXPECT_EQ(shown(form), text);
+  EXPECT_EQ(shown(form + "%w"), "");
+}
+
+TEST(zxtime, forms_show_the_local_clock) {
+  const auto shown_in = [](const char* zone) {
+    const InZone here(zone);
+    return text_of(format_time_t(1'000'000'000, "%a %d %H:%M"));
+  };
+  EXPECT_EQ(shown_in("UTC0"), "Sun 09 01:46");
+  EXPECT_EQ(shown_in("EST5"), "Sat 08 20:46");
+  EXPECT_EQ(shown_in("NPT-5:45"), "Sun 09 07:31");
+}
+
+TEST(zxtime, a_form_of_a_moment_without_a_local_time_shows_zeros) {
+  for (const std::int64_t moment :
+       {std::int64_t{0}, std::int64_t{-1}, std::int64_t{32'535'216'000}})
+    EXPECT_EQ(text_of(format_time_t(moment, "%Y-%m-%d %H:%M:%S %y %j %w")),
+              "1900-01-01 00:00:00 00 001 0");
 }
 
 // ---- zones that save daylight: in processes of their own, since a runtime may
