@@ -227,6 +227,7 @@ class Setting {
   const format_run::InZone zone{"UTC0"};
   const format_run::Variable variable_a{"A", "value of A"};
   const format_run::Variable variable_b{"B", nullptr};
+  const format_run::Variable underline{"_", nullptr};  // shells set it
   const format_run::Clock clock{k_moment};
   const format_run::Lists lists;
 };
