@@ -118,7 +118,7 @@ bool Composer::run() {
 }
 
 // The next argument, which lasts until the one behind it is taken; null if
-// there is none, or none that may be used.
+// there is none.  A text that must not be read fails and counts as empty.
 const zxFmtArg* Composer::take() {
   if (left == 0) return nullptr;
   const zxFmtArg* arg = args;
@@ -133,10 +133,11 @@ const zxFmtArg* Composer::take() {
     --left;
     ++args;
   }
-  const bool is_usable =
-      arg->tag != 'z' ||
-      ZX_ASSERT(arg->pointer != nullptr && !out_block.holds(arg->pointer));
-  return is_usable ? arg : nullptr;
+  if (arg->tag != 'z' ||
+      ZX_ASSERT(arg->pointer != nullptr && !out_block.holds(arg->pointer)))
+    return arg;
+  element = "";
+  return &element;
 }
 
 // Carries out what stands at a mark and steps over it.

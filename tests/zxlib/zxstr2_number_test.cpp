@@ -86,7 +86,7 @@ void expect_long_of_model(const std::string& text) {
   ASSERT_EQ(parse_long(text.c_str()), slow_parse_long(text)) << text;
 }
 
-TEST(zxstr2, parse_long_reads_whole_numbers) {
+TEST(zxstr2_number, parse_long_reads_whole_numbers) {
   const struct {
     std::string_view text;
     std::int32_t value;
@@ -190,16 +190,17 @@ TEST(zxstr2, parse_long_reads_whole_numbers) {
   }
 }
 
-TEST(zxstr2, parse_long_of_short_texts_agrees_with_the_slow_model) {
+TEST(zxstr2_number, parse_long_of_short_texts_agrees_with_the_slow_model) {
   for_all_texts("019,.-kMe ", 6, expect_long_of_model);
   for_all_texts("2,+mKk\t", 5, expect_long_of_model);
 }
 
-TEST(zxstr2_slow, parse_long_of_longer_texts_agrees_with_the_slow_model) {
+TEST(zxstr2_number_slow,
+     parse_long_of_longer_texts_agrees_with_the_slow_model) {
   for_all_texts("019,.-kMe ", 7, expect_long_of_model);
 }
 
-TEST(zxstr2, parse_long_of_random_digits_wraps_as_the_slow_model) {
+TEST(zxstr2_number, parse_long_of_random_digits_wraps_as_the_slow_model) {
   constexpr unsigned k_seed = 1414;
   std::printf("seed %u\n", k_seed);
   std::mt19937 random(k_seed);
@@ -214,7 +215,7 @@ TEST(zxstr2, parse_long_of_random_digits_wraps_as_the_slow_model) {
   }
 }
 
-TEST(zxstr2, parse_hex_reads_hexadecimal_digits) {
+TEST(zxstr2_number, parse_hex_reads_hexadecimal_digits) {
   const struct {
     std::string_view text;
     std::uint32_t value;
@@ -272,7 +273,7 @@ TEST(zxstr2, parse_hex_reads_hexadecimal_digits) {
         << testing::PrintToString(row.text);
 }
 
-TEST(zxstr2, parse_hex_knows_every_byte) {
+TEST(zxstr2_number, parse_hex_knows_every_byte) {
   for (int byte = 0; byte < 256; ++byte) {
     const char text[] = {'1', static_cast<char>(byte), '2'};
     const std::size_t lower = "0123456789abcdef"s.find(text[1]);
@@ -284,7 +285,7 @@ TEST(zxstr2, parse_hex_knows_every_byte) {
   }
 }
 
-TEST(zxstr2, parse_hex_gives_back_what_is_printed) {
+TEST(zxstr2_number, parse_hex_gives_back_what_is_printed) {
   for (std::uint64_t value = 1; value <= 0xFFFFFFFF; value = value * 3 + 1) {
     char text[20];
     std::snprintf(text, sizeof text, "%llx",
@@ -364,7 +365,7 @@ void expect_double_of_model(const std::string& text) {
 
 constexpr double k_infinity = std::numeric_limits<double>::infinity();
 
-TEST(zxstr2, parse_double_reads_numbers) {
+TEST(zxstr2_number, parse_double_reads_numbers) {
   const struct {
     std::string_view text;
     double value;
@@ -470,7 +471,7 @@ TEST(zxstr2, parse_double_reads_numbers) {
   }
 }
 
-TEST(zxstr2, parse_double_beyond_the_largest_is_infinity) {
+TEST(zxstr2_number, parse_double_beyond_the_largest_is_infinity) {
   const std::string nines(400, '9');
   const struct {
     std::string text;
@@ -500,7 +501,7 @@ TEST(zxstr2, parse_double_beyond_the_largest_is_infinity) {
   for (const auto& row : rows) expect_double(row.text, row.value);
 }
 
-TEST(zxstr2, parse_double_below_the_smallest_is_0) {
+TEST(zxstr2_number, parse_double_below_the_smallest_is_0) {
   const struct {
     std::string text;
     double value;
@@ -525,7 +526,8 @@ TEST(zxstr2, parse_double_below_the_smallest_is_0) {
   for (const auto& row : rows) expect_double(row.text, row.value);
 }
 
-TEST(zxstr2, parse_double_weighs_exponents_against_any_number_of_digits) {
+TEST(zxstr2_number,
+     parse_double_weighs_exponents_against_any_number_of_digits) {
   constexpr std::size_t k_many = 1000000;
   const std::string zeros(k_many, '0');
   expect_double("1" + zeros + "e-1000000", 1.0);
@@ -574,7 +576,7 @@ void expect_tie(const std::string& tie, double below, double above) {
     expect_double(less + point + std::string(nines, '9'), below);
 }
 
-TEST(zxstr2, parse_double_rounds_to_the_nearest_and_ties_to_even) {
+TEST(zxstr2_number, parse_double_rounds_to_the_nearest_and_ties_to_even) {
   expect_tie("9007199254740993", 0x1p53, 0x1.0000000000001p53);
   expect_tie("9007199254740995", 0x1.0000000000001p53, 0x1.0000000000002p53);
   expect_tie("4503599627370496.5", 0x1p52, 0x1.0000000000001p52);
@@ -585,7 +587,7 @@ TEST(zxstr2, parse_double_rounds_to_the_nearest_and_ties_to_even) {
   expect_tie("1" + tie.substr(1), 1.0, 0x1.0000000000001p0);
 }
 
-TEST(zxstr2, parse_double_looks_at_all_digits_that_decide) {
+TEST(zxstr2_number, parse_double_looks_at_all_digits_that_decide) {
   // Half the smallest double, 2^-1075, and one and a half of it.
   std::string half = "1";
   for (int i = 0; i < 1075; ++i) half = halved(half);
@@ -601,12 +603,13 @@ TEST(zxstr2, parse_double_looks_at_all_digits_that_decide) {
   expect_tie(longest, 0x0.fffffffffffffp-1022, 0x1p-1022);
 }
 
-TEST(zxstr2, parse_double_of_short_texts_agrees_with_the_slow_model) {
+TEST(zxstr2_number, parse_double_of_short_texts_agrees_with_the_slow_model) {
   for_all_texts("019,.-kMe ", 6, expect_double_of_model);
   for_all_texts("5,.+eEg\t", 5, expect_double_of_model);
 }
 
-TEST(zxstr2_slow, parse_double_of_longer_texts_agrees_with_the_slow_model) {
+TEST(zxstr2_number_slow,
+     parse_double_of_longer_texts_agrees_with_the_slow_model) {
   for_all_texts("019,.-kMe ", 7, expect_double_of_model);
 }
 
@@ -636,11 +639,11 @@ void expect_random_doubles_back(int rounds) {
   }
 }
 
-TEST(zxstr2, parse_double_gives_back_what_is_printed) {
+TEST(zxstr2_number, parse_double_gives_back_what_is_printed) {
   expect_random_doubles_back(20000);
 }
 
-TEST(zxstr2_slow, parse_double_gives_back_many_that_are_printed) {
+TEST(zxstr2_number_slow, parse_double_gives_back_many_that_are_printed) {
   expect_random_doubles_back(2000000);
 }
 
@@ -664,7 +667,7 @@ std::string random_number(std::mt19937& random, std::size_t digits) {
   return text;
 }
 
-TEST(zxstr2, parse_double_of_random_numbers_agrees_with_the_slow_model) {
+TEST(zxstr2_number, parse_double_of_random_numbers_agrees_with_the_slow_model) {
   constexpr unsigned k_seed = 31337;
   std::printf("seed %u\n", k_seed);
   std::mt19937 random(k_seed);
@@ -676,7 +679,7 @@ TEST(zxstr2, parse_double_of_random_numbers_agrees_with_the_slow_model) {
 
 // ----------------------------------------------------- texts of all kinds --
 
-TEST(zxstr2, numbers_are_read_from_every_kind_of_text) {
+TEST(zxstr2_number, numbers_are_read_from_every_kind_of_text) {
   const zxStr text("12k");
   const zxIStr inner("12k");
   EXPECT_EQ(parse_long(text), 12000);
@@ -697,7 +700,7 @@ TEST(zxstr2, numbers_are_read_from_every_kind_of_text) {
   EXPECT_EQ(parse_hex(std::string_view()), 0U);
 }
 
-TEST(zxstr2, no_byte_behind_a_number_is_looked_at) {
+TEST(zxstr2_number, no_byte_behind_a_number_is_looked_at) {
   for (const std::string_view text :
        {"", " ", "-", "1", "1,", "1k", "0", "0x", "h", "1.", ".", "1e", "1e+",
         "1e5", "1,000", "12345678901234567890", "1.2345678901234567890e"}) {
@@ -708,7 +711,7 @@ TEST(zxstr2, no_byte_behind_a_number_is_looked_at) {
   }
 }
 
-TEST(zxstr2, a_number_from_null_is_an_assertion_and_0) {
+TEST(zxstr2_number, a_number_from_null_is_an_assertion_and_0) {
   const char* null = nullptr;
   EXPECT_ASSERTION(parse_long(null), "zxstr2");
   EXPECT_ASSERTION(parse_double(null), "zxstr2");
