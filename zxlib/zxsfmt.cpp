@@ -281,14 +281,14 @@ void append_default_form(Output& out, const zxFmtArg& arg) {
       return append_whole(out, arg.number);
     case 'u':
     case 'v':
-      return append_whole(out, arg.word);
+      return append_whole(out, arg.word());
     case 'c':
       out.add(static_cast<char>(arg.number));
       return;
     case 'b':
-      return append_byte(out, static_cast<std::uint8_t>(arg.word));
+      return append_byte(out, static_cast<std::uint8_t>(arg.word()));
     case zxFmtArg::k_bool:
-      return out.add(arg.word != 0 ? "true" : "false");
+      return out.add(arg.word() != 0 ? "true" : "false");
     case 'f':
       return append_number(out, arg.real);
     case 'z':

@@ -57,10 +57,10 @@
 //   i    int and what          number    decimal
 //        promotes to it
 //   l    long                  number    decimal
-//   u    unsigned int          word      decimal
-//   v    unsigned long         word      decimal
+//   u    unsigned int          number    decimal, without a sign
+//   v    unsigned long         number    decimal, without a sign
 //   c    char                  number    the character
-//   b    unsigned char         word      "\x" and the byte in hexadecimal
+//   b    unsigned char         number    "\x" and the byte in hexadecimal
 //   f    double                real      15 significant digits, as in "12.5"
 //   z    const char*           pointer   the text
 //   s    zxStr                 pointer   the text
@@ -85,19 +85,25 @@ struct zxFmtArg {
   std::uint32_t tag;
   union {
     std::int32_t number;
-    std::uint32_t word;
     double real;
     const void* pointer;
   };
 
+  // The number without a sign.
+  constexpr std::uint32_t word() const {
+    return static_cast<std::uint32_t>(number);
+  }
+
   constexpr zxFmtArg(int value) : tag('i'), number(value) {}
-  constexpr zxFmtArg(unsigned value) : tag('u'), word(value) {}
+  constexpr zxFmtArg(unsigned value)
+      : tag('u'), number(static_cast<std::int32_t>(value)) {}
   zxFmtArg(long value) : tag('l'), number(narrowed<std::int32_t>(value)) {}
   zxFmtArg(unsigned long value)
-      : tag('v'), word(narrowed<std::uint32_t>(value)) {}
+      : tag('v'),
+        number(static_cast<std::int32_t>(narrowed<std::uint32_t>(value))) {}
   constexpr zxFmtArg(char byte)
       : tag('c'), number(static_cast<signed char>(byte)) {}
-  constexpr zxFmtArg(unsigned char byte) : tag('b'), word(byte) {}
+  constexpr zxFmtArg(unsigned char byte) : tag('b'), number(byte) {}
   constexpr zxFmtArg(double value) : tag('f'), real(value) {}
   constexpr zxFmtArg(const char* text) : tag('z'), pointer(text) {}
   constexpr zxFmtArg(const std::time_t* moment) : tag('m'), pointer(moment) {}

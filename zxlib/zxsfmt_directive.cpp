@@ -135,7 +135,7 @@ bool append_integer(Output& out, const Directive& directive,
   const char letter = directive.letter();
   const bool is_signed = letter == 'd' || letter == 'i';
   const bool is_negative = is_signed && arg.number < 0;
-  const std::uint32_t value = is_negative ? 0U - arg.word : arg.word;
+  const std::uint32_t value = is_negative ? 0U - arg.word() : arg.word();
   char digits[16];
   char* end = digits;
   if (value != 0 || form.measures.precision != 0)

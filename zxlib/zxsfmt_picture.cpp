@@ -80,7 +80,7 @@ std::optional<double> number_of(const zxFmtArg& arg) {
     case 'u':
     case 'v':
     case 'b':
-      number = arg.word;
+      number = arg.word();
       break;
     case 'f':
       number = arg.real;
