@@ -61,7 +61,8 @@ enum class Kind {
   good,       // the whole text
   bad,        // a bad format
   assertion,  // a mistake of the program, not of the format
-  not_told,   // nothing is said about this, or the text would be huge
+  not_told,   // any text, or an assertion
+  huge,       // too large a text to look at
 };
 
 struct Outcome {
@@ -76,6 +77,7 @@ struct BadDirective {};  // the rest of the format is added
 struct BadStar {};       // nothing is added
 struct Mistake {};
 struct NotTold {};
+struct Huge {};
 
 inline bool is_digit(char byte) { return byte >= '0' && byte <= '9'; }
 
@@ -125,6 +127,8 @@ class Model {
       return {Kind::assertion, ""};
     } catch (const NotTold&) {
       return {Kind::not_told, ""};
+    } catch (const Huge&) {
+      return {Kind::huge, ""};
     }
   }
 
@@ -148,7 +152,7 @@ class Model {
     if (found.size() > 40 ||
         (!found.empty() &&
          std::stold(found) > static_cast<long double>(k_most)))
-      throw NotTold{};
+      throw Huge{};
     return found;
   }
 
@@ -286,7 +290,7 @@ class Model {
     next();
     const Value value = take<BadStar>();
     if (value.tag != 'i') throw BadStar{};
-    if (value.number > k_most || value.number < -k_most) throw NotTold{};
+    if (value.number > k_most || value.number < -k_most) throw Huge{};
     return counted(std::to_string(value.number));
   }
 

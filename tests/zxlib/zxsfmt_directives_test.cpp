@@ -5,6 +5,7 @@
 
 #include <cmath>
 #include <cstdint>
+#include <cstdio>
 #include <ctime>
 #include <limits>
 #include <string>
@@ -15,6 +16,7 @@
 #include "format_run.h"
 #include "kit/failure.h"
 #include "kit/text.h"
+#include "zones.h"
 #include "zxsfmt.h"
 
 namespace {
@@ -476,6 +478,25 @@ TEST(zxsfmt_directives, forms_of_a_moment_know_daylight_saving) {
   EXPECT_EQ(compose("%[%d %H]t", date), good("01 01"));
   date.set(2009, 1, 1);
   EXPECT_EQ(compose("%[%d %H]t", date), good("01 00"));
+}
+
+TEST(zxsfmt_directives, moments_are_shown_by_the_clock_of_every_zone) {
+  const format_run::Clock clock(k_winter);
+  for (const Zone& zone : k_zones) {
+    SCOPED_TRACE(zone.name);
+    const InZone here(zone.name);
+    const auto second = (k_winter - zone.behind) % 86'400;
+    char text[16];
+    std::snprintf(
+        text, sizeof text, "%.2d:%.2d:%.2d", static_cast<int>(second / 3600),
+        static_cast<int>(second / 60 % 60), static_cast<int>(second % 60));
+    zxTime time;
+    time.set_time_t(k_winter);
+    EXPECT_EQ(compose("%.2T", time), good(text));
+    EXPECT_EQ(compose("%.2T", &k_winter), good(text));
+    EXPECT_EQ(compose("%[%H:%M:%S]t", time), good(text));
+    EXPECT_EQ(compose("$t"), good(text));
+  }
 }
 
 TEST(zxsfmt_directives, the_first_day_is_a_moment_west_of_greenwich_only) {

@@ -206,7 +206,7 @@ class Setting {
     world.program_args = {"-v", "in.vtx", "#"};
     world.program_path = "c:\\bin\\prog.exe";
     world.program_name = "PROG";
-    world.variables = {{"A", "value of A"}};
+    world.variables = {{"A", "value of A"}, {"TZ", "UTC0"}};
     world.left = [](const Value& value) {
       return "<" + std::to_string(value.tag) + "\n";
     };
@@ -447,13 +447,14 @@ class Comparison {
  private:
   void expect(const std::string& format, const std::vector<zxFmtArg>& records,
               const Outcome& expected) {
-    if (expected.kind == Kind::not_told) return;
+    if (expected.kind == Kind::huge) return;
     Sides env;
     Composed composed = {};
     const kit::Failure failure = kit::failure_of([&] {
       composed = format_run::compose_list(env, format.c_str(), records.data(),
                                           records.size());
     });
+    if (expected.kind == Kind::not_told) return;
     ASSERT_EQ(failure.message.substr(0, 20),
               expected.kind == Kind::assertion ? "1000: bailed out: zx" : "")
         << failure.message << told(format, records);
@@ -502,7 +503,8 @@ TEST(zxsfmt_model, random_formats_are_as_the_model_reads_them) {
   EXPECT_GT(counts.at(Kind::good), 20'000);
   EXPECT_GT(counts.at(Kind::bad), 20'000);
   EXPECT_GT(counts.at(Kind::assertion), 300);
-  EXPECT_LT(counts.at(Kind::not_told), 20'000);
+  EXPECT_LT(counts.at(Kind::not_told), 15'000);
+  EXPECT_LT(counts.at(Kind::huge), 15'000);
 }
 
 TEST(zxsfmt_model_slow, a_million_random_formats) { compare(1'000'000, 2); }

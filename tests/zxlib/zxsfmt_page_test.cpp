@@ -100,8 +100,6 @@ class Arguments {
     if (text == "names") return names;
     if (text == "colours") return colours;
     if (text == "byte") return byte;
-    if (text == "address")
-      return reinterpret_cast<const void*>(std::uintptr_t{48879});
     if (text.starts_with("str("))
       return strings.emplace_back(
           text_in(text.substr(4, text.size() - 5)).c_str());
