@@ -63,6 +63,8 @@ bool is(char byte, unsigned kinds) {
 bool is_digit(char byte) { return is<Letters::ansi>(byte, k_digit); }
 bool is_separator(char byte) { return is<Letters::ansi>(byte, k_separator); }
 
+// ---- what bytes become
+
 constexpr char mirrored_bracket(char byte) {
   switch (byte) {
     case '(':
@@ -82,16 +84,43 @@ constexpr char mirrored_bracket(char byte) {
   }
 }
 
-constexpr auto make_mirror() {
-  std::array<char, 256> mirror{};
-  for (int byte = 0; byte < 256; ++byte)
-    mirror[static_cast<std::size_t>(byte)] =
-        mirrored_bracket(static_cast<char>(byte));
-  return mirror;
+constexpr char to_ansi(char byte) {
+  return zx_is(byte, k_class_hebdos) ? static_cast<char>(byte + k_dos_distance)
+                                     : byte;
 }
-constexpr auto k_mirror = make_mirror();
+constexpr char to_dos(char byte) {
+  return zx_is(byte, k_class_hebrew) ? static_cast<char>(byte - k_dos_distance)
+                                     : byte;
+}
 
-char mirrored(char byte) { return k_mirror[static_cast<unsigned char>(byte)]; }
+class ByteMap {
+ public:
+  template <class Map>
+  constexpr explicit ByteMap(Map map) {
+    for (int byte = 0; byte < 256; ++byte)
+      bytes[static_cast<std::size_t>(byte)] = map(static_cast<char>(byte));
+  }
+  constexpr char operator[](char byte) const {
+    return bytes[static_cast<unsigned char>(byte)];
+  }
+
+ private:
+  std::array<char, 256> bytes{};
+};
+
+constexpr ByteMap k_mirror(mirrored_bracket);
+
+// The code page that a conversion gives: in copied runs, and in reversed ones.
+struct Target {
+  ByteMap copied;
+  ByteMap reversed;
+};
+constexpr Target k_to_ansi = {ByteMap(to_ansi), ByteMap([](char byte) {
+                                return to_ansi(mirrored_bracket(byte));
+                              })};
+constexpr Target k_to_dos = {ByteMap(to_dos), ByteMap([](char byte) {
+                               return to_dos(mirrored_bracket(byte));
+                             })};
 
 // ---- runs
 
@@ -173,19 +202,20 @@ std::size_t number_start(std::string_view run, std::size_t i) {
 // Writes a right-to-left run reversed; `out` has room for twice its length.
 // With `mark`, a number behind a written currency sign is kept off it by a
 // right-to-left mark.  Returns the end of what was written.
-char* reverse_run(char* out, std::string_view run, bool mark) {
+char* reverse_run(char* out, std::string_view run, bool mark,
+                  const ByteMap& bytes) {
   char* const start = out;
   for (std::size_t i = run.size(); i-- > 0;) {
     if (run[i] == k_rtl_mark) continue;
     if (!ends_number(run, i)) {
-      *out++ = mirrored(run[i]);
+      *out++ = bytes[run[i]];
       continue;
     }
     const std::size_t first = number_start(run, i);
     if (mark && out > start && out[-1] == '$' && is_digit(run[first]))
       *out++ = k_rtl_mark;
     const std::size_t length = i - first + 1;
-    std::memcpy(out, run.data() + first, length);
+    zx_copy(out, run.data() + first, length);
     out += length;
     i = first;
   }
@@ -196,117 +226,166 @@ char* reverse_run(char* out, std::string_view run, bool mark) {
 
 // The first digit or Hebrew letter of a text, or NUL.  A digit there would
 // be read as a part of a Latin run that stands ahead of it.
+template <Letters letters>
 char leading_anchor(std::string_view text) {
-  const std::size_t i =
-      find_kind<Letters::ansi>(text, 0, k_digit | k_hebrew_letter);
+  const std::size_t i = find_kind<letters>(text, 0, k_digit | k_hebrew_letter);
   return i < text.size() ? text[i] : '\0';
 }
 
-// A line under composition.  Pieces join in front of it or behind it, by the
-// base direction; the room is twice the line's length, which the reversing
-// never exceeds, a mark for each joint included.
-class Line {
+// Room for a line under composition, twice the length of its source: the
+// reversing never exceeds that, a mark for each joint included.
+class Room {
  public:
-  Line(std::size_t source_length, bool base) : rtl(base) {
-    const std::size_t room_size = 2 * source_length;
-    room = text.buffer(zx_count(room_size));
-    start = end = rtl ? room + room_size : room;
+  explicit Room(std::size_t source_length) : size(2 * source_length) {
+    if (size > sizeof usual) start = large.tail(zx_count(size));
   }
 
-  // Adds a run reversed: behind the line at once, in front of it by way of
-  // the free room at the start.
-  void add_reversed(std::string_view run, bool mark) {
-    char* const out = rtl ? room : end;
-    char* const out_end = reverse_run(out, run, mark);
-    if (rtl)
-      put_in_front({out, static_cast<std::size_t>(out_end - out)});
-    else
-      end = out_end;
-  }
-
-  void add(std::string_view piece) {
-    if (rtl) {
-      put_in_front(piece);
-    } else {
-      std::memcpy(end, piece.data(), piece.size());
-      end += piece.size();
-    }
-  }
-
-  void add(char byte) { add(std::string_view(&byte, 1)); }
-
-  bool is_empty() const { return start == end; }
-
-  // True if the first digit or Hebrew letter of the line is a digit; known
-  // for a line that grows at its front.
-  bool leads_with_digit() const { return is_digit(anchor); }
-
-  zxStr take() const { return {start, static_cast<std::int32_t>(end - start)}; }
+  char* begin() { return start; }
+  char* end() { return start + size; }
 
  private:
-  void put_in_front(std::string_view piece) {
-    start -= piece.size();
-    std::memmove(start, piece.data(), piece.size());
-    if (const char found = leading_anchor({start, piece.size()}))
-      anchor = found;
-  }
-
-  zxStr text;
-  bool rtl;
-  char anchor = '\0';
-  char* room = nullptr;
-  char* start = nullptr;
-  char* end = nullptr;
+  std::size_t size;
+  char usual[512];
+  zxStr large;
+  char* start = usual;
 };
 
-// Cuts a physical line into runs and adds each to the line.
-void add_logical(Line& line, std::string_view source, bool base) {
+// A line under composition.  Pieces join in front of it or behind it, by the
+// base direction.
+class Line {
+ public:
+  Line(Room& its_room, bool base, const Target& its_target)
+      : rtl(base),
+        target(its_target),
+        room(its_room.begin()),
+        start(rtl ? its_room.end() : room),
+        end(start) {}
+
+  // Adds a run reversed; the piece as it stands in the line.
+  std::string_view add_reversed(std::string_view run, bool mark) {
+    char* const out = piece_room();
+    return join(out, reverse_run(out, run, mark, target.reversed));
+  }
+
+  // Adds a run as it is, without the marks if `without_marks`.
+  std::string_view add_copied(std::string_view run, bool without_marks) {
+    char* const out = piece_room();
+    char* out_end = out;
+    for (const char byte : run) {
+      *out_end = target.copied[byte];
+      if (!without_marks || byte != k_ltr_mark) ++out_end;
+    }
+    return join(out, out_end);
+  }
+
+  void add_mark(char mark) {
+    char* const out = piece_room();
+    *out = mark;
+    join(out, out + 1);
+  }
+
+  std::string_view view() const {
+    return {start, static_cast<std::size_t>(end - start)};
+  }
+
+ private:
+  // Pieces that join behind the line are written there at once, others by way
+  // of the free room ahead of it.
+  char* piece_room() const { return rtl ? room : end; }
+
+  std::string_view join(const char* piece, char* piece_end) {
+    const auto size = static_cast<std::size_t>(piece_end - piece);
+    if (!rtl) {
+      end = piece_end;
+      return {piece, size};
+    }
+    start -= size;
+    zx_copy(start, piece, size);
+    return {start, size};
+  }
+
+  bool rtl;
+  const Target& target;
+  char* room;
+  char* start;
+  char* end;
+};
+
+// Cuts a physical line into runs and adds each to the line.  Marks keep a
+// number off the Latin run that comes to stand ahead of it.
+void compose_logical(Line& line, std::string_view source, bool base) {
+  char anchor = '\0';  // of the whole line, which grows at its front
   while (!source.empty()) {
-    const Run run = split_physical_run<Letters::ansi>(source, base);
+    const Run run = split_physical_run<Letters::ansi_and_dos>(source, base);
     if (!ZX_ASSERT(run.length > 0)) return;
     const std::string_view piece = source.substr(0, run.length);
     source.remove_prefix(run.length);
-    if (run.rtl) {
-      line.add_reversed(piece, true);
-    } else if (base) {
-      if (line.leads_with_digit()) line.add(k_rtl_mark);
-      line.add(piece);
-    } else {
-      if (!line.is_empty() && is_digit(leading_anchor(piece)))
-        line.add(k_ltr_mark);
-      line.add(piece);
-    }
+    if (!run.rtl && base && is_digit(anchor)) line.add_mark(k_rtl_mark);
+    if (!run.rtl && !base && !line.view().empty() &&
+        is_digit(leading_anchor<Letters::ansi_and_dos>(piece)))
+      line.add_mark(k_ltr_mark);
+    const std::string_view added = run.rtl ? line.add_reversed(piece, true)
+                                           : line.add_copied(piece, false);
+    if (const char found = base ? leading_anchor<Letters::ansi>(added) : '\0')
+      anchor = found;
   }
 }
 
-zxStr without_ltr_marks(std::string_view run) {
-  zxStr kept;
-  kept.reserve(zx_count(run.size()));
-  for (const char byte : run)
-    if (byte != k_ltr_mark) kept.append(byte);
-  return kept;
+// The same for a logical line.
+void compose_physical(Line& line, std::string_view source, bool base) {
+  while (!source.empty()) {
+    const Run run = split_run<Letters::ansi>(source, base);
+    if (!ZX_ASSERT(run.length > 0 && run.length <= source.size())) return;
+    const std::string_view piece = source.substr(0, run.length);
+    source.remove_prefix(run.length);
+    if (run.rtl)
+      line.add_reversed(piece, false);
+    else
+      line.add_copied(piece, true);
+  }
 }
 
-// Splits a text at CR LF and converts each line by itself.
-template <class Convert>
-zxStr convert_lines(const zxStr& text, Convert convert) {
+// An empty line takes no memory.
+void append_view(zxStr& result, std::string_view text) {
+  if (!text.empty()) result.append(text.data(), zx_count(text.size()));
+}
+
+// Appends a line that is not too long to be doubled.
+void append_logical(zxStr& result, std::string_view source, bool rtl) {
+  Room room(source.size());
+  Line line(room, rtl, k_to_ansi);
+  compose_logical(line, source, rtl);
+  append_view(result, line.view());
+}
+
+void append_physical(zxStr& result, std::string_view source, bool rtl) {
+  Room room(source.size());
+  Line line(room, rtl, k_to_dos);
+  compose_physical(line, source, rtl);
+  append_view(result, line.view());
+}
+
+// Splits a text at CR LF and appends each line.
+template <class AppendLine>
+zxStr convert_lines(const zxStr& text, AppendLine append_line) {
   constexpr std::string_view k_line_end = "\r\n";
-  std::string_view rest = text.view();
-  std::size_t end = rest.find(k_line_end);
-  if (end == std::string_view::npos) return convert(text);
   zxStr result;
-  while (end != std::string_view::npos) {
-    result.append(convert(zxStr(rest.substr(0, end))));
+  std::string_view rest = text.view();
+  for (std::size_t end = rest.find(k_line_end); end != std::string_view::npos;
+       end = rest.find(k_line_end)) {
+    append_line(result, rest.substr(0, end));
     result.append("\r\n", 2);
     rest.remove_prefix(end + k_line_end.size());
-    end = rest.find(k_line_end);
   }
-  return result.append(convert(zxStr(rest)));
+  append_line(result, rest);
+  return result;
 }
 
-// Results may take twice a text's length, which must be a length too.
+// Results may take twice a text's length, which must be a length too, with
+// the margin that strings grow by.
 bool has_room_for_twice(const zxStr& text) {
-  return ZX_ASSERT(text.length() <= INT32_MAX / 2);
+  constexpr std::int32_t k_margin = 64;
+  return ZX_ASSERT(text.length() <= (INT32_MAX - k_margin) / 2);
 }
 
 // Moves the bytes of one class by a distance.  A text without any stays
@@ -321,66 +400,32 @@ void shift_class(zxStr& text, unsigned class_bit, int distance) {
     if (is_moved(bytes[i])) bytes[i] = static_cast<char>(bytes[i] + distance);
 }
 
-// Units of 16 bits: 0 to 127 for themselves, bytes from 128 on by their
-// distance from the byte of alef, none behind tav.
-zxStr to_utf16(const zxStr& text, int alef_byte) {
-  constexpr int k_alef = 0x5D0;
-  constexpr int k_tav = 0x5EA;
-  if (!has_room_for_twice(text)) return {};
-  zxStr result;
-  char* const start = result.buffer(2 * text.length());
-  char* out = start;
-  for (const char character : text.view()) {
-    const int byte = static_cast<unsigned char>(character);
-    const int unit = byte < 128 ? byte : byte - alef_byte + k_alef;
-    if (unit > k_tav) continue;
-    *out++ = static_cast<char>(unit & 0xFF);
-    *out++ = static_cast<char>(unit >> 8);
-  }
-  result.set_length(static_cast<std::int32_t>(out - start));
-  return result;
-}
-
 }  // namespace
 
 zxStr logical_from_phys(const zxStr& text, bool rtl) {
-  if (text.is_empty() || !has_room_for_twice(text)) return {};
-  zxStr source = text;
-  dos_to_ansi(source);
-  Line line(zx_size(source.length()), rtl);
-  add_logical(line, source.view(), rtl);
-  return line.take();
+  zxStr result;
+  if (has_room_for_twice(text)) append_logical(result, text.view(), rtl);
+  return result;
 }
 
 zxStr phys_from_logical(const zxStr& text, bool rtl) {
-  if (text.is_empty() || !has_room_for_twice(text)) return {};
-  Line line(zx_size(text.length()), rtl);
-  std::string_view source = text.view();
-  while (!source.empty()) {
-    const Run run = split_run<Letters::ansi>(source, rtl);
-    if (!ZX_ASSERT(run.length > 0 && run.length <= source.size())) break;
-    const std::string_view piece = source.substr(0, run.length);
-    if (run.rtl) {
-      line.add_reversed(piece, false);
-    } else {
-      const zxStr kept = without_ltr_marks(piece);
-      line.add(kept.view());
-    }
-    source.remove_prefix(run.length);
-  }
-  zxStr result = line.take();
-  ansi_to_dos(result);
+  zxStr result;
+  if (has_room_for_twice(text)) append_physical(result, text.view(), rtl);
   return result;
 }
 
 zxStr logical_from_phys_lines(const zxStr& text, bool rtl) {
-  return convert_lines(
-      text, [rtl](const zxStr& line) { return logical_from_phys(line, rtl); });
+  if (!has_room_for_twice(text)) return {};
+  return convert_lines(text, [rtl](zxStr& result, std::string_view line) {
+    append_logical(result, line, rtl);
+  });
 }
 
 zxStr phys_from_logical_lines(const zxStr& text, bool rtl) {
-  return convert_lines(
-      text, [rtl](const zxStr& line) { return phys_from_logical(line, rtl); });
+  if (!has_room_for_twice(text)) return {};
+  return convert_lines(text, [rtl](zxStr& result, std::string_view line) {
+    append_physical(result, line, rtl);
+  });
 }
 
 void dos_to_ansi(zxStr& text) {
@@ -391,24 +436,74 @@ void ansi_to_dos(zxStr& text) {
   shift_class(text, k_class_hebrew, -k_dos_distance);
 }
 
-zxStr dos_to_utf16(const zxStr& text) { return to_utf16(text, 128); }
+// ---- Unicode
 
-zxStr ansi_to_utf16(const zxStr& text) { return to_utf16(text, 224); }
+namespace {
 
-zxStr ansi_to_utf8(const zxStr& text) {
-  if (!has_room_for_twice(text)) return {};
+// The one or two bytes that a character becomes; both are stored, and only
+// those that count are kept.
+struct Unit {
+  char bytes[2];
+  std::uint8_t size;
+};
+
+class UnitMap {
+ public:
+  template <class UnitOf>
+  constexpr explicit UnitMap(UnitOf unit_of) {
+    for (int byte = 0; byte < 256; ++byte)
+      units[static_cast<std::size_t>(byte)] = unit_of(byte);
+  }
+  zxStr encode(const zxStr& text) const;
+
+ private:
+  std::array<Unit, 256> units{};
+};
+
+zxStr UnitMap::encode(const zxStr& text) const {
   zxStr result;
-  char* const start = result.buffer(2 * text.length());
+  if (!has_room_for_twice(text)) return result;
+  char* const start = result.tail(2 * text.length());
   char* out = start;
   for (const char byte : text.view()) {
-    const auto unit =
-        zxLogicalExport::unit_of(static_cast<unsigned char>(byte));
-    std::memcpy(out, unit.bytes + 2 - unit.size, unit.size);
+    const Unit& unit = units[static_cast<unsigned char>(byte)];
+    std::memcpy(out, unit.bytes, 2);
     out += unit.size;
   }
-  result.set_length(static_cast<std::int32_t>(out - start));
+  result.extend(static_cast<std::int32_t>(out - start));
   return result;
 }
+
+constexpr Unit utf8_unit(int code) {
+  if (code < 0) return {{}, 0};
+  if (code < 128) return {{static_cast<char>(code), '\0'}, 1};
+  return {{static_cast<char>(0xC0 | code >> 6),
+           static_cast<char>(0x80 | (code & 0x3F))},
+          2};
+}
+
+constexpr Unit utf16_unit(int code) {
+  if (code < 0) return {{}, 0};
+  return {{static_cast<char>(code & 0xFF), static_cast<char>(code >> 8)}, 2};
+}
+
+constexpr UnitMap k_ansi_to_utf8([](int byte) {
+  return utf8_unit(zxp2l_detail::ansi_code(byte));
+});
+constexpr UnitMap k_ansi_to_utf16([](int byte) {
+  return utf16_unit(zxp2l_detail::ansi_code(byte));
+});
+constexpr UnitMap k_dos_to_utf16([](int byte) {
+  return utf16_unit(zxp2l_detail::dos_code(byte));
+});
+
+}  // namespace
+
+zxStr dos_to_utf16(const zxStr& text) { return k_dos_to_utf16.encode(text); }
+
+zxStr ansi_to_utf16(const zxStr& text) { return k_ansi_to_utf16.encode(text); }
+
+zxStr ansi_to_utf8(const zxStr& text) { return k_ansi_to_utf8.encode(text); }
 
 // ---- straight to UTF-8
 //
@@ -456,7 +551,7 @@ char* zxLogicalExport::reverse_in_front(char* start,
   for (std::size_t i = 0; i < run.size();) {
     const std::size_t end = number_end(run, i);
     if (end == i) {
-      start = put_in_front(start, mirrored(run[i++]));
+      start = put_in_front(start, k_mirror[run[i++]]);
     } else {
       start = put_in_front(start, run.substr(i, end - i));
       i = end;

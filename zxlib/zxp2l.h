@@ -58,6 +58,21 @@ zxStr ansi_to_utf16(const zxStr& text);
 // points as far below alef as they stand below its byte.
 zxStr ansi_to_utf8(const zxStr& text);
 
+namespace zxp2l_detail {
+
+// The code point that stands as far from alef as a byte of 128 and more from
+// alef's byte; -1 behind tav.
+constexpr int code_of(int byte, int alef_byte) {
+  constexpr int k_alef = 0x5D0;
+  constexpr int k_tav = 0x5EA;
+  const int code = byte < 128 ? byte : byte - alef_byte + k_alef;
+  return code > k_tav ? -1 : code;
+}
+constexpr int dos_code(int byte) { return code_of(byte, 128); }
+constexpr int ansi_code(int byte) { return code_of(byte, 224); }
+
+}  // namespace zxp2l_detail
+
 // The road of exports, from stored fields to UTF-8 in one pass: what
 //   ansi_to_utf8(logical_from_phys_lines(text, true))
 // gives, less the ASCII bytes that the target file has no room for.
@@ -88,8 +103,6 @@ class zxLogicalExport {
   };
   using Units = std::array<Unit, 256>;
 
-  friend zxStr ansi_to_utf8(const zxStr& text);
-
   static constexpr int to_ansi(int byte) {
     return byte >= 128 && byte <= 154 ? byte + 96 : byte;
   }
@@ -104,12 +117,9 @@ class zxLogicalExport {
 
 // Code points from 128 bytes below alef up to tav all take two bytes.
 constexpr zxLogicalExport::Unit zxLogicalExport::unit_of(int byte) {
-  constexpr int k_alef_byte = 224;
-  constexpr int k_alef = 0x5D0;
-  constexpr int k_tav = 0x5EA;
-  if (byte < 128) return {{'\0', static_cast<char>(byte)}, 1};
-  const int code = byte - k_alef_byte + k_alef;
-  if (code > k_tav) return {{}, 0};
+  const int code = zxp2l_detail::ansi_code(byte);
+  if (code < 0) return {{}, 0};
+  if (code < 128) return {{'\0', static_cast<char>(code)}, 1};
   return {{static_cast<char>(0xC0 | code >> 6),
            static_cast<char>(0x80 | (code & 0x3F))},
           2};

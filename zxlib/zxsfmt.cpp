@@ -86,6 +86,7 @@ class Composer {
   Outcome read_number(Directive& directive);
   bool read_bracket(Directive& directive);
   bool dispatch(const Directive& directive);
+  void set_table(const zxFmtArg& arg);
   bool dollar();
 
   Output out;
@@ -163,9 +164,13 @@ bool Composer::placeholder() {
   return true;
 }
 
+void Composer::set_table(const zxFmtArg& arg) {
+  env.set_table(static_cast<const zxSA<zxStr>*>(arg.pointer));
+  out.reload();  // it is another's code
+}
+
 bool Composer::dollar() {
-  if (left > 0 && args->tag == zxFmtArg::k_table)
-    env.set_table(static_cast<const zxSA<zxStr>*>(take()->pointer));
+  if (left > 0 && args->tag == zxFmtArg::k_table) set_table(*take());
   return append_escape(out, at, env);
 }
 

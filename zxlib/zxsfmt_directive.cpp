@@ -193,14 +193,14 @@ bool append_double(Output& out, const Directive& directive,
   const char letter = zx_lower(directive.letter());
   std::int32_t precision = form.measures.precision;
   if (precision < 0) precision = k_usual_precision;
+  const bool is_number = std::isfinite(arg.real);
   if (letter == 'g' && !form.alternate)
     precision = std::min(precision, k_most_digits);
-  else if (!ZX_ASSERT(precision < k_most_decimals))
+  else if (is_number && !ZX_ASSERT(precision < k_most_decimals))
     return false;
 
   char text[k_most_digits + k_most_decimals];
   char* end;
-  const bool is_number = std::isfinite(arg.real);
   if (is_number)
     end = write_magnitude(text, std::fabs(arg.real), letter, precision,
                           form.alternate);
@@ -340,7 +340,7 @@ bool append_formed_time(Output& out, const Directive& directive,
   read_measures(spec);
   if (!ZX_ASSERT(spec.empty() && !directive.has_long)) return false;
   if (!is_time(arg) && arg.tag != 't') return false;
-  const zxStr text = format_time_t(*moment_of(arg), directive.bracket);
+  const zxStr text = format_moment(*moment_of(arg), directive.bracket);
   append_padded(out, directive.middle(), text.view());
   return true;
 }

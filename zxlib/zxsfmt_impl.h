@@ -47,7 +47,9 @@ inline constexpr std::int32_t k_most_digits = 770;
 // to call reload().
 class Output {
  public:
-  explicit Output(zxStr& result) : string(result) { reload(); }
+  explicit Output(zxStr& result) : string(result) {
+    if (result.capacity() > 0) reload();
+  }
 
   const zxStr& text() const { return string; }
   std::int32_t length() const { return string.length(); }
@@ -97,8 +99,9 @@ class Output {
   char* grow(std::int64_t n);
 
   zxStr& string;
-  char* end;
-  const char* limit;
+  // No room at first.
+  char* end = zx_empty_rep.data;
+  const char* limit = zx_empty_rep.data;
 };
 
 // ------------------------------------------------------------ directives --
@@ -111,7 +114,7 @@ class Directive {
     if (length < k_most) spec[length] = byte;
     ++length;
   }
-  bool is_too_long() const { return length > k_most; }
+  bool is_too_long() const { return length + (has_long ? 1 : 0) > k_most; }
 
   // False if it is too long.
   bool set_bracket(std::string_view text) {

@@ -1,9 +1,7 @@
-// zxstr.cpp - the string class and the checksum of 16 bits.
+// zxstr.cpp - the string class.
 // Tests: tests/zxlib/zxstr_test.cpp.
 #include "zxstr.h"
 
-#include <array>
-#include <bit>
 #include <climits>
 #include <cstring>
 
@@ -328,7 +326,12 @@ char* zxStr::tail_growing(std::int32_t n) {
   if (!check() || !ZX_ASSERT(n >= 0)) return nullptr;
   const std::int32_t wanted = sum_of(sum_of(rep->length, n), k_margin);
   if (!ZX_ASSERT(wanted >= k_margin)) return nullptr;
-  rep->length + n <= rep->capacity ? unshare() : make_room(wanted);
+  if (rep == &zx_empty_rep)
+    rep = new_block(wanted);
+  else if (rep->length + n <= rep->capacity)
+    unshare();
+  else
+    make_room(wanted);
   return rep->data + rep->length;
 }
 
@@ -370,24 +373,20 @@ zxStr& zxStr::append(const zxStr& other) {
 template <class Fold>
 void zxStr::fold_case(Fold fold) {
   if (!check()) return;
-  for (std::int32_t i = 0; i < rep->length; ++i) {
-    const char folded = fold(rep->data[i]);
-    if (folded == rep->data[i]) continue;
-    unshare();
-    rep->data[i] = folded;
-  }
+  const char* place = begin();
+  while (place < end() && fold(*place) == *place) ++place;
+  const std::ptrdiff_t unchanged = place - begin();
+  if (unchanged == rep->length) return;
+  unshare();
+  const char* const last = end();
+  for (char* byte = rep->data + unchanged; byte < last; ++byte)
+    *byte = fold(*byte);
 }
 
 void zxStr::to_upper() { fold_case(zx_upper); }
 void zxStr::to_lower() { fold_case(zx_lower); }
 
 namespace {
-
-std::string_view trimmed(std::string_view text) {
-  while (!text.empty() && zx_is_space(text.front())) text.remove_prefix(1);
-  while (!text.empty() && zx_is_space(text.back())) text.remove_suffix(1);
-  return text;
-}
 
 // What a last letter multiplies by; 1 for any other byte.
 std::int32_t factor_of(char suffix) {
@@ -424,7 +423,7 @@ std::int64_t unsigned_value(std::string_view text) {
 
 std::int32_t zxStr::to_int() const {
   if (!check()) return 0;
-  std::string_view text = trimmed(view());
+  std::string_view text = zx_trimmed(view());
   if (text.empty()) return 0;
   const bool negative = text.front() == '-';
   if (negative || text.front() == '+') text.remove_prefix(1);
@@ -478,13 +477,10 @@ zxStr operator+(char a, const zxStr& b) {
 
 void trim(zxStr& text) {
   if (!text.check()) return;
-  const char* first = text.begin();
-  const char* last = text.end();
-  while (first < last && zx_is_space(*first)) ++first;
-  while (first < last && zx_is_space(last[-1])) --last;
-  if (first == last) return text.clear();
-  if (last - first < text.length())
-    text.build(first, static_cast<std::int32_t>(last - first));
+  const std::string_view kept = zx_trimmed(text.view());
+  const std::int32_t length = zx_count(kept.size());
+  if (length == 0) return text.clear();
+  if (length < text.length()) text.build(kept.data(), length);
 }
 
 void strip_line_end(zxStr& text) {
@@ -500,89 +496,3 @@ void bail_code(std::int32_t number, const zxStr& text,
 }
 
 void fatal_exit(const zxStr& text) { fatal_exit(text.c_str()); }
-
-// ---- checksum
-
-namespace {
-
-constexpr std::uint16_t k_crc16_start = 0xFFFF;
-constexpr std::size_t k_slice = 8;    // bytes of a register
-constexpr std::size_t k_tables = 16;  // for two of them
-
-// Table k gives what a byte does to the sum when k more bytes follow it.
-using Crc16Tables = std::array<std::array<std::uint16_t, 256>, k_tables>;
-
-constexpr Crc16Tables make_crc16_tables() {
-  Crc16Tables tables{};
-  for (unsigned i = 0; i < 256; ++i) {
-    unsigned crc = i << 8;
-    for (int bit = 0; bit < 8; ++bit)
-      crc = (crc & 0x8000U) ? (crc << 1) ^ 0x1021U : crc << 1;
-    tables[0][i] = static_cast<std::uint16_t>(crc);
-  }
-  for (std::size_t k = 1; k < k_tables; ++k)
-    for (std::size_t i = 0; i < 256; ++i) {
-      const unsigned crc = tables[k - 1][i];
-      tables[k][i] =
-          static_cast<std::uint16_t>((crc << 8) ^ tables[0][crc >> 8]);
-    }
-  return tables;
-}
-
-constexpr Crc16Tables k_crc16_tables = make_crc16_tables();
-
-std::uint16_t add_byte(std::uint16_t crc, unsigned char byte) {
-  return static_cast<std::uint16_t>((crc << 8) ^
-                                    k_crc16_tables[0][(crc >> 8) ^ byte]);
-}
-
-// What eight bytes, the first the highest, do to the sum when `behind` more
-// follow them.  Zero bytes do nothing.
-template <std::size_t behind>
-unsigned sum_of_slice(std::uint64_t bytes) {
-  const auto part = [bytes](std::size_t k) -> unsigned {
-    return k_crc16_tables[behind + k][bytes >> (8 * k) & 0xFF];
-  };
-  return part(0) ^ part(1) ^ part(2) ^ part(3) ^ part(4) ^ part(5) ^ part(6) ^
-         part(7);
-}
-
-std::uint64_t load_slice(const unsigned char* bytes) {
-  std::uint64_t value;
-  std::memcpy(&value, bytes, sizeof value);
-  if constexpr (std::endian::native == std::endian::little)
-    value = __builtin_bswap64(value);
-  return value;
-}
-
-// The sum of 8 to 16 bytes, which are taken as 16 with zeros in front; the
-// sum so far goes into the first two that are not.  There is no branch on the
-// size, which nobody could predict.
-std::uint16_t add_last_bytes(std::uint16_t crc, const unsigned char* bytes,
-                             std::size_t size) {
-  const std::size_t half_gap = 4 * (2 * k_slice - size);  // in bits, halved
-  std::uint64_t high = load_slice(bytes) >> half_gap >> half_gap;
-  std::uint64_t low = load_slice(bytes + size - k_slice);
-  const std::uint64_t first = std::uint64_t{crc} << 48;
-  high ^= first >> half_gap >> half_gap;
-  if (size < k_slice + 2) low ^= first << (8 * (size - k_slice));
-  return static_cast<std::uint16_t>(sum_of_slice<k_slice>(high) ^
-                                    sum_of_slice<0>(low));
-}
-
-}  // namespace
-
-std::uint16_t crc16_add(std::uint16_t crc, const void* bytes,
-                        std::size_t size) {
-  const auto* byte = static_cast<const unsigned char*>(bytes);
-  for (; size > 2 * k_slice; size -= k_slice, byte += k_slice)
-    crc = static_cast<std::uint16_t>(
-        sum_of_slice<0>(load_slice(byte) ^ std::uint64_t{crc} << 48));
-  if (size >= k_slice) return add_last_bytes(crc, byte, size);
-  for (; size != 0; --size, ++byte) crc = add_byte(crc, *byte);
-  return crc;
-}
-
-std::uint16_t crc16(const void* bytes, std::size_t size) {
-  return crc16_add(k_crc16_start, bytes, size);
-}

@@ -312,7 +312,15 @@ zxStr operator+(const zxStr& a, char b);
 zxStr operator+(const char* a, const zxStr& b);
 zxStr operator+(char a, const zxStr& b);
 
-// Removes white space (class k_class_space) at both ends.
+// The text without the white space (class k_class_space) at both ends; it
+// lies within the given one.
+constexpr std::string_view zx_trimmed(std::string_view text) {
+  while (!text.empty() && zx_is_space(text.front())) text.remove_prefix(1);
+  while (!text.empty() && zx_is_space(text.back())) text.remove_suffix(1);
+  return text;
+}
+
+// Removes that white space.
 void trim(zxStr& text);
 
 // Removes one line feed, and a carriage return ahead of it, from the end.

@@ -3,8 +3,8 @@
 //
 // The style is common to all: a parser never fails, a bad number reads as 0;
 // a search gives an index or -1; a mistake of the program (a negative index, a
-// null text) fails an assertion and, if that is dropped, counts as nothing
-// found.
+// null text) fails an assertion.  If that is dropped, a null text counts as an
+// empty one, and everything else gives the result for nothing.
 //
 // White space is blank and bytes 9 to 13; only ASCII letters have two cases.
 // NUL is a character like any other, except where a function says otherwise.
@@ -29,7 +29,8 @@ class zxChars {
  public:
   zxChars(const char* text);
   zxChars(const char* characters, std::int32_t length);
-  zxChars(const zxStr& text) : chars(text.view()) {}
+  zxChars(const zxStr& text)
+      : chars(text.check() ? text.view() : std::string_view()) {}
   constexpr zxChars(std::string_view text) : chars(text) {}
 
   constexpr std::string_view view() const { return chars; }
@@ -40,8 +41,10 @@ class zxChars {
 
 // ----------------------------------------------------------------- parts --
 
+// The parts of a text share its representation if they are all of it.
+
 // The text from position n on; n outside of 0 to the length fails an
-// assertion and gives an empty text.  n = 0 shares the representation.
+// assertion and gives an empty text.
 zxStr rest(const zxStr& text, std::int32_t n);
 
 // Up to `length` characters from a position on.  A negative position counts
@@ -84,9 +87,10 @@ std::uint32_t parse_hex(zxChars text);
 
 // ------------------------------------------------------------- searching --
 
-// Where `what` stands first at or behind a position; -1 if nowhere.  Nothing
-// is found at the position itself, unless that is the text's end or behind
-// it.  A negative position fails an assertion.
+// Where `what` stands first at or behind a position; -1 if nowhere, and from
+// the text's end on.  An empty text is found at the position itself, so that
+// only an empty text does not contain one.  A negative position fails an
+// assertion.
 std::int32_t find(zxChars text, std::int32_t position, zxChars what);
 std::int32_t find(zxChars text, std::int32_t position, const char* what,
                   std::int32_t length);
@@ -148,11 +152,12 @@ zxStr unescape(const zxStr& text);
 // place is passed over for the next from one byte further on.  Ahead of each
 // match there is a piece, left out if it is empty unless `keep_empty`; the
 // groups 1 to 9 that took part follow as pieces of their own under the same
-// rule, as long as there is room for one more.  What is left of the text, if
-// anything, is the last piece.  "^" never matches.
+// rule, up to max - 1 pieces in all.  What is left of the text, if anything,
+// is the last piece: for a `max` of 1 and below it is the only one, and
+// behind a match at the text's end there is none.  "^" never matches.
 //
-// A bad pattern is message 1752 or 1751, and gives no pieces if that is
-// dropped.  The match record is that of the last search.
+// The text may be an element of `out`.  A bad pattern is message 1752 or 1751,
+// and gives no pieces if that is dropped.  The match record is left empty.
 std::int32_t split_regex(zxQVA<zxStr>& out, const zxStr& text,
                          const char* pattern, std::int32_t pattern_length,
                          std::int32_t max, bool keep_empty);

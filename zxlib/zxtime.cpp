@@ -232,22 +232,33 @@ std::tm local_fields(std::int64_t moment) {
   return fields;
 }
 
-// The C library knows more letters, each its own.
-static bool has_known_letters_only(std::string_view form) {
-  constexpr std::string_view k_known = "aAbBcdHIjmMpSUwWxXyYZ%";
-  for (std::size_t at = form.find('%'); at != form.npos;
-       at = form.find('%', at + 2))
-    if (at + 1 == form.size() || k_known.find(form[at + 1]) == k_known.npos)
+// A form in letters that all C libraries take for the same; false if there
+// is a letter of another kind in it.
+static bool to_common_letters(std::string_view form, zxStr& common) {
+  constexpr std::string_view k_common = "aAbBdHIjmMpSUwWxXyYZ%";
+  for (; !form.empty(); form.remove_prefix(1)) {
+    common.append(form.front());
+    if (form.front() != '%') continue;
+    form.remove_prefix(1);
+    if (form.empty()) return false;
+    if (form.front() == 'c')
+      common.append("m/%d/%y %H:%M:%S");
+    else if (k_common.find(form.front()) != k_common.npos)
+      common.append(form.front());
+    else
       return false;
+  }
   return true;
 }
 
-zxStr format_time_t(std::int64_t moment, const char* form) {
-  if (!has_known_letters_only(form)) return {};
+zxStr format_moment(std::int64_t moment, const char* form) {
+  zxStr common;
+  if (!to_common_letters(form, common)) return {};
   constexpr std::size_t k_room = 80;
   char text[k_room];
   const std::tm fields = local_fields(moment);
-  return {text, zx_count(std::strftime(text, sizeof text, form, &fields))};
+  return {text,
+          zx_count(std::strftime(text, sizeof text, common.c_str(), &fields))};
 }
 
 zxStr format_time_t(std::optional<std::int64_t> moment, std::int32_t index) {

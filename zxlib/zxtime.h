@@ -161,7 +161,8 @@ zxStr format_time_t(std::optional<std::int64_t> moment, std::int32_t index);
 
 // The same in a form of one's own, with the letters of strftime() in C89 (a A
 // b B c d H I j m M p S U w W x X y Y Z %) and in English.  One with another
-// letter, and a text of more than 79 bytes, give an empty text.
-zxStr format_time_t(std::int64_t moment, const char* form);
+// letter, and a text of more than 79 bytes, give an empty text.  "%c" is
+// "%m/%d/%y %H:%M:%S", "%x" and "%X" are its halves.
+zxStr format_moment(std::int64_t moment, const char* form);
 
 #endif  // ZXTIME_H

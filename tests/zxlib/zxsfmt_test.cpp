@@ -1,108 +1,155 @@
-// zxsfmt_test.cpp - the format language: directives and default forms, bad
-// formats, the entries that write or fail, and the text of doubles against a
-// model.
-// Tests zxlib/zxsfmt.h, zxsfmt.cpp and zxsfmt_number.cpp.
+// zxsfmt_test.cpp - the format language: which types are arguments, plain
+// text, default forms, bad formats, the entries.  More of it is in
+//   zxsfmt_directives_test.cpp  the "%" directives, limits and aliases
+//   zxsfmt_table_test.cpp       each directive by each tag
+//   zxsfmt_escapes_test.cpp     the "$" escapes, environments, lists
+//   zxsfmt_number_test.cpp      the text of numbers
+//   zxsfmt_picture_test.cpp     pictures of numbers
+//   zxsfmt_model_test.cpp       random formats against a second interpreter
+//   zxsfmt_page_test.cpp        the examples of the page
+// Tests zxlib/zxsfmt.h and zxsfmt*.cpp.
 #include "zxsfmt.h"
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
-#include <array>
-#include <bit>
-#include <cmath>
+#include <climits>
 #include <cstdint>
-#include <cstdio>
-#include <cstdlib>
-#include <limits>
-#include <random>
 #include <string>
 #include <string_view>
 #include <type_traits>
 #include <utility>
 
+#include "format_run.h"
 #include "kit/cases.h"
 #include "kit/failure.h"
 #include "kit/tempdir.h"
 #include "kit/text.h"
 #include "zxmainf.h"
+#include "zxplat.h"
 
 namespace {
 
+using format_run::bad;
+using format_run::compose;
+using format_run::Composed;
+using format_run::good;
 using kit::read_file;
 using kit::TempDir;
-using namespace std::string_literals;
-
 using kit::text_of;
-
-// What the core makes of a format and its arguments.
-struct Composed {
-  bool good;
-  std::string text;
-
-  friend bool operator==(const Composed&, const Composed&) = default;
-};
-
-std::ostream& operator<<(std::ostream& out, const Composed& composed) {
-  return out << (composed.good ? "good '" : "bad '") << composed.text << "'";
-}
-
-template <class... Args>
-Composed compose(const char* format, const Args&... args) {
-  const std::array<zxFmtArg, sizeof...(Args)> list{zxFmtArg(args)...};
-  zxStr out = "to be dropped";
-  const bool good = sfmt_core(
-      out, format, static_cast<std::int32_t>(list.size()), list.data());
-  return {good, text_of(out)};
-}
-
-Composed good(std::string text) { return {true, std::move(text)}; }
-Composed bad(std::string text) { return {false, std::move(text)}; }
+using namespace std::string_literals;
 
 // ---- which types have a form
 
-enum Plain { k_plain };
+enum Plain { k_plain = 3 };
 enum class Scoped { one };
 struct Other {};
-struct Convertible {
-  operator double() const { return 1.5; }
+struct ToString {
+  operator zxStr() const { return zxStr(); }
+};
+struct ToDate {
+  operator zxDate() const { return zxDate(); }
 };
 
-static_assert(std::is_constructible_v<zxFmtArg, int>);
-static_assert(std::is_constructible_v<zxFmtArg, const int&>);
-static_assert(std::is_constructible_v<zxFmtArg, char>);
-static_assert(std::is_constructible_v<zxFmtArg, double>);
-static_assert(std::is_constructible_v<zxFmtArg, const char*>);
-static_assert(std::is_constructible_v<zxFmtArg, char*>);
-static_assert(std::is_constructible_v<zxFmtArg, const char (&)[4]>);
-static_assert(std::is_constructible_v<zxFmtArg, const zxStr&>);
-static_assert(std::is_constructible_v<zxFmtArg, const zxDate&>);
+template <class T>
+constexpr bool is_argument = std::is_constructible_v<zxFmtArg, T>;
 
-static_assert(!std::is_constructible_v<zxFmtArg, bool>);
-static_assert(!std::is_constructible_v<zxFmtArg, signed char>);
-static_assert(!std::is_constructible_v<zxFmtArg, unsigned char>);
-static_assert(!std::is_constructible_v<zxFmtArg, wchar_t>);
-static_assert(!std::is_constructible_v<zxFmtArg, char16_t>);
-static_assert(!std::is_constructible_v<zxFmtArg, short>);
-static_assert(!std::is_constructible_v<zxFmtArg, unsigned short>);
-static_assert(!std::is_constructible_v<zxFmtArg, unsigned>);
-static_assert(!std::is_constructible_v<zxFmtArg, long>);
-static_assert(!std::is_constructible_v<zxFmtArg, unsigned long>);
-static_assert(!std::is_constructible_v<zxFmtArg, long long>);
-static_assert(!std::is_constructible_v<zxFmtArg, unsigned long long>);
-static_assert(!std::is_constructible_v<zxFmtArg, float>);
-static_assert(!std::is_constructible_v<zxFmtArg, long double>);
-static_assert(!std::is_constructible_v<zxFmtArg, void*>);
-static_assert(!std::is_constructible_v<zxFmtArg, const int*>);
-static_assert(!std::is_constructible_v<zxFmtArg, Scoped>);
-static_assert(!std::is_constructible_v<zxFmtArg, Other>);
-static_assert(!std::is_constructible_v<zxFmtArg, std::string>);
-static_assert(!std::is_constructible_v<zxFmtArg, std::string_view>);
+static_assert(is_argument<int>);
+static_assert(is_argument<const int&>);
+static_assert(is_argument<bool>);
+static_assert(is_argument<short>);
+static_assert(is_argument<unsigned short>);
+static_assert(is_argument<signed char>);
+static_assert(is_argument<Plain>);
+static_assert(is_argument<unsigned>);
+static_assert(is_argument<long>);
+static_assert(is_argument<unsigned long>);
+static_assert(is_argument<char>);
+static_assert(is_argument<unsigned char>);
+static_assert(is_argument<double>);
+static_assert(is_argument<float>);
+static_assert(is_argument<const char*>);
+static_assert(is_argument<char*>);
+static_assert(is_argument<const char (&)[4]>);
+static_assert(is_argument<const zxStr&>);
+static_assert(is_argument<const zxIStr&>);
+static_assert(is_argument<const zxDate&>);
+static_assert(is_argument<const zxTime&>);
+static_assert(is_argument<const zxQVA<zxStr>&>);
+static_assert(is_argument<const zxSA<zxStr>&>);
+static_assert(is_argument<std::time_t*>);
+static_assert(is_argument<const std::time_t*>);
+static_assert(is_argument<void*>);
+static_assert(is_argument<const int*>);
+static_assert(is_argument<Other*>);
 
-// These convert to a double by themselves, whose place would be gone by the
-// time that the record is read.
-TEST(zxsfmt, what_converts_to_a_double_has_no_form_of_its_own) {
-  EXPECT_FALSE((std::is_constructible_v<zxFmtArg, Plain>));
-  EXPECT_FALSE((std::is_constructible_v<zxFmtArg, Convertible>));
+static_assert(!is_argument<long long>);
+static_assert(!is_argument<unsigned long long>);
+static_assert(!is_argument<long double>);
+static_assert(!is_argument<wchar_t>);
+static_assert(!is_argument<char8_t>);
+static_assert(!is_argument<char16_t>);
+static_assert(!is_argument<char32_t>);
+static_assert(!is_argument<std::nullptr_t>);
+static_assert(!is_argument<Scoped>);
+static_assert(!is_argument<Other>);
+static_assert(!is_argument<ToString>);
+static_assert(!is_argument<ToDate>);
+static_assert(!is_argument<std::string>);
+static_assert(!is_argument<std::string_view>);
+static_assert(!is_argument<const zxQVA<int>&>);
+static_assert(!is_argument<const zxSA<int>&>);
+static_assert(!is_argument<const zxAA<int, zxStr>&>);
+static_assert(!is_argument<volatile void*>);
+static_assert(!is_argument<void (*)()>);
+static_assert(!is_argument<int Other::*>);
+
+static_assert(zxFmtArg(1).tag == 'i');
+static_assert(zxFmtArg(1U).tag == 'u');
+static_assert(zxFmtArg('1').tag == 'c');
+static_assert(zxFmtArg(static_cast<unsigned char>(1)).tag == 'b');
+static_assert(zxFmtArg(1.0).tag == 'f');
+static_assert(zxFmtArg("1").tag == 'z');
+static_assert(zxFmtArg(true).tag == 'i');
+static_assert(zxFmtArg(static_cast<short>(-1)).tag == 'i');
+static_assert(zxFmtArg(static_cast<signed char>(-1)).number == -1);
+static_assert(zxFmtArg(k_plain).number == 3);
+static_assert(zxFmtArg(1.5F).real == 1.5);
+static_assert(zxFmtArg('\xFF').number == -1);
+static_assert(zxFmtArg(static_cast<unsigned char>(255)).word == 255);
+static_assert(zxFmtArg(77, nullptr).tag == 77);
+
+TEST(zxsfmt, each_type_has_its_tag) {
+  const std::time_t moment = 5;
+  const zxIStr inner("text");
+  int number = 1;
+  unsigned char byte = 1;
+  zxQVA<zxStr> texts;
+  zxSA<zxStr> table;
+  EXPECT_EQ(zxFmtArg(1L).tag, 'l' + 0U);
+  EXPECT_EQ(zxFmtArg(1UL).tag, 'v' + 0U);
+  EXPECT_EQ(zxFmtArg(zxStr()).tag, 's' + 0U);
+  EXPECT_EQ(zxFmtArg(inner).tag, 's' + 0U);
+  EXPECT_EQ(zxFmtArg(zxDate()).tag, 't' + 0U);
+  EXPECT_EQ(zxFmtArg(zxTime()).tag, 'M' + 0U);
+  EXPECT_EQ(zxFmtArg(&moment).tag, 'm' + 0U);
+  EXPECT_EQ(zxFmtArg(texts).tag, 'k' + 0U);
+  EXPECT_EQ(zxFmtArg(table).tag, zxFmtArg::k_table);
+  EXPECT_EQ(zxFmtArg(&number).tag, 'p' + 0U);
+  EXPECT_EQ(zxFmtArg(&byte).tag, 'p' + 0U);
+  EXPECT_EQ(zxFmtArg(&texts).tag, 'p' + 0U);
+}
+
+TEST(zxsfmt, a_long_beyond_32_bits_fails_an_assertion) {
+  EXPECT_EQ(zxFmtArg(2147483647L).number, INT32_MAX);
+  EXPECT_EQ(zxFmtArg(-2147483647L - 1).number, INT32_MIN);
+  EXPECT_EQ(zxFmtArg(4294967295UL).word, UINT32_MAX);
+  if (sizeof(long) == 4) GTEST_SKIP() << "a long has 32 bits here";
+  const auto above = static_cast<long>(std::int64_t{1} << 31);
+  for (const long number : {LONG_MAX, LONG_MIN, above, -above - 1})
+    EXPECT_ASSERTION(sfmt("#", number), "zxsfmt");
+  EXPECT_ASSERTION(sfmt("#", ULONG_MAX), "zxsfmt");
+  EXPECT_ASSERTION(
+      sfmt("#", static_cast<unsigned long>(std::uint64_t{1} << 32)), "zxsfmt");
 }
 
 // ---- plain text
@@ -194,19 +241,21 @@ TEST(zxsfmt, dates_have_their_form_by_both_directives) {
             good("25-02-0901-01-7025-02-09t"));
 }
 
-TEST(zxsfmt, a_date_outside_of_the_calendar_fails_an_assertion) {
-  const zxDate never = zxDate::from_stored(-1);
-  EXPECT_ASSERTION(sfmt("#", never), "zxdate");
-  EXPECT_ASSERTION(sfmt("%t", never), "zxdate");
-  kit::with_failures_dropped(
-      [&] { EXPECT_EQ(text_of(sfmt("<#>", never)), "<>"); });
+TEST(zxsfmt, words_and_bytes_have_their_form) {
+  EXPECT_EQ(compose("# #", 0U, 4294967295U), good("0 4294967295"));
+  EXPECT_EQ(compose("# #", -5L, 4294967295UL), good("-5 4294967295"));
+  EXPECT_EQ(
+      compose("# # #", static_cast<unsigned char>(200),
+              static_cast<unsigned char>(0), static_cast<unsigned char>(15)),
+      good("\\xc8 \\x0 \\xf"));
+  EXPECT_EQ(compose("# #", true, static_cast<signed char>(-3)), good("1 -3"));
 }
 
-TEST(zxsfmt, a_null_text_fails_an_assertion) {
-  const char* null = nullptr;
-  EXPECT_ASSERTION(sfmt("#", null), "zxstr");
-  kit::with_failures_dropped(
-      [&] { EXPECT_EQ(text_of(sfmt("<#>", null)), "<>"); });
+TEST(zxsfmt, a_second_form_of_a_string_has_a_placeholder_only) {
+  const zxStr text("a\0b", 3);
+  const zxFmtArg record(zxFmtArg::k_text, &text);
+  EXPECT_EQ(compose("<#>", record), good("<a\0b>"s));
+  EXPECT_EQ(compose("<%s>", record), bad("<%s>"));
 }
 
 TEST(zxsfmt, arguments_are_taken_in_their_order) {
@@ -255,15 +304,31 @@ TEST(zxsfmt, an_unknown_directive_fails_with_an_argument_as_well) {
   EXPECT_EQ(compose("<$y #>", 1, 2), bad("<$y #>"));
 }
 
-TEST(zxsfmt, a_date_directive_takes_nothing_but_a_date) {
-  EXPECT_EQ(compose("<%t>", 1), bad("<%t>"));
-  EXPECT_EQ(compose("<%t>", "01-01-70"), bad("<%t>"));
-  EXPECT_EQ(compose("<%t>", 1.5), bad("<%t>"));
-  EXPECT_EQ(compose("<%t>", zxStr("x")), bad("<%t>"));
-  EXPECT_EQ(compose("<%t> #", 'c', zxDate()), bad("<%t> #"));
+TEST(zxsfmt, a_failing_directive_leaves_its_text_and_what_follows) {
+  const zxStr text = "x";
+  EXPECT_EQ(compose("a#b%sc\n#%%", 1, 2, 3), bad("a1b%sc\n#%%"));
+  EXPECT_EQ(compose("a%d b\n", text), bad("a%d b\n"));
+  EXPECT_EQ(compose("a%f b\n", 1), bad("a%f b\n"));
+  EXPECT_EQ(compose("a%-5.2[x]lq b", 1), bad("a%-5.2[x]lq b"));
 }
 
-// ---- the entry that gives a text
+TEST(zxsfmt, the_old_text_is_dropped_first) {
+  zxStr out = "old";
+  EXPECT_FALSE(sfmt_try(out, "%d", "x"));
+  EXPECT_EQ(text_of(out), "%d");
+  EXPECT_TRUE(sfmt_try(out, ""));
+  EXPECT_EQ(text_of(out), "");
+}
+
+// Composing does not take room away that a string has.
+TEST(zxsfmt, room_in_the_text_stays) {
+  zxStr out;
+  out.reserve(10'000);
+  EXPECT_TRUE(sfmt_try(out, "#", 1));
+  EXPECT_EQ(out.capacity(), 10'000);
+}
+
+// ---- the entries that give a text
 
 TEST(zxsfmt, sfmt_gives_the_text) {
   EXPECT_EQ(text_of(sfmt("a # b\n", 5)), "a 5 b\r\n");
@@ -296,6 +361,42 @@ TEST(zxsfmt, behind_a_dropped_failure_there_is_the_text_so_far) {
     EXPECT_EQ(text_of(sfmt("a#b#c", 1)), "a1b#c");
     EXPECT_EQ(text_of(sfmt("ab", 1)), "ab");
   });
+}
+
+TEST(zxsfmt, sfmt_to_writes_into_a_string) {
+  zxStr out = "old";
+  EXPECT_EQ(&sfmt_to(out, "a#\n", 5), &out);
+  EXPECT_EQ(text_of(out), "a5\r\n");
+  zxIStr inner;
+  sfmt_to(inner, "%3d", 7);
+  EXPECT_EQ(text_of(inner), "  7");
+  zx_pos = {"place.cpp", 78};
+  EXPECT_FAILURE(sfmt_to(out, "b#"), "2006: fmt err (place.cpp:78)",
+                 "[2006-2006-0/E-0/E/place.cpp:78/]");
+  kit::with_failures_dropped([&] { sfmt_to(out, "b#"); });
+  EXPECT_EQ(text_of(out), "b#");
+}
+
+TEST(zxsfmt, sfmt_try_tells_whether_the_format_is_good) {
+  zxStr out;
+  EXPECT_TRUE(sfmt_try(out, "a#", 5));
+  EXPECT_EQ(text_of(out), "a5");
+  EXPECT_FALSE(sfmt_try(out, "b#%s#\n", 5, 6));
+  EXPECT_EQ(text_of(out), "b5%s#\n");
+  EXPECT_FALSE(sfmt_try(out, "c\n", 5));
+  EXPECT_EQ(text_of(out), "c\r\n");
+}
+
+TEST(zxsfmt, sfmt_try_s_takes_a_string) {
+  zxStr out;
+  EXPECT_TRUE(sfmt_try_s(out, zxStr("a#"), 5));
+  EXPECT_EQ(text_of(out), "a5");
+  EXPECT_FALSE(sfmt_try_s(out, zxStr("b#")));
+  EXPECT_EQ(text_of(out), "b#");
+  EXPECT_TRUE(sfmt_try_s(out, zxStr("c\0#", 3)));
+  EXPECT_EQ(text_of(out), "c");
+  EXPECT_TRUE(sfmt_try_s(out, zxStr()));
+  EXPECT_EQ(text_of(out), "");
 }
 
 TEST(zxsfmt, fifteen_arguments_are_taken) {
@@ -407,7 +508,63 @@ TEST(zxsfmt, a_program_prints_bytes_as_they_are) {
   EXPECT_EQ(result.err, "two \r\n");
 }
 
-// ---- the entry that fails
+// ---- the entry for the debugger
+
+std::string debugged;
+
+// What is handed to the debugger.
+class Debugger {
+ public:
+  Debugger() {
+    debugged.clear();
+    zxplat::process.debug_output = [](const char* text) {
+      debugged += text;
+      debugged += '|';
+    };
+  }
+  Debugger(const Debugger&) = delete;
+  Debugger& operator=(const Debugger&) = delete;
+  ~Debugger() {
+    zxplat::process.debug_output = zxplat::system_process.debug_output;
+  }
+};
+
+TEST(zxsfmt, dprint_hands_its_text_to_the_debugger) {
+  const Debugger debugger;
+  dprint("a#\n", 5);
+  dprint("");
+  EXPECT_EQ(debugged, "a5\r\n||");
+}
+
+TEST(zxsfmt, a_bad_format_of_dprint_is_2006) {
+  const Debugger debugger;
+  EXPECT_FAILURE(dprint("a#"), "2006: fmt err ()", "[2006-2006-0/E-0/E//]");
+  kit::with_failures_dropped([] { dprint("a", 1); });
+  EXPECT_EQ(debugged, "");
+}
+
+ZX_CASE(zxsfmt_prints_in_the_debugger) {
+  init_zxlib_args(argc, argv);
+  dprint("one\n");
+  dprint("%05d", 42);
+  return 0;
+}
+
+TEST(zxsfmt, what_goes_to_the_debugger_goes_to_a_file_that_is_asked_for) {
+  const TempDir folder;
+  kit::ProcessOptions options;
+  options.variables = {{"ZX_DEBUG_OUT", folder.file("debug")}};
+  const kit::ProcessResult result =
+      kit::run_case("zxsfmt_prints_in_the_debugger", {}, options);
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out + result.err, "");
+  EXPECT_EQ(read_file(folder.file("debug")), "one\r\n00042");
+  options.variables = {{"ZX_DEBUG_OUT", "-"}};
+  EXPECT_EQ(kit::run_case("zxsfmt_prints_in_the_debugger", {}, options).err,
+            "one\r\n00042");
+}
+
+// ---- the entries that fail
 
 TEST(zxsfmt, bailf_ends_with_its_text) {
   EXPECT_FAILURE(bailf("no such # (#)", "thing", 5), "no such thing (5)",
@@ -426,6 +583,33 @@ TEST(zxsfmt, the_text_of_bailf_is_cut_to_140_bytes) {
 TEST(zxsfmt, a_bad_format_of_bailf_is_2006) {
   EXPECT_FAILURE(bailf("abc#"), "2006: fmt err ()", "[2006-2006-0/E-0/E//]");
   EXPECT_FAILURE(bailf("abc", 1), "2006: fmt err ()", "[2006-2006-0/E-0/E//]");
+}
+
+TEST(zxsfmt, bailfn_ends_with_a_message_and_its_text) {
+  EXPECT_FAILURE(bailfn(1004, "no#such", 1),
+                 "1004: create: Can't open file 'no1such' for writing",
+                 "[1004-1004-0/E-0/E/no1such/]");
+  EXPECT_FAILURE(bailfn(1004, "%s%%n", "%s"),
+                 "1004: create: Can't open file '%s%n' for writing",
+                 "[1004-1004-0/E-0/E/%s%n/]");
+  EXPECT_FAILURE(bailfn(7, "a\n"), "7: a\r\n", "[7-7-0/E-0/E/a\r\n/]");
+  EXPECT_FAILURE(bailfn(0, "a#", 'b'), "ab", "[0-0-0/E-0/E/ab/]");
+}
+
+TEST(zxsfmt, a_bad_format_of_bailfn_is_2006) {
+  EXPECT_FAILURE(bailfn(1004, "a#"), "2006: fmt err ()",
+                 "[2006-2006-0/E-0/E//]");
+  EXPECT_FAILURE(bailfn(1004, "a", 1), "2006: fmt err ()",
+                 "[2006-2006-0/E-0/E//]");
+}
+
+TEST(zxsfmt, entries_come_back_from_a_dropped_failure) {
+  kit::with_failures_dropped([] {
+    bailf("a#");
+    bailf("a#", 1);
+    bailfn(1004, "a#");
+    bailfn(1004, "a#", 1);
+  });
 }
 
 TEST(zxsfmt, bailf_takes_sixteen_arguments) {

@@ -1,5 +1,6 @@
-// zxstr_test.cpp - tests of zxlib/zxstr.h and zxstr.cpp: the string, its
-// sharing and growth, its form with room inside, and the checksum of 16 bits.
+// zxstr_test.cpp - tests of zxlib/zxstr.h and its sources: the string, its
+// sharing and growth, its form with room inside, and the checksums of 16 and
+// of 32 bits.
 
 #include "zxstr.h"
 
@@ -2369,7 +2370,7 @@ TEST(zxstr, failures_take_their_text_from_a_string) {
   EXPECT_FAILURE(bail_code(0, zxStr()), "", "[0-0-0/E-0/E//]");
 }
 
-// --------------------------------------------------------------- checksum --
+// -------------------------------------------------------------- checksums --
 
 // Bit by bit, the highest first.
 std::uint16_t slow_crc16(std::uint16_t crc, std::string_view bytes) {
@@ -2435,6 +2436,74 @@ TEST(zxstr, crc16_is_the_same_at_every_length_place_and_split) {
         const std::uint16_t first = crc16_add(start, bytes, cut);
         ASSERT_EQ(first, slow_crc16(start, all.substr(0, cut)));
         ASSERT_EQ(crc16_add(first, bytes + cut, length - cut), expected);
+      }
+    }
+  }
+}
+
+// Bit by bit, the lowest first.
+std::uint32_t slow_crc32(std::uint32_t crc, std::string_view bytes) {
+  for (const char byte : bytes) {
+    for (int bit = 0; bit < 8; ++bit) {
+      const bool in = (static_cast<unsigned char>(byte) >> bit & 1) != 0;
+      const bool out = (crc & 1) != 0;
+      crc >>= 1;
+      if (in != out) crc ^= 0xEDB88320;
+    }
+  }
+  return crc;
+}
+
+TEST(zxstr, crc32_is_the_complement_of_the_published_values) {
+  const struct {
+    std::string_view bytes;
+    std::uint32_t published;
+  } rows[] = {
+      {"", 0},
+      {"a", 0xE8B7BE43},
+      {"abc", 0x352441C2},
+      {"123456789", 0xCBF43926},
+      {"The quick brown fox jumps over the lazy dog", 0x414FA339},
+      {"\0\0\0\0"sv, 0x2144DF1C},
+      {"\xFF\xFF\xFF\xFF", 0xFFFFFFFF},
+  };
+  for (const auto& row : rows)
+    EXPECT_EQ(crc32(row.bytes.data(), row.bytes.size()), ~row.published)
+        << testing::PrintToString(row.bytes);
+  EXPECT_EQ(crc32(nullptr, 0), 0xFFFFFFFF);
+  EXPECT_EQ(crc32_add(0x12345678, nullptr, 0), 0x12345678U);
+}
+
+TEST(zxstr, crc32_byte_is_one_step_of_the_bitwise_model) {
+  constexpr std::uint32_t k_starts[] = {0, 1, 0x80000000, 0xFFFFFFFF,
+                                        0x12345678};
+  for (int byte = 0; byte < 256; ++byte) {
+    const char bytes[] = {static_cast<char>(byte)};
+    for (const std::uint32_t start : k_starts)
+      ASSERT_EQ(crc32_byte(start, static_cast<std::uint8_t>(byte)),
+                slow_crc32(start, {bytes, 1}));
+  }
+}
+
+TEST(zxstr, crc32_is_the_same_at_every_length_place_and_split) {
+  constexpr unsigned k_seed = 2468;
+  std::printf("seed %u\n", k_seed);
+  std::mt19937 random(k_seed);
+  for (std::size_t length = 0; length <= 40; ++length) {
+    for (std::size_t place = 0; place < 8; ++place) {
+      // The block ends with the bytes, so that a byte too many is noticed.
+      const auto block = std::make_unique<char[]>(place + length);
+      char* bytes = block.get() + place;
+      for (std::size_t i = 0; i < length; ++i)
+        bytes[i] = static_cast<char>(random());
+      const auto start = static_cast<std::uint32_t>(random());
+      const std::string_view all(bytes, length);
+      ASSERT_EQ(crc32(bytes, length), slow_crc32(0xFFFFFFFF, all));
+      const std::uint32_t expected = slow_crc32(start, all);
+      for (std::size_t cut = 0; cut <= length; ++cut) {
+        const std::uint32_t first = crc32_add(start, bytes, cut);
+        ASSERT_EQ(first, slow_crc32(start, all.substr(0, cut)));
+        ASSERT_EQ(crc32_add(first, bytes + cut, length - cut), expected);
       }
     }
   }
