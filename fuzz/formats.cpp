@@ -157,7 +157,7 @@ void Arguments::add_number(Reader& input, std::uint32_t tag) {
     value = static_cast<std::int32_t>(input.number(4));
   zxFmtArg record = value;
   record.tag = tag;
-  if (tag == 'b') record.word &= 0xFF;
+  if (tag == 'b') record.number &= 0xFF;
   if (tag == 'c') record.number = static_cast<signed char>(value);
   if (tag == zxFmtArg::k_bool) record.number &= 1;
   records.push_back(record);

@@ -8,7 +8,6 @@
 #include <string_view>
 
 #include "zxplat.h"
-#include "zxregexe.h"
 #include "zxsfmt_impl.h"
 
 zxTakeFromList zx_fmt_take_from_list = [](void*, zxFmtArg&, bool&) {
@@ -35,24 +34,6 @@ const char* skip_plain(const char* at) {
   return at;
 }
 
-// ---- blocks of memory
-
-// The memory of a string that it can write to in place.
-class Block {
- public:
-  explicit Block(const zxStr& text)
-      : start(reinterpret_cast<std::uintptr_t>(text.c_str())),
-        size(static_cast<std::uintptr_t>(text.capacity())) {}
-
-  bool holds(const void* place) const {
-    return size != 0 && reinterpret_cast<std::uintptr_t>(place) - start <= size;
-  }
-
- private:
-  std::uintptr_t start;
-  std::uintptr_t size;
-};
-
 // ---- one pass over a format
 
 class Composer {
@@ -60,7 +41,6 @@ class Composer {
   Composer(zxStr& text, const char* format, zxFmtEnv& environment,
            std::int32_t arg_count, const zxFmtArg* arg_list)
       : out(text),
-        out_block(text),
         at(format),
         env(environment),
         left(arg_count),
@@ -90,7 +70,6 @@ class Composer {
   bool dollar();
 
   Output out;
-  const Block out_block;
   const char* at;
   zxFmtEnv& env;
   std::int32_t left;
@@ -134,7 +113,7 @@ const zxFmtArg* Composer::take() {
     ++args;
   }
   if (arg->tag != 'z' ||
-      ZX_ASSERT(arg->pointer != nullptr && !out_block.holds(arg->pointer)))
+      ZX_ASSERT(arg->pointer != nullptr && !out.stood_on(arg->pointer)))
     return arg;
   element = "";
   return &element;
@@ -365,7 +344,7 @@ void print_in_debugger(bool good, const zxStr& text) {
 bool sfmt_core(zxStr& out, const char* format, zxFmtEnv& env,
                std::int32_t count, const zxFmtArg* args) {
   using namespace zxsfmt_detail;
-  if (Block(out).holds(format)) {
+  if (lies_in(out.c_str(), zx_size(out.capacity()), format)) {
     const zxStr held = format;
     return sfmt_core(out, held.c_str(), env, count, args);
   }

@@ -21,7 +21,7 @@
 // too many arguments make a format fail, which each entry answers in its own
 // way; mistakes in formats never do harm.  A single output of a number, a
 // character, a time or a pointer has up to 255 bytes, more fail an assertion;
-// texts have no such limit.
+// texts, and numbers by "%v", have no such limit.
 //
 // An argument whose whole text is "err" or "void", if it is met by any "%"
 // directive as plain text, replaces all that was composed so far by that
@@ -178,8 +178,8 @@ class zxFmtEnv {
 // where "*" finds no int the rest is left out.
 //
 // `format` may be the text of `out`.  Arguments may not, but for a zxStr
-// under "#", which adds what stands in it by then: such a text and such a
-// string under "%" fail an assertion.
+// under "#", which adds what stands in it by then: such a text, such a
+// string under "%" and groups of a match in it fail an assertion.
 bool sfmt_core(zxStr& out, const char* format, zxFmtEnv& env,
                std::int32_t count, const zxFmtArg* args);
 

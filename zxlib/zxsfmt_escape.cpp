@@ -4,6 +4,7 @@
 
 #include "zxregexe.h"
 #include "zxsfmt_impl.h"
+#include "zxstrm.h"
 
 namespace zxsfmt_detail {
 namespace {
@@ -17,10 +18,9 @@ std::int32_t digits_at(const char*& at) {
   return read_digits(digits);
 }
 
-void append_group(Output& out, std::size_t slot) {
-  const char* const start = zx_match.start[slot];
-  if (start != nullptr)
-    out.add(std::string_view(start, zx_distance(start, zx_match.end[slot])));
+// A match that was found in the result's own bytes cannot be shown.
+void append_group(Output& out, std::int32_t slot) {
+  if (ZX_ASSERT(!out.stood_on(zx_match.start[slot]))) out.add(group_text(slot));
 }
 
 void append_now(Output& out, std::int32_t form) {
@@ -152,7 +152,7 @@ bool append_escape(Output& out, const char*& at, zxFmtEnv& env) {
       return true;
     default:
       if (!zx_is_digit(letter)) return false;
-      append_group(out, static_cast<std::size_t>(letter - '0'));
+      append_group(out, letter - '0');
       return true;
   }
 }

@@ -42,13 +42,29 @@ inline constexpr std::int32_t k_most_digits = 770;
 
 // ------------------------------------------------------------- the result --
 
+// True for a place in a string's own memory, the NUL at its end included.
+inline bool lies_in(const char* block, std::size_t size, const void* place) {
+  return size > 0 && reinterpret_cast<std::uintptr_t>(place) -
+                             reinterpret_cast<std::uintptr_t>(block) <=
+                         size;
+}
+
 // The string under composition, written to behind its end.  The string is as
 // it should be between any two calls; whoever changes it in another way has
 // to call reload().
 class Output {
  public:
-  explicit Output(zxStr& result) : string(result) {
-    if (result.capacity() > 0) reload();
+  explicit Output(zxStr& result)
+      : string(result),
+        first_block(result.c_str()),
+        first_size(zx_size(result.capacity())) {
+    if (first_size > 0) reload();
+  }
+
+  // True for a place in the memory that the result had at first, which is
+  // written over or given back while it is composed.
+  bool stood_on(const void* place) const {
+    return lies_in(first_block, first_size, place);
   }
 
   const zxStr& text() const { return string; }
@@ -99,6 +115,8 @@ class Output {
   char* grow(std::int64_t n);
 
   zxStr& string;
+  const char* first_block;
+  std::size_t first_size;
   // No room at first.
   char* end = zx_empty_rep.data;
   const char* limit = zx_empty_rep.data;

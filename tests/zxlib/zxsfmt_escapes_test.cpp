@@ -47,6 +47,17 @@ TEST(zxsfmt_escapes, groups_are_added_as_they_are) {
   EXPECT_EQ(compose("<$0>\n"), good("<a\n%d#$1\0>\r\n"s));
 }
 
+TEST(zxsfmt_escapes, groups_of_a_match_in_the_result_fail_an_assertion) {
+  zxStr text = "hello world";
+  ASSERT_TRUE(match_buf("w(or)ld", text.begin(), text.end()));
+  for (const char* format : {"<$1>", "<$0>", "<$`>", "<$'>"}) {
+    EXPECT_ASSERTION(sfmt_to(text, format), "zxsfmt_escape");
+    kit::with_failures_dropped(
+        [&] { EXPECT_EQ(text_of(sfmt_to(text, format)), "<>"); });
+  }
+  clear_match();
+}
+
 TEST(zxsfmt_escapes, without_a_match_groups_are_empty) {
   flush_regex_cache();
   EXPECT_EQ(compose("<$0$5$`$'>"), good("<>"));

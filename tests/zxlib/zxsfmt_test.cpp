@@ -115,7 +115,7 @@ static_assert(zxFmtArg(static_cast<signed char>(-1)).number == -1);
 static_assert(zxFmtArg(k_plain).number == 3);
 static_assert(zxFmtArg(1.5F).real == 1.5);
 static_assert(zxFmtArg('\xFF').number == -1);
-static_assert(zxFmtArg(static_cast<unsigned char>(255)).word == 255);
+static_assert(zxFmtArg(static_cast<unsigned char>(255)).word() == 255);
 static_assert(zxFmtArg(77, nullptr).tag == 77);
 
 TEST(zxsfmt, each_type_has_its_tag) {
@@ -142,7 +142,7 @@ TEST(zxsfmt, each_type_has_its_tag) {
 TEST(zxsfmt, a_long_beyond_32_bits_fails_an_assertion) {
   EXPECT_EQ(zxFmtArg(2147483647L).number, INT32_MAX);
   EXPECT_EQ(zxFmtArg(-2147483647L - 1).number, INT32_MIN);
-  EXPECT_EQ(zxFmtArg(4294967295UL).word, UINT32_MAX);
+  EXPECT_EQ(zxFmtArg(4294967295UL).word(), UINT32_MAX);
   if (sizeof(long) == 4) GTEST_SKIP() << "a long has 32 bits here";
   const auto above = static_cast<long>(std::int64_t{1} << 31);
   for (const long number : {LONG_MAX, LONG_MIN, above, -above - 1})
