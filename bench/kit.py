@@ -184,6 +184,16 @@ class GoogleBenchmark:
             "medians of the processor time of %d repetitions of %g s or more"
             % (repetitions, seconds))
 
+    def check(self):
+        """Has the program compare what its sides give; raises Failure if they
+        differ."""
+        done = subprocess.run([self.path, "--check"], check=False, text=True,
+                              errors="replace", stdout=subprocess.PIPE,
+                              stderr=subprocess.STDOUT)
+        if done.returncode != 0:
+            raise Failure("the sides of %s differ\n%s" % (
+                self.path, done.stdout))
+
     def compared(self, name, what, peer, firm=None, aim=None, needs=None):
         """The row of the benchmarks WHAT/ours and WHAT/peer, or for a `what`
         with a size in it of WHAT/ours/SIZE and WHAT/peer/SIZE. `needs` are

@@ -11,7 +11,6 @@ out on both sides, and its number is that of the rest.
 """
 
 import statistics
-import subprocess
 from dataclasses import dataclass, field
 
 import kit
@@ -156,21 +155,13 @@ def pathological_rows(figures):
             yield compared(figures, name, [what], peer, None, aim, MICRO)
 
 
-def check(program):
-    done = subprocess.run([program.path, "--check"], check=False, text=True,
-                          stdout=subprocess.PIPE, stderr=subprocess.STDOUT)
-    if done.returncode != 0:
-        raise kit.Failure("the sides of %s differ\n%s" % (
-            program.path, done.stdout))
-
-
 def rows(bench):
     for package, file in kit.GoogleBenchmark.PACKAGES.items():
         if not kit.is_there(file):
             return [kit.skipped("patterns", "all", package)]
     program = kit.GoogleBenchmark("bench_patterns", bench,
                                   bench.rounds(REPETITIONS))
-    check(program)
+    program.check()
     figures = Figures(program)
     return [row for group in (short_rows, long_rows, replacing_rows,
                               compile_rows, pathological_rows)

@@ -7,7 +7,6 @@ a string of its side where it is text. Before anything is measured the results
 of all sides are compared; where two may differ, the sources say so.
 """
 
-import subprocess
 from dataclasses import dataclass, field
 
 import kit
@@ -128,21 +127,12 @@ def rows_of(line, figures):
             yield kit.Row(name, ours, peer.name, theirs, ours / theirs, *goals)
 
 
-def check(program):
-    done = subprocess.run([program.path, "--check"], check=False, text=True,
-                          errors="replace", stdout=subprocess.PIPE,
-                          stderr=subprocess.STDOUT)
-    if done.returncode != 0:
-        raise kit.Failure("the sides of %s differ\n%s" % (
-            program.path, done.stdout))
-
-
 def rows(bench):
     for package, file in kit.GoogleBenchmark.PACKAGES.items():
         if not kit.is_there(file):
             return [kit.skipped("text", "all", package)]
     program = kit.GoogleBenchmark("bench_text", bench,
                                   bench.rounds(REPETITIONS))
-    check(program)
+    program.check()
     figures = Figures(program)
     return [row for line in LINES for row in rows_of(line, figures)]

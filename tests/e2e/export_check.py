@@ -13,12 +13,10 @@ were. `--seed` moves the first table's seed; `--only` runs that one table
 Exit codes: 0 all alike, 1 a difference, 77 the tool is not there.
 """
 
-import argparse
 import concurrent.futures
 import os
 import random
 import re
-import shlex
 import shutil
 import subprocess
 import sys
@@ -27,8 +25,11 @@ import threading
 import time
 
 sys.dont_write_bytecode = True
+sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)),
+                                "..", "kit"))
 
-import export_model as model  # noqa: E402  (only after the line above)
+import checks  # noqa: E402  (only after the lines above)
+import export_model as model  # noqa: E402
 import export_table  # noqa: E402
 
 TABLES, TABLES_QUICK = 3000, 150
@@ -274,34 +275,11 @@ def stop_on(run, difference):
         raise Difference(described(run, difference))
 
 
-def resolved_tool(arguments):
-    """The command as a list; words that name files made absolute, since the
-    tool runs in other folders. None if the program is not there."""
-    default = os.path.join(arguments.bin_dir or ".", "vtx2csv")
-    words = shlex.split(arguments.tool or shlex.quote(default))
-    if not words or not os.path.isfile(words[-1]):
-        return None
-    return [os.path.abspath(word) if os.path.isfile(word) else word
-            for word in words]
-
-
-def parse_arguments():
-    parser = argparse.ArgumentParser(
-        description="Compares the export tool with its model.")
-    parser.add_argument("--tool", help="launcher and program, shell-like")
-    parser.add_argument("--bin-dir", help="where the built programs lie")
-    parser.add_argument("--quick", action="store_true")
-    parser.add_argument("--seed", type=int, default=1)
-    parser.add_argument("--only", action="store_true")
-    return parser.parse_args()
-
-
 def main():
-    arguments = parse_arguments()
-    tool = resolved_tool(arguments)
+    arguments = checks.parse_arguments("Compares the export tool with its model.")
+    tool = checks.resolved_tool(arguments, "vtx2csv")
     if tool is None:
-        print("skipped: no program in %r" % (arguments.tool or "--bin-dir"))
-        return 77
+        return checks.SKIPPED
     if not model.self_test():
         print("the model fails its self test")
         return 1

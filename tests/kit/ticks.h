@@ -1,4 +1,4 @@
-// ticks.h - the test kit: a clock of milliseconds that stands still.
+// ticks.h - the test kit: clocks that stand still.
 #ifndef KIT_TICKS_H
 #define KIT_TICKS_H
 
@@ -21,6 +21,21 @@ class Ticks {
 
  private:
   static inline std::uint32_t now;
+};
+
+// While one lives, zxplat::process.clock() is always `moment`.
+class Clock {
+ public:
+  explicit Clock(std::int64_t moment) {
+    now = moment;
+    zxplat::process.clock = [] { return now; };
+  }
+  Clock(const Clock&) = delete;
+  Clock& operator=(const Clock&) = delete;
+  ~Clock() { zxplat::process.clock = zxplat::system_process.clock; }
+
+ private:
+  static inline std::int64_t now;
 };
 
 }  // namespace kit

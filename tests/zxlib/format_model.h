@@ -371,13 +371,16 @@ class Model {
 
   static std::string whole_number(const Spec& spec, const Value& value) {
     need(value, "lviuBcb");
-    const std::string form = "%" + spec.flags + spec.width +
-                             spec.point_and_precision() + spec.letter;
-    if (spec.letter == 'd' || spec.letter == 'i')
-      return short_enough(
-          printed(form, static_cast<std::int32_t>(value.number)));
+    const bool is_signed = spec.letter == 'd' || spec.letter == 'i';
+    std::string flags;
+    for (const char flag : spec.flags)
+      if (is_signed || (flag != '+' && flag != ' ')) flags += flag;
+    const std::string form =
+        "%" + flags + spec.width + spec.point_and_precision() + spec.letter;
+    const auto number = static_cast<std::int32_t>(value.number);
     return short_enough(
-        printed(form, static_cast<std::uint32_t>(value.number)));
+        is_signed ? printed(form, number)
+                  : printed(form, static_cast<std::uint32_t>(number)));
   }
 
   // Blanks up to the width; on the left unless the text stands there.

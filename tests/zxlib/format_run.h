@@ -5,8 +5,6 @@
 
 #include <array>
 #include <cstdint>
-#include <cstdlib>
-#include <optional>
 #include <ostream>
 #include <string>
 #include <string_view>
@@ -14,8 +12,9 @@
 #include <vector>
 
 #include "kit/failure.h"
-#include "kit/target.h"
 #include "kit/text.h"
+#include "kit/ticks.h"
+#include "kit/variables.h"
 #include "zxplat.h"
 #include "zxsfmt.h"
 
@@ -64,43 +63,9 @@ Composed compose(const char* format, const Args&... args) {
               }).message.starts_with("1000: bailed out: zxsfmt")) \
       << #statement
 
-// Time stands still at a moment.
-class Clock {
- public:
-  explicit Clock(std::int64_t moment) {
-    now = moment;
-    zxplat::process.clock = [] { return now; };
-  }
-  Clock(const Clock&) = delete;
-  Clock& operator=(const Clock&) = delete;
-  ~Clock() { zxplat::process.clock = zxplat::system_process.clock; }
-
- private:
-  static inline std::int64_t now;
-};
-
-// Another value of an environment variable, or none.
-class Variable {
- public:
-  Variable(const char* variable, const char* value) : name(variable) {
-    const char* old = std::getenv(variable);
-    if (old != nullptr) before = old;
-    kit::set_variable(name, value);
-  }
-  Variable(const Variable&) = delete;
-  Variable& operator=(const Variable&) = delete;
-  ~Variable() { kit::set_variable(name, before ? before->c_str() : nullptr); }
-
- private:
-  const std::string name;
-  std::optional<std::string> before;
-};
-
-// The zone of a test.
-class InZone : Variable {
- public:
-  explicit InZone(const char* zone) : Variable("TZ", zone) {}
-};
+using kit::Clock;
+using kit::InZone;
+using kit::Variable;
 
 // ---- lists of arguments
 

@@ -14,9 +14,11 @@
 #include <vector>
 
 #include "format_run.h"
+#include "kit/cases.h"
 #include "kit/failure.h"
 #include "kit/text.h"
 #include "zones.h"
+#include "zxmainf.h"
 #include "zxsfmt.h"
 
 namespace {
@@ -419,9 +421,17 @@ TEST(zxsfmt_directives, a_template_shows_any_field) {
                {"<%3[%Q]t>", time, "<   >"},
                {"<%[%]t>", time, "<>"},
                {"<%[%e]t>", time, "<>"}});
-  // 79 bytes are the most: four times 17, 8 and 3.
-  EXPECT_EQ(compose("%[%c%c%c%c%x123]t", time).text.size(), 79U);
-  EXPECT_EQ(compose("<%[%c%c%c%c%x1234]t>", time), good("<>"));
+}
+
+TEST(zxsfmt_directives, a_template_has_79_bytes_or_none) {
+  zxDate wednesday;
+  wednesday.set(2009, 3, 4);
+  std::string days;
+  for (int i = 0; i < 7; ++i) days += "%A";  // 63 bytes, and twice 8
+  EXPECT_EQ(compose(("%[" + days + "%X%X]t").c_str(), wednesday).text.size(),
+            79U);
+  EXPECT_EQ(compose(("<%[" + days + "%X%Xx]t>").c_str(), wednesday),
+            good("<>"));
 }
 
 TEST(zxsfmt_directives, a_template_does_not_take_a_number) {
@@ -461,23 +471,33 @@ TEST(zxsfmt_directives, a_moment_below_1_is_the_constant_day) {
 
 // In summer a time shows its moment's standard time by "#", and what the
 // clocks show by the forms of the moment.
-TEST(zxsfmt_directives, forms_of_a_moment_know_daylight_saving) {
-  const InZone zone("EST5EDT");
-  zxTime summer;
-  summer.set_time_t(k_summer);
-  EXPECT_EQ(compose("#", summer), good("01-07-2009 07:00:00"));
-  EXPECT_EQ(compose("%T", summer), good("01-07-09 08:00:00"));
-  EXPECT_EQ(compose("#", &k_summer), good("01-07-09 08:00:00"));
-  EXPECT_EQ(compose("%[%H]t", summer), good("08"));
-  zxTime winter;
-  winter.set_time_t(k_winter);
-  EXPECT_EQ(compose("#", winter), good("07-03-2009 09:05:06"));
-  EXPECT_EQ(compose("%T", winter), good("07-03-09 09:05:06"));
+ZX_CASE(zxsfmt_in_summer) {
+  init_zxlib_args(argc, argv);
+  const format_run::Clock clock(k_summer);
+  zxTime time;
   zxDate date;
+  time.set_time_t(k_summer);
   date.set(2009, 7, 1);
-  EXPECT_EQ(compose("%[%d %H]t", date), good("01 01"));
+  oprint("#|%T|%[%d %H]t|", time, time, time);
+  oprint("#|%T|%[%d %H]t|%[%d %H]t|", &k_summer, &k_summer, &k_summer, date);
+  oprint("$T|$t\n");
+  time.set_time_t(k_winter);
   date.set(2009, 1, 1);
-  EXPECT_EQ(compose("%[%d %H]t", date), good("01 00"));
+  oprint("#|%T|%[%d %H]t|%[%d %H]t\n", time, time, time, date);
+  return 0;
+}
+
+TEST(zxsfmt_directives, forms_of_a_moment_know_daylight_saving) {
+  kit::ProcessOptions options;
+  options.variables = {{"TZ", "EST5EDT"}};
+  const kit::ProcessResult result =
+      kit::run_case("zxsfmt_in_summer", {}, options);
+  EXPECT_EQ(result.exit_code, 0);
+  EXPECT_EQ(result.out,
+            "01-07-2009 07:00:00|01-07-09 08:00:00|01 08|"
+            "01-07-09 08:00:00|01-07-09 08:00:00|01 08|01 01|"
+            "09/07/01 08:00:00|08:00:00\r\n"
+            "07-03-2009 09:05:06|07-03-09 09:05:06|07 09|01 00\r\n");
 }
 
 TEST(zxsfmt_directives, moments_are_shown_by_the_clock_of_every_zone) {

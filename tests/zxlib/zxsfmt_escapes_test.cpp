@@ -75,9 +75,9 @@ TEST(zxsfmt_escapes, the_present_moment_has_three_escapes) {
 }
 
 TEST(zxsfmt_escapes, the_present_moment_is_that_of_the_local_clock) {
-  const format_run::InZone zone("EST5EDT");
-  const format_run::Clock clock(1'246'449'600);  // in summer, 12:00 UTC
-  EXPECT_EQ(compose("$T $t"), good("09/07/01 08:00:00 08:00:00"));
+  const format_run::InZone zone("NPT-5:45");
+  const format_run::Clock clock(1'236'434'706);
+  EXPECT_EQ(compose("$T $d $t"), good("09/03/07 19:50:06 07-03-09 19:50:06"));
 }
 
 // ---- columns

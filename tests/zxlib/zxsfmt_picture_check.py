@@ -13,19 +13,20 @@ first one, `--only` runs that one alone.
 Exit codes: 0 all alike, 1 a difference, 77 the program is not there.
 """
 
-import argparse
 import math
 import os
 import random
-import shlex
 import struct
 import subprocess
 import sys
 import tempfile
 
 sys.dont_write_bytecode = True
+sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)),
+                                "..", "kit"))
 
-import picture_model as model  # noqa: E402  (only after the line above)
+import checks  # noqa: E402  (only after the lines above)
+import picture_model as model  # noqa: E402
 
 CASE = "zxsfmt_picture_rows"
 BATCH = 20000
@@ -240,34 +241,11 @@ def seeds_of(arguments):
     return range(first, first + (BATCHES_QUICK if arguments.quick else BATCHES))
 
 
-def resolved_tool(arguments):
-    """The command as a list; words that name files made absolute, since the
-    program runs in other folders. None if it is not there."""
-    default = os.path.join(arguments.bin_dir or ".", "zx_tests")
-    words = shlex.split(arguments.tool or shlex.quote(default))
-    if not words or not os.path.isfile(words[-1]):
-        return None
-    return [os.path.abspath(word) if os.path.isfile(word) else word
-            for word in words]
-
-
-def parse_arguments():
-    parser = argparse.ArgumentParser(
-        description="Compares number pictures with their model.")
-    parser.add_argument("--tool", help="launcher and program, shell-like")
-    parser.add_argument("--bin-dir", help="where the built programs lie")
-    parser.add_argument("--quick", action="store_true")
-    parser.add_argument("--seed", type=int, default=1)
-    parser.add_argument("--only", action="store_true")
-    return parser.parse_args()
-
-
 def main():
-    arguments = parse_arguments()
-    tool = resolved_tool(arguments)
+    arguments = checks.parse_arguments("Compares number pictures with their model.")
+    tool = checks.resolved_tool(arguments, "zx_tests")
     if tool is None:
-        print("skipped: no program in %r" % (arguments.tool or "--bin-dir"))
-        return 77
+        return checks.SKIPPED
     if not model.self_test():
         print("the model fails its self test")
         return 1

@@ -11,7 +11,6 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
-#include <functional>
 #include <limits>
 #include <random>
 #include <string>
@@ -38,16 +37,6 @@ std::string stripped(std::string_view text) {
   if (first == std::string_view::npos) return "";
   return std::string(
       text.substr(first, text.find_last_not_of(k_space) + 1 - first));
-}
-
-// Calls for all texts over an alphabet up to a length.
-void for_all_texts(std::string_view alphabet, std::size_t longest,
-                   const std::function<void(const std::string&)>& call,
-                   const std::string& start = "") {
-  call(start);
-  if (start.size() == longest) return;
-  for (const char byte : alphabet)
-    for_all_texts(alphabet, longest, call, start + byte);
 }
 
 // ---------------------------------------------------------- whole numbers --

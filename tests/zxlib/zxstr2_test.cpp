@@ -11,7 +11,6 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
-#include <functional>
 #include <random>
 #include <string>
 #include <string_view>
@@ -29,6 +28,7 @@ using namespace std::string_literals;
 using namespace std::string_view_literals;
 using Texts = std::vector<std::string>;
 
+using kit::for_all_texts;
 using kit::str;
 using kit::text_of;
 using regex_run::at_the_end_of_memory;
@@ -36,16 +36,6 @@ using regex_run::shown;
 
 bool share(const zxStr& a, const zxStr& b) {
   return a.representation() == b.representation();
-}
-
-// Calls for all texts over an alphabet up to a length.
-void for_all_texts(std::string_view alphabet, std::size_t longest,
-                   const std::function<void(const std::string&)>& call,
-                   const std::string& start = "") {
-  call(start);
-  if (start.size() == longest) return;
-  for (const char byte : alphabet)
-    for_all_texts(alphabet, longest, call, start + byte);
 }
 
 std::string all_bytes() {

@@ -23,6 +23,8 @@
 #include "kit/failure.h"
 #include "kit/target.h"
 #include "kit/text.h"
+#include "kit/ticks.h"
+#include "kit/variables.h"
 #include "zones.h"
 #include "zxplat.h"
 
@@ -44,6 +46,8 @@ constexpr std::int32_t k_seconds[] = {
 
 zxTime time_of(std::int32_t seconds) { return zxTime::from_stored(seconds); }
 
+using kit::Clock;
+using kit::InZone;
 using kit::text_of;
 
 struct Fields {
@@ -116,37 +120,6 @@ std::int32_t length_of_month(std::int32_t year, std::int32_t month) {
                                    static_cast<unsigned>(month)))};
   return static_cast<std::int32_t>(static_cast<unsigned>(last.day()));
 }
-
-// The zone of a test, with its standard time alone; that of before at the end.
-class InZone {
- public:
-  explicit InZone(const char* zone) {
-    const char* old = std::getenv("TZ");
-    if (old != nullptr) before = old;
-    kit::set_variable("TZ", zone);
-  }
-  InZone(const InZone&) = delete;
-  InZone& operator=(const InZone&) = delete;
-  ~InZone() { kit::set_variable("TZ", before ? before->c_str() : nullptr); }
-
- private:
-  std::optional<std::string> before;
-};
-
-// Time stands still at a moment.
-class Clock {
- public:
-  explicit Clock(std::int64_t moment) {
-    now = moment;
-    zxplat::process.clock = [] { return now; };
-  }
-  Clock(const Clock&) = delete;
-  Clock& operator=(const Clock&) = delete;
-  ~Clock() { zxplat::process.clock = zxplat::system_process.clock; }
-
- private:
-  static inline std::int64_t now;
-};
 
 constexpr char k_bad_time[] = "1803: settime: bad time (#) (1)";
 constexpr char k_bad_time_line[] = "[1803-1803-1/E-0/E//]";
