@@ -17,6 +17,7 @@
 #include <string_view>
 
 #include "kit/failure.h"
+#include "kit/text.h"
 #include "regex_run.h"
 #include "zxstr2.h"
 
@@ -180,13 +181,13 @@ TEST(zxstr2_number, parse_long_reads_whole_numbers) {
 }
 
 TEST(zxstr2_number, parse_long_of_short_texts_agrees_with_the_slow_model) {
-  for_all_texts("019,.-kMe ", 6, expect_long_of_model);
-  for_all_texts("2,+mKk\t", 5, expect_long_of_model);
+  kit::for_all_texts("019,.-kMe ", 6, expect_long_of_model);
+  kit::for_all_texts("2,+mKk\t", 5, expect_long_of_model);
 }
 
 TEST(zxstr2_number_slow,
      parse_long_of_longer_texts_agrees_with_the_slow_model) {
-  for_all_texts("019,.-kMe ", 7, expect_long_of_model);
+  kit::for_all_texts("019,.-kMe ", 7, expect_long_of_model);
 }
 
 TEST(zxstr2_number, parse_long_of_random_digits_wraps_as_the_slow_model) {
@@ -593,13 +594,13 @@ TEST(zxstr2_number, parse_double_looks_at_all_digits_that_decide) {
 }
 
 TEST(zxstr2_number, parse_double_of_short_texts_agrees_with_the_slow_model) {
-  for_all_texts("019,.-kMe ", 6, expect_double_of_model);
-  for_all_texts("5,.+eEg\t", 5, expect_double_of_model);
+  kit::for_all_texts("019,.-kMe ", 6, expect_double_of_model);
+  kit::for_all_texts("5,.+eEg\t", 5, expect_double_of_model);
 }
 
 TEST(zxstr2_number_slow,
      parse_double_of_longer_texts_agrees_with_the_slow_model) {
-  for_all_texts("019,.-kMe ", 7, expect_double_of_model);
+  kit::for_all_texts("019,.-kMe ", 7, expect_double_of_model);
 }
 
 // A random double of any size.
