@@ -371,6 +371,8 @@ zxStr convert_lines(const zxStr& text, AppendLine append_line) {
   constexpr std::string_view k_line_end = "\r\n";
   zxStr result;
   std::string_view rest = text.view();
+  if (rest.find(k_line_end) != std::string_view::npos)
+    result.reserve(text.length());
   for (std::size_t end = rest.find(k_line_end); end != std::string_view::npos;
        end = rest.find(k_line_end)) {
     append_line(result, rest.substr(0, end));

@@ -8,6 +8,7 @@
 #include <string_view>
 
 #include "zxplat.h"
+#include "zxregexe.h"
 #include "zxsfmt_impl.h"
 
 zxTakeFromList zx_fmt_take_from_list = [](void*, zxFmtArg&, bool&) {
@@ -44,7 +45,9 @@ class Composer {
         at(format),
         env(environment),
         left(arg_count),
-        args(arg_list) {}
+        args(arg_list),
+        lost_match(out.stood_on(zx_match.start[0]) ? zx_match.start[0]
+                                                   : nullptr) {}
 
   bool run();
 
@@ -74,7 +77,8 @@ class Composer {
   zxFmtEnv& env;
   std::int32_t left;
   const zxFmtArg* args;
-  zxFmtArg element = 0;  // of a list
+  zxFmtArg element = 0;          // of a list
+  const char* const lost_match;  // found in the text that the result was
 };
 
 bool Composer::run() {
@@ -151,7 +155,7 @@ void Composer::set_table(const zxFmtArg& arg) {
 
 bool Composer::dollar() {
   if (left > 0 && args->tag == zxFmtArg::k_table) set_table(*take());
-  return append_escape(out, at, env);
+  return append_escape(out, at, env, lost_match);
 }
 
 // ---- directives

@@ -38,7 +38,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <ctime>
-#include <limits>
+#include <type_traits>
 
 #include "zxaa.h"
 #include "zxbfile.h"
@@ -48,6 +48,27 @@
 #include "zxtime.h"
 
 // ------------------------------------------------------------- arguments --
+
+namespace zxsfmt_detail {
+
+// Types whose values are whole numbers of another type when they are
+// reckoned with: small ones, and enumerations.  Characters are none.
+template <class T, class Wide>
+concept PromotesTo = (std::is_integral_v<T> || std::is_enum_v<T>)&&!(
+    std::same_as<T, char> || std::same_as<T, unsigned char> ||
+    std::same_as<T, wchar_t> || std::same_as<T, char8_t> ||
+    std::same_as<T, char16_t> || std::same_as<T, char32_t>)&&requires(T value) {
+  { +value } -> std::same_as<Wide>;
+};
+
+template <class T>
+constexpr std::uint32_t pointer_tag() {
+  if constexpr (std::same_as<T, char>) return 'z';
+  if constexpr (std::same_as<T, std::time_t>) return 'm';
+  return 'p';
+}
+
+}  // namespace zxsfmt_detail
 
 // One argument: a tag that names the type, and the value or a pointer to it.
 // Records live for one call and own nothing; what they point at must outlive
@@ -73,7 +94,8 @@
 //
 // "#" with what it cannot show, a table among it, fails an assertion and adds
 // nothing.  A long or unsigned long beyond 32 bits fails an assertion.  Types
-// that are not here do not compile.
+// that are not here do not compile; a pointer to a long is one to a time_t
+// where these are the same type.
 struct zxFmtArg {
   // Tags without a type of their own.
   static constexpr std::uint32_t k_void = 0;    // of a list: no form at all
@@ -94,20 +116,24 @@ struct zxFmtArg {
     return static_cast<std::uint32_t>(number);
   }
 
-  constexpr zxFmtArg(int value) : tag('i'), number(value) {}
-  constexpr zxFmtArg(unsigned value)
+  constexpr zxFmtArg(zxsfmt_detail::PromotesTo<int> auto value)
+      : tag('i'), number(value) {}
+  constexpr zxFmtArg(zxsfmt_detail::PromotesTo<unsigned> auto value)
       : tag('u'), number(static_cast<std::int32_t>(value)) {}
-  zxFmtArg(long value) : tag('l'), number(narrowed<std::int32_t>(value)) {}
-  zxFmtArg(unsigned long value)
+  constexpr zxFmtArg(std::same_as<long> auto value)
+      : tag('l'), number(narrowed<std::int32_t>(value)) {}
+  constexpr zxFmtArg(std::same_as<unsigned long> auto value)
       : tag('v'),
         number(static_cast<std::int32_t>(narrowed<std::uint32_t>(value))) {}
-  constexpr zxFmtArg(char byte)
+  constexpr zxFmtArg(std::same_as<char> auto byte)
       : tag('c'), number(static_cast<signed char>(byte)) {}
-  constexpr zxFmtArg(unsigned char byte) : tag('b'), number(byte) {}
-  constexpr zxFmtArg(double value) : tag('f'), real(value) {}
-  constexpr zxFmtArg(const char* text) : tag('z'), pointer(text) {}
-  constexpr zxFmtArg(const std::time_t* moment) : tag('m'), pointer(moment) {}
-  constexpr zxFmtArg(const void* address) : tag('p'), pointer(address) {}
+  constexpr zxFmtArg(std::same_as<unsigned char> auto byte)
+      : tag('b'), number(byte) {}
+  constexpr zxFmtArg(std::same_as<double> auto value) : tag('f'), real(value) {}
+  constexpr zxFmtArg(std::same_as<float> auto value) : tag('f'), real(value) {}
+  template <class T>
+  requires(!std::is_function_v<T>) constexpr zxFmtArg(T* what)
+      : tag(zxsfmt_detail::pointer_tag<std::remove_cv_t<T>>()), pointer(what) {}
 
   // Exactly these types: what only converts to one would be a temporary,
   // gone by the time that the record is read.
@@ -124,18 +150,9 @@ struct zxFmtArg {
   constexpr zxFmtArg(std::uint32_t any_tag, const void* what)
       : tag(any_tag), pointer(what) {}
 
-  zxFmtArg(long long) = delete;
-  zxFmtArg(unsigned long long) = delete;
-  zxFmtArg(long double) = delete;
-  zxFmtArg(wchar_t) = delete;
-  zxFmtArg(char8_t) = delete;
-  zxFmtArg(char16_t) = delete;
-  zxFmtArg(char32_t) = delete;
-  zxFmtArg(std::nullptr_t) = delete;
-
  private:
   template <class Narrow>
-  static Narrow narrowed(auto value) {
+  static constexpr Narrow narrowed(auto value) {
     const auto narrow = static_cast<Narrow>(value);
     ZX_ASSERT(narrow == value);
     return narrow;

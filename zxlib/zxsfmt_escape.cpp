@@ -19,8 +19,9 @@ std::int32_t digits_at(const char*& at) {
 }
 
 // A match that was found in the result's own bytes cannot be shown.
-void append_group(Output& out, std::int32_t slot) {
-  if (ZX_ASSERT(!out.stood_on(zx_match.start[slot]))) out.add(group_text(slot));
+void append_group(Output& out, std::int32_t slot, const char* lost_match) {
+  const bool is_lost = lost_match != nullptr && zx_match.start[0] == lost_match;
+  if (ZX_ASSERT(!is_lost)) out.add(group_text(slot));
 }
 
 void append_now(Output& out, std::int32_t form) {
@@ -114,16 +115,17 @@ void append_reference(Output& out, const char*& at, char closing,
 
 }  // namespace
 
-bool append_escape(Output& out, const char*& at, zxFmtEnv& env) {
+bool append_escape(Output& out, const char*& at, zxFmtEnv& env,
+                   const char* lost_match) {
   const char letter = *at;
   if (letter == '\0') return false;
   ++at;
   switch (letter) {
     case '`':
-      append_group(out, zxMatch::k_before);
+      append_group(out, zxMatch::k_before, lost_match);
       return true;
     case '\'':
-      append_group(out, zxMatch::k_after);
+      append_group(out, zxMatch::k_after, lost_match);
       return true;
     case 'T':
       append_now(out, 3);
@@ -152,7 +154,7 @@ bool append_escape(Output& out, const char*& at, zxFmtEnv& env) {
       return true;
     default:
       if (!zx_is_digit(letter)) return false;
-      append_group(out, letter - '0');
+      append_group(out, letter - '0', lost_match);
       return true;
   }
 }

@@ -172,8 +172,10 @@ bool append_picture(Output& out, const Directive& directive,
 void append_default_form(Output& out, const zxFmtArg& arg);
 
 // Carries out the escape that stands behind a "$" and steps over it; false if
-// there is none.
-bool append_escape(Output& out, const char*& at, zxFmtEnv& env);
+// there is none.  Groups of the match that begins at `lost_match`, if that is
+// not null, are gone.
+bool append_escape(Output& out, const char*& at, zxFmtEnv& env,
+                   const char* lost_match);
 
 // ----------------------------------------------------------------- pieces --
 

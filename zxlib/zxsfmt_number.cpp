@@ -10,7 +10,6 @@
 #include <charconv>
 #include <cmath>
 #include <cstring>
-#include <utility>
 
 #include "zxsfmt_impl.h"
 

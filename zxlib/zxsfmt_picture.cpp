@@ -360,7 +360,6 @@ bool append_picture(Output& out, const Directive& directive,
 }  // namespace zxsfmt_detail
 
 void set_precision_table(const zxPrecisionTable& fresh, zxPrecisionTable* old) {
-  const zxPrecisionTable former = zxsfmt_detail::g_precisions;
+  if (old != nullptr) *old = zxsfmt_detail::g_precisions;
   zxsfmt_detail::g_precisions = fresh;
-  if (old != nullptr) *old = former;
 }
