@@ -373,11 +373,10 @@ class Model {
     const unsigned base = letter == 'o'                    ? 8
                           : letter == 'x' || letter == 'X' ? 16
                                                            : 10;
+    const std::string all =
+        letter == 'X' ? "0123456789ABCDEF" : "0123456789abcdef";
     std::string digits;
-    for (; number > 0; number /= base)
-      digits.insert(0, 1,
-                    (letter == 'X' ? "0123456789ABCDEF"
-                                   : "0123456789abcdef")[number % base]);
+    for (; number > 0; number /= base) digits.insert(0, 1, all[number % base]);
     return digits;
   }
 
