@@ -369,7 +369,7 @@ class Model {
     return text;
   }
 
-  static std::string digits_of(std::uint64_t number, char letter) {
+  static std::string digits_of(std::uint32_t number, char letter) {
     const unsigned base = letter == 'o'                    ? 8
                           : letter == 'x' || letter == 'X' ? 16
                                                            : 10;
@@ -390,10 +390,8 @@ class Model {
     need(value, "lviuBcb");
     const auto number = static_cast<std::int32_t>(value.number);
     const bool is_signed = spec.letter == 'd' || spec.letter == 'i';
-    const std::uint64_t size =
-        is_signed && number < 0
-            ? static_cast<std::uint64_t>(-std::int64_t{number})
-            : static_cast<std::uint32_t>(number);
+    const auto bits = static_cast<std::uint32_t>(number);
+    const std::uint32_t size = is_signed && number < 0 ? 0 - bits : bits;
     std::string ahead = is_signed ? sign_of(spec, number) : "";
     if (spec.has('#') && number != 0 && (spec.letter | 32) == 'x')
       ahead = std::string("0") + spec.letter;
