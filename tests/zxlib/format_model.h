@@ -2,7 +2,7 @@
 // the tests compare the library's with.
 //
 // It reads a format byte by byte, keeps everything in std::string and leaves
-// the digits of numbers to the C library.  It has no number pictures, but for
+// the digits of doubles to the C library.  It has no number pictures, but for
 // a few texts that it is given, and knows nothing of how ours works.
 //
 //   Model model(format, arguments, world);
@@ -369,18 +369,41 @@ class Model {
     return text;
   }
 
+  static std::string digits_of(std::uint32_t number, char letter) {
+    const unsigned base = letter == 'o'                    ? 8
+                          : letter == 'x' || letter == 'X' ? 16
+                                                           : 10;
+    const std::string all =
+        letter == 'X' ? "0123456789ABCDEF" : "0123456789abcdef";
+    std::string digits;
+    for (; number > 0; number /= base) digits.insert(0, 1, all[number % base]);
+    return digits;
+  }
+
+  static std::string sign_of(const Spec& spec, std::int64_t number) {
+    if (number < 0) return "-";
+    return spec.has('+') ? "+" : spec.has(' ') ? " " : "";
+  }
+
+  // As C has it, which not every run time keeps to.
   static std::string whole_number(const Spec& spec, const Value& value) {
     need(value, "lviuBcb");
-    const bool is_signed = spec.letter == 'd' || spec.letter == 'i';
-    std::string flags;
-    for (const char flag : spec.flags)
-      if (is_signed || (flag != '+' && flag != ' ')) flags += flag;
-    const std::string form =
-        "%" + flags + spec.width + spec.point_and_precision() + spec.letter;
     const auto number = static_cast<std::int32_t>(value.number);
-    return short_enough(
-        is_signed ? printed(form, number)
-                  : printed(form, static_cast<std::uint32_t>(number)));
+    const bool is_signed = spec.letter == 'd' || spec.letter == 'i';
+    const auto bits = static_cast<std::uint32_t>(number);
+    const std::uint32_t size = is_signed && number < 0 ? 0 - bits : bits;
+    std::string ahead = is_signed ? sign_of(spec, number) : "";
+    if (spec.has('#') && number != 0 && (spec.letter | 32) == 'x')
+      ahead = std::string("0") + spec.letter;
+    std::string digits = digits_of(size, spec.letter);
+    const std::size_t least = spec.has_point ? spec.precision_digits() : 1;
+    while (digits.size() < least) digits.insert(0, "0");
+    if (spec.has('#') && spec.letter == 'o' && !digits.starts_with('0'))
+      digits.insert(0, "0");
+    if (spec.width.starts_with('0') && !spec.is_left() && !spec.has_point)
+      while (ahead.size() + digits.size() < spec.width_digits())
+        digits.insert(0, "0");
+    return short_enough(filled(spec, ahead + digits));
   }
 
   // Blanks up to the width; on the left unless the text stands there.

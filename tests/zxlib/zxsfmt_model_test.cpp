@@ -238,7 +238,9 @@ class Random {
  public:
   explicit Random(unsigned seed) : bits(seed) {}
 
-  std::size_t below(std::size_t n) { return bits() % n; }
+  std::size_t below(std::size_t n) {
+    return static_cast<std::size_t>(bits() % n);
+  }
   bool chance(std::size_t percent) { return below(100) < percent; }
   char one_of(std::string_view bytes) { return bytes[below(bytes.size())]; }
   template <std::size_t N>
