@@ -132,7 +132,8 @@ struct zxFmtArg {
   constexpr zxFmtArg(std::same_as<double> auto value) : tag('f'), real(value) {}
   constexpr zxFmtArg(std::same_as<float> auto value) : tag('f'), real(value) {}
   template <class T>
-  requires(!std::is_function_v<T>) constexpr zxFmtArg(T* what)
+  requires(!std::is_function_v<T> &&
+           !std::is_volatile_v<T>) constexpr zxFmtArg(T* what)
       : tag(zxsfmt_detail::pointer_tag<std::remove_cv_t<T>>()), pointer(what) {}
 
   // Exactly these types: what only converts to one would be a temporary,

@@ -400,3 +400,11 @@ std::int32_t split_regex(zxQVA<zxStr>& out, const zxStr& text,
   zx_match = zxMatch{};  // it would lead into a text that may be gone
   return out.length();
 }
+
+std::int32_t split_regex(zxQVA<zxStr>& out, const zxStr& text,
+                         const zxStr& pattern, std::int32_t max,
+                         bool keep_empty) {
+  const zxStr held = pattern;
+  forget(held.c_str());
+  return split_regex(out, text, held.c_str(), held.length(), max, keep_empty);
+}

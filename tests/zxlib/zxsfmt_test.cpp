@@ -18,6 +18,7 @@
 #include <string_view>
 #include <type_traits>
 #include <utility>
+#include <vector>
 
 #include "format_run.h"
 #include "kit/cases.h"
@@ -46,6 +47,10 @@ struct Other {};
 struct ToString {
   operator zxStr() const { return zxStr(); }
 };
+struct ToInt {
+  operator int() const { return 1; }
+};
+enum Small : unsigned char { k_small = 7 };
 struct ToDate {
   operator zxDate() const { return zxDate(); }
 };
@@ -93,6 +98,8 @@ static_assert(!is_argument<std::nullptr_t>);
 static_assert(!is_argument<Scoped>);
 static_assert(!is_argument<Other>);
 static_assert(!is_argument<ToString>);
+static_assert(!is_argument<ToInt>);
+static_assert(!is_argument<std::vector<bool>::reference>);
 static_assert(!is_argument<ToDate>);
 static_assert(!is_argument<std::string>);
 static_assert(!is_argument<std::string_view>);
@@ -113,6 +120,7 @@ static_assert(zxFmtArg(true).tag == 'i');
 static_assert(zxFmtArg(static_cast<short>(-1)).tag == 'i');
 static_assert(zxFmtArg(static_cast<signed char>(-1)).number == -1);
 static_assert(zxFmtArg(k_plain).number == 3);
+static_assert(zxFmtArg(k_small).tag == 'i' && zxFmtArg(k_small).number == 7);
 static_assert(zxFmtArg(1.5F).real == 1.5);
 static_assert(zxFmtArg('\xFF').number == -1);
 static_assert(zxFmtArg(static_cast<unsigned char>(255)).word() == 255);

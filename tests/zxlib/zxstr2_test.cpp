@@ -804,6 +804,19 @@ void expect_split_of_model(const std::string& text,
   }
 }
 
+TEST(zxstr2, a_pattern_string_is_read_at_each_split) {
+  zxQVA<zxStr> out;
+  zxStr pattern = ",";
+  EXPECT_EQ(split_regex(out, "a,b;c", pattern, 9, false), 2);
+  EXPECT_EQ(text_of(out.get(1)), "b;c");
+  pattern.at(0) = ';';
+  EXPECT_EQ(split_regex(out, "a,b;c", pattern, 9, false), 2);
+  EXPECT_EQ(text_of(out.get(0)), "a,b");
+  // The pattern is the "c" that this call puts away.
+  EXPECT_EQ(split_regex(out, "acb", out.get(1), 9, false), 2);
+  EXPECT_EQ(text_of(out.get(1)), "b");
+}
+
 TEST(zxstr2, splitting_all_short_texts_agrees_with_the_slow_model) {
   for (const std::string pattern :
        {",", "a", "", "a*", "b?", "(,)", "(a*),", "(a)|(,)", ",(b)?", "`b",
