@@ -24,6 +24,11 @@ constexpr std::uint8_t k_ltr_strong = 0x04;  // Latin letters, byte 253
 constexpr std::uint8_t k_rtl_strong = 0x08;  // Hebrew letters, byte 254
 constexpr std::uint8_t k_digit = 0x10;
 constexpr std::uint8_t k_separator = 0x20;  // holds digits together
+// What is not simply written when a run is reversed: from its end on what may
+// end a number and the mark that is dropped, from its start on what may start
+// a number.
+constexpr std::uint8_t k_care_at_end = 0x40;
+constexpr std::uint8_t k_care_at_start = 0x80;
 constexpr std::uint8_t k_strong = k_ltr_strong | k_rtl_strong;
 
 // Which bytes are Hebrew letters: those of code page 1255, or those of 862
@@ -34,12 +39,14 @@ constexpr std::uint8_t kind_of(char byte, Letters letters) {
   const unsigned hebrew_classes = letters == Letters::ansi
                                       ? k_class_hebrew
                                       : k_class_hebrew | k_class_hebdos;
-  constexpr std::string_view k_separators = ",/:+-.$";
+  constexpr std::string_view k_separators = ",/:+-.";
   if (byte == k_ltr_mark) return k_ltr_strong;
-  if (byte == k_rtl_mark) return k_rtl_strong;
+  if (byte == k_rtl_mark) return k_rtl_strong | k_care_at_end;
   if (zx_is(byte, k_class_latin)) return k_ltr_strong | k_latin_letter;
   if (zx_is(byte, hebrew_classes)) return k_rtl_strong | k_hebrew_letter;
-  if (zx_is_digit(byte)) return k_digit;
+  if (zx_is_digit(byte)) return k_digit | k_care_at_end | k_care_at_start;
+  if (byte == '%') return k_care_at_end;
+  if (byte == '$') return k_separator | k_care_at_start;
   return k_separators.find(byte) != std::string_view::npos ? k_separator : 0;
 }
 
@@ -206,6 +213,10 @@ char* reverse_run(char* out, std::string_view run, bool mark,
                   const ByteMap& bytes) {
   char* const start = out;
   for (std::size_t i = run.size(); i-- > 0;) {
+    if (!is<Letters::ansi>(run[i], k_care_at_end)) {
+      *out++ = bytes[run[i]];
+      continue;
+    }
     if (run[i] == k_rtl_mark) continue;
     if (!ends_number(run, i)) {
       *out++ = bytes[run[i]];
@@ -371,10 +382,9 @@ zxStr convert_lines(const zxStr& text, AppendLine append_line) {
   constexpr std::string_view k_line_end = "\r\n";
   zxStr result;
   std::string_view rest = text.view();
-  if (rest.find(k_line_end) != std::string_view::npos)
-    result.reserve(text.length());
-  for (std::size_t end = rest.find(k_line_end); end != std::string_view::npos;
-       end = rest.find(k_line_end)) {
+  std::size_t end = rest.find(k_line_end);
+  if (end != std::string_view::npos) result.reserve(text.length());
+  for (; end != std::string_view::npos; end = rest.find(k_line_end)) {
     append_line(result, rest.substr(0, end));
     result.append("\r\n", 2);
     rest.remove_prefix(end + k_line_end.size());
@@ -551,7 +561,8 @@ std::size_t number_end(std::string_view run, std::size_t i) {
 char* zxLogicalExport::reverse_in_front(char* start,
                                         std::string_view run) const {
   for (std::size_t i = 0; i < run.size();) {
-    const std::size_t end = number_end(run, i);
+    const bool is_plain = !is<Letters::ansi>(run[i], k_care_at_start);
+    const std::size_t end = is_plain ? i : number_end(run, i);
     if (end == i) {
       start = put_in_front(start, k_mirror[run[i++]]);
     } else {

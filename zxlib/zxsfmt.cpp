@@ -238,13 +238,6 @@ bool Composer::dispatch(const Directive& directive) {
   return true;
 }
 
-// ---- the entries
-
-zxFmtEnv& environment(Entry entry) {
-  static zxFmtEnv environments[static_cast<std::size_t>(Entry::fprint) + 1];
-  return environments[static_cast<std::size_t>(entry)];
-}
-
 }  // namespace
 
 // ---- default forms
@@ -324,10 +317,7 @@ void Output::add_times(char byte, std::int64_t n) {
   take_to(to + n);
 }
 
-bool compose(Entry entry, zxStr& out, const char* format, std::int32_t count,
-             const zxFmtArg* args) {
-  return sfmt_core(out, format, environment(entry), count, args);
-}
+// ---- the entries
 
 void fail_with_position() { bail_code(2006, pos_string(zx_pos)); }
 

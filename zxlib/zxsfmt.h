@@ -256,9 +256,14 @@ enum class Entry : std::uint8_t {
   fprint,
 };
 
+// The environment of an entry, made when the first of its formats comes.
+template <Entry>
+zxFmtEnv& environment() {
+  static zxFmtEnv env;
+  return env;
+}
+
 // What the entries do behind composing; `good` tells how that went.
-bool compose(Entry entry, zxStr& out, const char* format, std::int32_t count,
-             const zxFmtArg* args);
 void fail_with_position();
 inline void check_with_position(bool good) {
   if (!good) [[unlikely]]
@@ -268,13 +273,15 @@ void bail_with(bool good, std::int32_t number, const zxStr& text);
 void print(bool good, zxBFile& file, const zxStr& text);
 void print_in_debugger(bool good, const zxStr& text);
 
-// The arguments as records.
-template <std::size_t most, class... Args>
-bool compose(Entry entry, zxStr& out, const char* format, const Args&... args) {
-  static_assert(sizeof...(Args) <= most, "too many arguments for a format");
+// Composes with the arguments as records.
+template <Entry entry, class... Args>
+bool compose(zxStr& out, const char* format, const Args&... args) {
+  constexpr std::size_t k_most =
+      entry == Entry::bailf ? k_max_args + 1 : k_max_args;
+  static_assert(sizeof...(Args) <= k_most, "too many arguments for a format");
   const std::array<zxFmtArg, sizeof...(Args)> list{zxFmtArg(args)...};
-  return compose(entry, out, format, static_cast<std::int32_t>(list.size()),
-                 list.data());
+  return sfmt_core(out, format, environment<entry>(),
+                   static_cast<std::int32_t>(list.size()), list.data());
 }
 
 }  // namespace zxsfmt_detail
@@ -285,7 +292,7 @@ template <class... Args>
 zxStr sfmt(const char* format, const Args&... args) {
   using namespace zxsfmt_detail;
   zxStr text;
-  check_with_position(compose<k_max_args>(Entry::sfmt, text, format, args...));
+  check_with_position(compose<Entry::sfmt>(text, format, args...));
   return text;
 }
 
@@ -293,8 +300,7 @@ zxStr sfmt(const char* format, const Args&... args) {
 template <class... Args>
 zxStr& sfmt_to(zxStr& out, const char* format, const Args&... args) {
   using namespace zxsfmt_detail;
-  check_with_position(
-      compose<k_max_args>(Entry::sfmt_to, out, format, args...));
+  check_with_position(compose<Entry::sfmt_to>(out, format, args...));
   return out;
 }
 
@@ -303,7 +309,7 @@ zxStr& sfmt_to(zxStr& out, const char* format, const Args&... args) {
 template <class... Args>
 bool sfmt_try(zxStr& out, const char* format, const Args&... args) {
   using namespace zxsfmt_detail;
-  return compose<k_max_args>(Entry::sfmt_try, out, format, args...);
+  return compose<Entry::sfmt_try>(out, format, args...);
 }
 
 // The same for a format in a string, up to its first NUL.
@@ -311,7 +317,7 @@ template <class... Args>
 bool sfmt_try_s(zxStr& out, const zxStr& format, const Args&... args) {
   using namespace zxsfmt_detail;
   const zxStr held = format;  // it may be `out`
-  return compose<k_max_args>(Entry::sfmt_try_s, out, held.c_str(), args...);
+  return compose<Entry::sfmt_try_s>(out, held.c_str(), args...);
 }
 
 // Ends the process with the text as a message without a number.  From here
@@ -321,8 +327,7 @@ template <class... Args>
 void bailf(const char* format, const Args&... args) {
   using namespace zxsfmt_detail;
   zxStr text;
-  const bool good =
-      compose<k_max_args + 1>(Entry::bailf, text, format, args...);
+  const bool good = compose<Entry::bailf>(text, format, args...);
   bail_with(good, 0, text);
 }
 
@@ -332,7 +337,7 @@ template <class... Args>
 void bailfn(std::int32_t number, const char* format, const Args&... args) {
   using namespace zxsfmt_detail;
   zxStr text;
-  const bool good = compose<k_max_args>(Entry::bailfn, text, format, args...);
+  const bool good = compose<Entry::bailfn>(text, format, args...);
   bail_with(good, number, text);
 }
 
@@ -341,7 +346,7 @@ template <class... Args>
 void fprint(zxBFile& file, const char* format, const Args&... args) {
   using namespace zxsfmt_detail;
   zxStr text;
-  const bool good = compose<k_max_args>(Entry::fprint, text, format, args...);
+  const bool good = compose<Entry::fprint>(text, format, args...);
   print(good, file, text);
 }
 
@@ -350,21 +355,21 @@ template <class... Args>
 void oprint(const char* format, const Args&... args) {
   using namespace zxsfmt_detail;
   zxStr text;
-  const bool good = compose<k_max_args>(Entry::oprint, text, format, args...);
+  const bool good = compose<Entry::oprint>(text, format, args...);
   print(good, g_stdout, text);
 }
 template <class... Args>
 void eprint(const char* format, const Args&... args) {
   using namespace zxsfmt_detail;
   zxStr text;
-  const bool good = compose<k_max_args>(Entry::eprint, text, format, args...);
+  const bool good = compose<Entry::eprint>(text, format, args...);
   print(good, g_stderr, text);
 }
 template <class... Args>
 void dprint(const char* format, const Args&... args) {
   using namespace zxsfmt_detail;
   zxStr text;
-  const bool good = compose<k_max_args>(Entry::dprint, text, format, args...);
+  const bool good = compose<Entry::dprint>(text, format, args...);
   print_in_debugger(good, text);
 }
 
