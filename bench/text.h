@@ -83,6 +83,9 @@ struct Side {
 std::vector<Side>& sides();
 
 inline std::string shown(const std::string& result) { return result; }
+inline std::string shown(std::string_view result) {
+  return std::string(result);
+}
 inline std::string shown(const zxStr& result) {
   return std::string(result.view());
 }

@@ -41,6 +41,13 @@ zxStr our_double(std::size_t i) {
   return sfmt("#", doubles()[i]);
 }
 
+// Into a string that is kept.
+std::string_view our_double_kept(std::size_t i) {
+  static zxStr kept;
+  ZX_HERE;
+  return sfmt_to(kept, "#", doubles()[i]).view();
+}
+
 zxStr our_fixed(std::size_t i) {
   ZX_HERE;
   return sfmt("%.2f", doubles()[i]);
@@ -108,6 +115,15 @@ std::string converted(double value, How... how) {
   return std::string(room, end);
 }
 
+// Into a room that is kept.
+std::string_view to_chars_double_kept(std::size_t i) {
+  static char room[64];
+  const char* const end = std::to_chars(room, room + sizeof room, doubles()[i],
+                                        std::chars_format::general, 15)
+                              .ptr;
+  return {room, static_cast<std::size_t>(end - room)};
+}
+
 std::string to_chars_double(std::size_t i) {
   return converted(doubles()[i], std::chars_format::general, 15);
 }
@@ -132,6 +148,8 @@ void add_formats() {
   add<to_chars_double>("double", "to_chars");
   add<c_double>("double", "snprintf");
   add<stream_double>("double", "stream");
+  add<our_double_kept>("double_kept", "ours");
+  add<to_chars_double_kept>("double_kept", "to_chars");
   add<our_fixed>("fixed", "ours");
   add<c_fixed>("fixed", "snprintf", same_but_for_a_tie);
   add<to_chars_fixed>("fixed", "to_chars", same_but_for_a_tie);

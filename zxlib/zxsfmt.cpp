@@ -35,6 +35,59 @@ const char* skip_plain(const char* at) {
   return at;
 }
 
+// ---- default forms
+
+// As in "\xc8".
+void append_byte(Output& out, std::uint8_t byte) {
+  constexpr std::string_view k_digits = "0123456789abcdef";
+  out.add("\\x");
+  if (byte >= 16) out.add(k_digits[byte >> 4]);
+  out.add(k_digits[byte & 0xF]);
+}
+
+// The default form of an argument.
+void append_default_form(Output& out, const zxFmtArg& arg) {
+  switch (arg.tag) {
+    case 'i':
+    case 'l':
+      return append_whole(out, arg.number);
+    case 'u':
+    case 'v':
+      return append_whole(out, arg.word());
+    case 'c':
+      out.add(static_cast<char>(arg.number));
+      return;
+    case 'b':
+      return append_byte(out, static_cast<std::uint8_t>(arg.word()));
+    case zxFmtArg::k_bool:
+      return out.add(arg.word() != 0 ? "true" : "false");
+    case 'f':
+      return append_number(out, arg.real);
+    case 'z':
+      return out.add(static_cast<const char*>(arg.pointer));
+    case 's':
+    case zxFmtArg::k_text:
+      out.add(pointee<zxStr>(arg));
+      return;
+    case 't':
+      out.add(pointee<zxDate>(arg).to_text());
+      return;
+    case 'M':
+      out.add(pointee<zxTime>(arg).to_text());
+      return;
+    case 'm':
+      out.add(format_time_t(moment_of(arg), 0));
+      return;
+    case 'k':
+      out.add(joined(pointee<zxQVA<zxStr>>(arg), " "));
+      return;
+    case 'p':
+      return append_address(out, arg.pointer);
+    default:
+      ZX_ASSERT(false);
+  }
+}
+
 // ---- one pass over a format
 
 class Composer {
@@ -61,6 +114,8 @@ class Composer {
   }
 
   const zxFmtArg* take();
+  const zxFmtArg* take_from_list();
+  const zxFmtArg* checked(const zxFmtArg* arg);
   Outcome step();
   bool placeholder();
   Outcome percent();
@@ -85,7 +140,7 @@ bool Composer::run() {
   for (;;) {
     const char* const plain = at;
     at = skip_plain(at);
-    out.add(std::string_view(plain, zx_distance(plain, at)));
+    if (at != plain) out.add(std::string_view(plain, zx_distance(plain, at)));
     if (*at == '\0') return left == 0;
     if (*at == '\n') {
       out.add("\r\n");
@@ -102,20 +157,25 @@ bool Composer::run() {
 
 // The next argument, which lasts until the one behind it is taken; null if
 // there is none.  A text that must not be read fails and counts as empty.
-const zxFmtArg* Composer::take() {
+inline const zxFmtArg* Composer::take() {
   if (left == 0) return nullptr;
-  const zxFmtArg* arg = args;
-  if (arg->tag == zxFmtArg::k_list) {
-    bool is_last = false;
-    if (!zx_fmt_take_from_list(const_cast<void*>(arg->pointer), element,
-                               is_last))
-      return nullptr;
-    if (is_last) left = 0;
-    arg = &element;
-  } else {
-    --left;
-    ++args;
-  }
+  if (args->tag == zxFmtArg::k_list) [[unlikely]]
+    return take_from_list();
+  --left;
+  return checked(args++);
+}
+
+// A list stays the next argument until its last element is taken.
+const zxFmtArg* Composer::take_from_list() {
+  bool is_last = false;
+  if (!zx_fmt_take_from_list(const_cast<void*>(args->pointer), element,
+                             is_last))
+    return nullptr;
+  if (is_last) left = 0;
+  return checked(&element);
+}
+
+inline const zxFmtArg* Composer::checked(const zxFmtArg* arg) {
   if (arg->tag != 'z' ||
       ZX_ASSERT(arg->pointer != nullptr && !out.stood_on(arg->pointer)))
     return arg;
@@ -240,65 +300,7 @@ bool Composer::dispatch(const Directive& directive) {
 
 }  // namespace
 
-// ---- default forms
-
-// As in "\xc8".
-static void append_byte(Output& out, std::uint8_t byte) {
-  constexpr std::string_view k_digits = "0123456789abcdef";
-  out.add("\\x");
-  if (byte >= 16) out.add(k_digits[byte >> 4]);
-  out.add(k_digits[byte & 0xF]);
-}
-
-void append_default_form(Output& out, const zxFmtArg& arg) {
-  switch (arg.tag) {
-    case 'i':
-    case 'l':
-      return append_whole(out, arg.number);
-    case 'u':
-    case 'v':
-      return append_whole(out, arg.word());
-    case 'c':
-      out.add(static_cast<char>(arg.number));
-      return;
-    case 'b':
-      return append_byte(out, static_cast<std::uint8_t>(arg.word()));
-    case zxFmtArg::k_bool:
-      return out.add(arg.word() != 0 ? "true" : "false");
-    case 'f':
-      return append_number(out, arg.real);
-    case 'z':
-      return out.add(static_cast<const char*>(arg.pointer));
-    case 's':
-    case zxFmtArg::k_text:
-      out.add(pointee<zxStr>(arg));
-      return;
-    case 't':
-      out.add(pointee<zxDate>(arg).to_text());
-      return;
-    case 'M':
-      out.add(pointee<zxTime>(arg).to_text());
-      return;
-    case 'm':
-      out.add(format_time_t(moment_of(arg), 0));
-      return;
-    case 'k':
-      out.add(joined(pointee<zxQVA<zxStr>>(arg), " "));
-      return;
-    case 'p':
-      return append_address(out, arg.pointer);
-    default:
-      ZX_ASSERT(false);
-  }
-}
-
 // ---- the result
-
-void Output::reload() {
-  end = string.tail(0);
-  limit =
-      end == nullptr ? nullptr : end + (string.capacity() - string.length());
-}
 
 char* Output::grow(std::int64_t n) {
   if (!ZX_ASSERT(n <= INT32_MAX)) return nullptr;

@@ -109,7 +109,10 @@ class Output {
     string = text;
     reload();
   }
-  void reload();
+  void reload() {
+    end = string.tail(0);
+    limit = end == nullptr ? end : end + (string.capacity() - string.length());
+  }
 
  private:
   char* grow(std::int64_t n);
@@ -167,9 +170,6 @@ bool append_directive(Output& out, const Directive& directive,
 // a number.
 bool append_picture(Output& out, const Directive& directive,
                     const zxFmtArg& arg);
-
-// The default form of an argument.
-void append_default_form(Output& out, const zxFmtArg& arg);
 
 // Carries out the escape that stands behind a "$" and steps over it; false if
 // there is none.  Groups of the match that begins at `lost_match`, if that is

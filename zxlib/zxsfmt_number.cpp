@@ -130,13 +130,16 @@ constexpr std::uint32_t k_beyond_eight = 100'000'000;
 
 // The two halves of each part of a word, by a multiplication instead of a
 // division: parts of 4 digits become parts of 2, these become single ones.
-std::uint64_t eight_digits(std::uint32_t number) {
-  const std::uint64_t by_4 =
-      number / 10'000 | static_cast<std::uint64_t>(number % 10'000) << 32;
+constexpr std::uint64_t digits_by_4(std::uint64_t by_4) {
   const std::uint64_t upper_2 = by_4 * 10'486 >> 20 & 0x0000007F0000007F;
   const std::uint64_t by_2 = upper_2 | (by_4 - 100 * upper_2) << 16;
   const std::uint64_t upper_1 = by_2 * 103 >> 10 & 0x000F000F000F000F;
   return upper_1 | (by_2 - 10 * upper_1) << 8;
+}
+
+inline std::uint64_t eight_digits(std::uint32_t number) {
+  return digits_by_4(number / 10'000 |
+                     static_cast<std::uint64_t>(number % 10'000) << 32);
 }
 
 // All eight, zeros in front included.
@@ -345,19 +348,21 @@ char* strip_zeros(char* end) {
 }
 
 // Numbers with up to four decimals and 15 digits in all, as tables hold them;
-// null for others.
+// null for others and for what is no number.
 char* write_short(char* out, double number) {
   constexpr double k_beyond = 1e11;
   constexpr double k_unit = 1e4;
-  if (number >= k_beyond) return nullptr;
+  if (!(number < k_beyond)) return nullptr;
   const auto whole = static_cast<std::uint64_t>(number * k_unit + 0.5);
   if (static_cast<double>(whole) / k_unit != number) return nullptr;
   constexpr std::uint64_t k_units = 10'000;
-  out = write_whole(out, whole / k_units);
+  const std::uint64_t integer = whole / k_units;
+  out = integer < k_beyond_eight
+            ? put_up_to_eight(out, static_cast<std::uint32_t>(integer))
+            : write_whole(out, integer);
 
   // The point and the digits up to the last that is not 0.
-  const std::uint64_t digits =
-      eight_digits(static_cast<std::uint32_t>(whole % k_units)) >> 32;
+  const std::uint64_t digits = digits_by_4(whole % k_units);
   const std::uint64_t text = '.' | (digits | (k_zeros >> 32)) << 8;
   std::memcpy(out, &text, 8);
   const int used = (64 - std::countl_zero(digits) + 7) / 8;
@@ -442,18 +447,15 @@ void append_number(Output& out, double number) {
   constexpr std::int64_t k_room = 32;
   char* end = out.room(k_room);
   if (end == nullptr) return;
-  if (std::isnan(number)) {
-    end = copy(end, "nan", 3);
-  } else {
-    if (std::signbit(number)) *end++ = '-';
-    number = std::fabs(number);
-    if (std::isinf(number))
-      end = copy(end, "inf", 3);
-    else if (char* const short_end = write_short(end, number))
-      end = short_end;
-    else
-      end = write_general(end, number, k_default_digits, false);
-  }
+  if (std::isnan(number)) return out.take_to(copy(end, "nan", 3));
+  if (std::signbit(number)) *end++ = '-';
+  number = std::fabs(number);
+  if (char* const short_end = write_short(end, number))
+    end = short_end;
+  else if (std::isinf(number))
+    end = copy(end, "inf", 3);
+  else
+    end = write_general(end, number, k_default_digits, false);
   out.take_to(end);
 }
 

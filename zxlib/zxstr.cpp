@@ -279,7 +279,7 @@ void zxStr::set_length(std::int32_t n) {
   if (n == rep->length) return;
   const std::int32_t with_margin = sum_of(n, k_margin);
   if (!ZX_ASSERT(with_margin >= 0)) return;
-  unshare();
+  if (rep->refs >= 2) take_exactly(rep->length);
   if (n > rep->capacity) make_room(with_margin);
   if (n > rep->length)
     std::memset(rep->data + rep->length, 0, zx_size(n - rep->length));
@@ -323,15 +323,15 @@ zxStr& zxStr::append_growing(char byte) {
 }
 
 char* zxStr::tail_growing(std::int32_t n) {
-  if (!check() || !ZX_ASSERT(n >= 0)) return nullptr;
-  const std::int32_t wanted = sum_of(sum_of(rep->length, n), k_margin);
-  if (!ZX_ASSERT(wanted >= k_margin)) return nullptr;
+  if (!ZX_ASSERT(n >= 0)) return nullptr;
+  const std::int64_t wanted = zx_wide(rep->length) + n + k_margin;
+  if (!check() || !ZX_ASSERT(wanted <= INT32_MAX)) return nullptr;
   if (rep == &zx_empty_rep)
-    rep = new_block(wanted);
+    rep = new_block(static_cast<std::int32_t>(wanted));
   else if (rep->length + n <= rep->capacity)
     unshare();
   else
-    make_room(wanted);
+    make_room(static_cast<std::int32_t>(wanted));
   return rep->data + rep->length;
 }
 

@@ -159,8 +159,9 @@ zxStr unescape(const zxStr& text);
 // Pattern texts are kept compiled by their address (zxstrm.h), pattern
 // strings are compiled at each call.
 //
-// Text and pattern may be elements of `out`.  A bad pattern is message 1752 or 1751,
-// and gives no pieces if that is dropped.  The match record is left empty.
+// Text and pattern may be elements of `out`.  A bad pattern is message 1752 or
+// 1751, and gives no pieces if that is dropped.  The match record is left
+// empty.
 std::int32_t split_regex(zxQVA<zxStr>& out, const zxStr& text,
                          const char* pattern, std::int32_t pattern_length,
                          std::int32_t max, bool keep_empty);
