@@ -145,7 +145,7 @@ bool Parser::parse(std::string_view text) {
     text.remove_prefix(line.size());
     if (!text.empty()) text.remove_prefix(1);
     if (!is_utf8(line)) return fail("the line is not UTF-8");
-    if (!parse_line(trimmed(line))) return false;
+    if (!parse_line(zx_trimmed(line))) return false;
   }
   return check_end();
 }

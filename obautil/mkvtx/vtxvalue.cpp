@@ -201,7 +201,7 @@ bool sixty_fourths_number(std::string_view text, HvlDecimal& number,
   const bool negative = take_sign(rest);
   if (!rest.ends_with(k_ending)) return fail_number(text, wrong);
   rest.remove_suffix(k_ending.size());
-  if (rest != trimmed(rest)) return fail_number(text, wrong);
+  if (rest != zx_trimmed(rest)) return fail_number(text, wrong);
   const std::string_view head = take_word(rest);
   std::int64_t whole = 0;
   std::int64_t parts = 0;
@@ -319,17 +319,11 @@ zxStr quoted_word(std::string_view text) {
   return word.append(size < text.size() ? "...'" : "'");
 }
 
-std::string_view trimmed(std::string_view text) {
-  while (!text.empty() && zx_is_space(text.front())) text.remove_prefix(1);
-  while (!text.empty() && zx_is_space(text.back())) text.remove_suffix(1);
-  return text;
-}
-
 std::string_view take_word(std::string_view& text) {
   std::size_t n = 0;
   while (n < text.size() && !zx_is_space(text[n])) ++n;
   const std::string_view word = text.substr(0, n);
-  text = trimmed(text.substr(n));
+  text = zx_trimmed(text.substr(n));
   return word;
 }
 

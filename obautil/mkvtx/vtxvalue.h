@@ -51,9 +51,6 @@ bool is_utf8(std::string_view text);
 // characters show as "?".
 zxStr quoted_word(std::string_view text);
 
-// White space cut off at both ends.
-std::string_view trimmed(std::string_view text);
-
 // Takes the first word off a trimmed text, which stays trimmed.
 std::string_view take_word(std::string_view& text);
 

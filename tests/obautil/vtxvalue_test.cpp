@@ -451,14 +451,14 @@ TEST(vtxvalue, a_quoted_word_is_short_and_printable) {
 }
 
 TEST(vtxvalue, words_are_taken_off_the_front) {
-  std::string_view text = trimmed(" \t one \t two  three\r");
+  std::string_view text = zx_trimmed(" \t one \t two  three\r");
   EXPECT_EQ(take_word(text), "one");
   EXPECT_EQ(text, "two  three");
   EXPECT_EQ(take_word(text), "two");
   EXPECT_EQ(take_word(text), "three");
   EXPECT_EQ(text, "");
   EXPECT_EQ(take_word(text), "");
-  EXPECT_EQ(trimmed(" \t\r "), "");
+  EXPECT_EQ(zx_trimmed(" \t\r "), "");
 }
 
 }  // namespace
