@@ -29,7 +29,7 @@ import shutil
 import statistics
 import subprocess
 import time
-from dataclasses import dataclass
+from dataclasses import dataclass, field
 
 OUTPUT = "build/bench"
 PROGRAMS = "build/native/bin"
@@ -164,6 +164,23 @@ def compile_c(source, program):
 FILTER_VARIABLE = "BENCH_FILTER"
 
 NANOSECONDS = {"ns": 1.0, "us": 1e3, "ms": 1e6, "s": 1e9}
+
+
+@dataclass
+class Peer:
+    """Another side of the benchmarks of a program that has several."""
+
+    side: str                 # as benchmarks are named: WHAT/side
+    name: str
+    packages: dict = field(default_factory=dict)
+    cannot: tuple = ()        # the benchmarks that it has not
+
+    def missing(self):
+        """The first package that is not there; None if all are."""
+        for package, file in self.packages.items():
+            if not is_there(file):
+                return package
+        return None
 
 
 class GoogleBenchmark:

@@ -213,12 +213,9 @@ char* reverse_run(char* out, std::string_view run, bool mark,
                   const ByteMap& bytes) {
   char* const start = out;
   for (std::size_t i = run.size(); i-- > 0;) {
-    if (!is<Letters::ansi>(run[i], k_care_at_end)) {
-      *out++ = bytes[run[i]];
-      continue;
-    }
-    if (run[i] == k_rtl_mark) continue;
-    if (!ends_number(run, i)) {
+    const bool needs_care = is<Letters::ansi>(run[i], k_care_at_end);
+    if (needs_care && run[i] == k_rtl_mark) continue;
+    if (!needs_care || !ends_number(run, i)) {
       *out++ = bytes[run[i]];
       continue;
     }
@@ -452,12 +449,7 @@ void ansi_to_dos(zxStr& text) {
 
 namespace {
 
-// The one or two bytes that a character becomes; both are stored, and only
-// those that count are kept.
-struct Unit {
-  char bytes[2];
-  std::uint8_t size;
-};
+using zxp2l_detail::Unit;
 
 class UnitMap {
  public:
@@ -486,21 +478,13 @@ zxStr UnitMap::encode(const zxStr& text) const {
   return result;
 }
 
-constexpr Unit utf8_unit(int code) {
-  if (code < 0) return {{}, 0};
-  if (code < 128) return {{static_cast<char>(code), '\0'}, 1};
-  return {{static_cast<char>(0xC0 | code >> 6),
-           static_cast<char>(0x80 | (code & 0x3F))},
-          2};
-}
-
 constexpr Unit utf16_unit(int code) {
   if (code < 0) return {{}, 0};
   return {{static_cast<char>(code & 0xFF), static_cast<char>(code >> 8)}, 2};
 }
 
 constexpr UnitMap k_ansi_to_utf8([](int byte) {
-  return utf8_unit(zxp2l_detail::ansi_code(byte));
+  return zxp2l_detail::utf8_unit(zxp2l_detail::ansi_code(byte));
 });
 constexpr UnitMap k_ansi_to_utf16([](int byte) {
   return utf16_unit(zxp2l_detail::ansi_code(byte));

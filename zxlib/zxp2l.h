@@ -71,6 +71,23 @@ constexpr int code_of(int byte, int alef_byte) {
 constexpr int dos_code(int byte) { return code_of(byte, 128); }
 constexpr int ansi_code(int byte) { return code_of(byte, 224); }
 
+// What a byte of text becomes: up to two bytes, of which both can be stored
+// and only the first `size` be kept.
+struct Unit {
+  char bytes[2];
+  std::uint8_t size;
+};
+
+// A code point up to tav in UTF-8; nothing for -1.  Those from 128 bytes below
+// alef on all take two bytes.
+constexpr Unit utf8_unit(int code) {
+  if (code < 0) return {{}, 0};
+  if (code < 128) return {{static_cast<char>(code), '\0'}, 1};
+  return {{static_cast<char>(0xC0 | code >> 6),
+           static_cast<char>(0x80 | (code & 0x3F))},
+          2};
+}
+
 }  // namespace zxp2l_detail
 
 // The road of exports, from stored fields to UTF-8 in one pass: what
@@ -94,13 +111,9 @@ class zxLogicalExport {
   std::string_view convert(char* room, std::string_view physical) const;
 
  private:
-  // What a byte of logical text becomes: `size` bytes, the last of them at
-  // the end of `bytes`, so that both can be stored ahead of the result and
-  // only those that count be kept.
-  struct Unit {
-    char bytes[2];
-    std::uint8_t size;
-  };
+  // The UTF-8 of a byte of logical text, its last byte at the end of `bytes`,
+  // so that both can be stored ahead of the result.
+  using Unit = zxp2l_detail::Unit;
   using Units = std::array<Unit, 256>;
 
   static constexpr int to_ansi(int byte) {
@@ -115,14 +128,10 @@ class zxLogicalExport {
   Units units{};
 };
 
-// Code points from 128 bytes below alef up to tav all take two bytes.
 constexpr zxLogicalExport::Unit zxLogicalExport::unit_of(int byte) {
-  const int code = zxp2l_detail::ansi_code(byte);
-  if (code < 0) return {{}, 0};
-  if (code < 128) return {{'\0', static_cast<char>(code)}, 1};
-  return {{static_cast<char>(0xC0 | code >> 6),
-           static_cast<char>(0x80 | (code & 0x3F))},
-          2};
+  Unit unit = zxp2l_detail::utf8_unit(zxp2l_detail::ansi_code(byte));
+  if (unit.size == 1) unit.bytes[1] = unit.bytes[0];
+  return unit;
 }
 
 constexpr zxLogicalExport::zxLogicalExport(std::string_view dropped) {

@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <charconv>
 #include <cmath>
-#include <cstring>
 
 #include "zxplat.h"
 #include "zxsfmt_impl.h"
@@ -157,7 +156,7 @@ bool append_integer(Output& out, const Directive& directive,
 bool append_character(Output& out, const Directive& directive,
                       const zxFmtArg& arg) {
   if (!is_integer(arg) || arg.tag == zxFmtArg::k_bool) return false;
-  Form form = read_form(directive.middle());
+  const Form form = read_form(directive.middle());
   const char byte = static_cast<char>(arg.number);
   if (byte != '\0') return append_field(out, form, {}, 0, {&byte, 1});
   if (!ZX_ASSERT(form.measures.width < k_field_limit)) return false;
@@ -279,9 +278,11 @@ bool append_reversed(Output& out, const Directive& directive,
                      const zxFmtArg& arg) {
   std::string_view text;
   if (!read_text(out, arg, text)) return false;
-  zxStr reversed(text);
-  for (std::int32_t i = 0; i < reversed.length() / 2; ++i)
-    std::swap(reversed.at(i), reversed.at(reversed.length() - 1 - i));
+  zxStr reversed;
+  if (char* const start = reversed.tail(zx_count(text.size()))) {
+    std::reverse_copy(text.begin(), text.end(), start);
+    reversed.extend(zx_count(text.size()));
+  }
   append_padded(out, directive.middle(), reversed.view());
   return true;
 }

@@ -420,9 +420,8 @@ char* write_general(char* out, double number, std::int32_t precision,
                     bool zeros) {
   constexpr double k_least_plain = 1e-4;
   Scaled rounded;
-  if (number >= k_least_plain &&
-      round_by_whole_number(number, precision, rounded) &&
-      rounded.decimals >= 0 && !zeros) {
+  if (!zeros && number >= k_least_plain &&
+      round_by_whole_number(number, precision, rounded)) {
     out = write_with_point(out, rounded);
     return rounded.decimals > 0 ? strip_zeros(out) : out;
   }

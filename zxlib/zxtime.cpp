@@ -32,6 +32,25 @@ zxStr text_of_form(const std::tm& fields, std::int32_t index) {
   return {text, zx_count(length)};
 }
 
+// A form in letters that all C libraries take for the same; false if there
+// is a letter of another kind in it.
+bool to_common_letters(std::string_view form, zxStr& common) {
+  constexpr std::string_view k_common = "aAbBdHIjmMpSUwWxXyYZ%";
+  for (; !form.empty(); form.remove_prefix(1)) {
+    common.append(form.front());
+    if (form.front() != '%') continue;
+    form.remove_prefix(1);
+    if (form.empty()) return false;
+    if (form.front() == 'c')
+      common.append("m/%d/%y %H:%M:%S");
+    else if (k_common.find(form.front()) != k_common.npos)
+      common.append(form.front());
+    else
+      return false;
+  }
+  return true;
+}
+
 constexpr bool fits_32_bits(std::int64_t moment) {
   return moment >= INT32_MIN && moment <= INT32_MAX;
 }
@@ -230,25 +249,6 @@ std::tm local_fields(std::int64_t moment) {
   fields = {};
   fields.tm_mday = 1;
   return fields;
-}
-
-// A form in letters that all C libraries take for the same; false if there
-// is a letter of another kind in it.
-static bool to_common_letters(std::string_view form, zxStr& common) {
-  constexpr std::string_view k_common = "aAbBdHIjmMpSUwWxXyYZ%";
-  for (; !form.empty(); form.remove_prefix(1)) {
-    common.append(form.front());
-    if (form.front() != '%') continue;
-    form.remove_prefix(1);
-    if (form.empty()) return false;
-    if (form.front() == 'c')
-      common.append("m/%d/%y %H:%M:%S");
-    else if (k_common.find(form.front()) != k_common.npos)
-      common.append(form.front());
-    else
-      return false;
-  }
-  return true;
 }
 
 zxStr format_moment(std::int64_t moment, const char* form) {

@@ -11,25 +11,10 @@ out on both sides, and its number is that of the rest.
 """
 
 import statistics
-from dataclasses import dataclass, field
 
 import kit
 
 REPETITIONS = 9
-
-
-@dataclass
-class Peer:
-    side: str                 # as benchmarks are named: WHAT/side
-    name: str
-    packages: dict = field(default_factory=dict)
-    cannot: tuple = ()        # the benchmarks that it has not
-
-    def missing(self):
-        for package, file in self.packages.items():
-            if not kit.is_there(file):
-                return package
-        return None
 
 
 PCRE2_PACKAGE = {"libpcre2-dev": "/usr/include/pcre2.h"}
@@ -38,13 +23,13 @@ BOOST_PACKAGE = {"libboost-regex-dev": "/usr/include/boost/regex.hpp"}
 PACKAGES = {**kit.GoogleBenchmark.PACKAGES, **PCRE2_PACKAGE, **RE2_PACKAGE,
             **BOOST_PACKAGE}
 
-PCRE2 = Peer("pcre2", "PCRE2", PCRE2_PACKAGE)
-RE2 = Peer("re2", "RE2", RE2_PACKAGE)
+PCRE2 = kit.Peer("pcre2", "PCRE2", PCRE2_PACKAGE)
+RE2 = kit.Peer("re2", "RE2", RE2_PACKAGE)
 OTHERS = [
-    Peer("jit", "PCRE2, just in time", PCRE2_PACKAGE),
+    kit.Peer("jit", "PCRE2, just in time", PCRE2_PACKAGE),
     RE2,
-    Peer("std", "std::regex", cannot=("loop", "to_last")),
-    Peer("boost", "Boost.Regex", BOOST_PACKAGE, cannot=("ambiguous",)),
+    kit.Peer("std", "std::regex", cannot=("loop", "to_last")),
+    kit.Peer("boost", "Boost.Regex", BOOST_PACKAGE, cannot=("ambiguous",)),
 ]
 PEERS = [PCRE2] + OTHERS
 

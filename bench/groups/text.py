@@ -14,37 +14,24 @@ import kit
 REPETITIONS = 9
 
 
-@dataclass
-class Peer:
-    side: str                 # as benchmarks are named: WHAT/side
-    name: str
-    packages: dict = field(default_factory=dict)
-
-    def missing(self):
-        for package, file in self.packages.items():
-            if not kit.is_there(file):
-                return package
-        return None
-
-
 FMT_PACKAGE = {"libfmt-dev": "/usr/include/fmt/format.h"}
 FRIBIDI_PACKAGE = {"libfribidi-dev": "/usr/include/fribidi/fribidi.h"}
 PACKAGES = {**kit.GoogleBenchmark.PACKAGES, **FMT_PACKAGE, **FRIBIDI_PACKAGE}
 
-FMT = Peer("fmt", "{fmt}, {}", FMT_PACKAGE)
-FMT_15 = Peer("fmt15", "{fmt}, {:.15g}", FMT_PACKAGE)
-FMT_FIXED = Peer("fmt", "{fmt}, {:.2f}", FMT_PACKAGE)
-FMT_THOUSANDS = Peer("fmt", "{fmt}, {:.2Lf}", FMT_PACKAGE)
-SNPRINTF = Peer("snprintf", "snprintf")
-STREAM = Peer("stream", "std::ostringstream")
-TO_CHARS_15 = Peer("to_chars", "std::to_chars, 15")
-TO_CHARS = Peer("to_chars", "std::to_chars")
-FRIBIDI = Peer("fribidi", "FriBidi", FRIBIDI_PACKAGE)
-LOG2VIS = Peer("log2vis", "FriBidi, log2vis", FRIBIDI_PACKAGE)
-ICONV = Peer("iconv", "iconv")
-FROM_CHARS = Peer("from_chars", "std::from_chars")
-STRTOL = Peer("strtol", "strtol")
-STRTOD = Peer("strtod", "strtod")
+FMT = kit.Peer("fmt", "{fmt}, {}", FMT_PACKAGE)
+FMT_15 = kit.Peer("fmt15", "{fmt}, {:.15g}", FMT_PACKAGE)
+FMT_FIXED = kit.Peer("fmt", "{fmt}, {:.2f}", FMT_PACKAGE)
+FMT_THOUSANDS = kit.Peer("fmt", "{fmt}, {:.2Lf}", FMT_PACKAGE)
+SNPRINTF = kit.Peer("snprintf", "snprintf")
+STREAM = kit.Peer("stream", "std::ostringstream")
+TO_CHARS_15 = kit.Peer("to_chars", "std::to_chars, 15")
+TO_CHARS = kit.Peer("to_chars", "std::to_chars")
+FRIBIDI = kit.Peer("fribidi", "FriBidi", FRIBIDI_PACKAGE)
+LOG2VIS = kit.Peer("log2vis", "FriBidi, log2vis", FRIBIDI_PACKAGE)
+ICONV = kit.Peer("iconv", "iconv")
+FROM_CHARS = kit.Peer("from_chars", "std::from_chars")
+STRTOL = kit.Peer("strtol", "strtol")
+STRTOD = kit.Peer("strtod", "strtod")
 
 
 @dataclass
